@@ -1,0 +1,84 @@
+// Runs the benchmarks in a shuffled order, several times each, and prints the ratio table. The fastest of the
+// repetitions counts: on a busy machine it is the one least disturbed.
+#include <benchmark/benchmark.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <map>
+#include <string>
+#include <vector>
+
+#include "ratios.h"
+
+namespace {
+
+struct Row {
+    std::string ours;
+    std::string peer;
+    double goal;
+};
+
+std::vector<Row>& Rows() {
+    static std::vector<Row> rows;
+    return rows;
+}
+
+// Prints the median of each benchmark's repetitions and keeps the best.
+class BestTimes : public benchmark::ConsoleReporter {
+public:
+    BestTimes() : ConsoleReporter(OO_Tabular) {}
+
+    void ReportRuns(const std::vector<Run>& runs) override {
+        std::vector<Run> medians;
+        for (const Run& run : runs) {
+            if (run.aggregate_name == "median") medians.push_back(run);
+            if (run.run_type != Run::RT_Iteration || run.error_occurred) continue;
+            const double time = run.GetAdjustedRealTime();
+            const auto [entry, is_new] = mTimes.emplace(run.run_name.str(), time);
+            if (!is_new) entry->second = std::min(entry->second, time);
+        }
+        ConsoleReporter::ReportRuns(medians);
+    }
+
+    void PrintRatios() const {
+        std::printf("\n%-52s %-44s %8s %8s\n", "ours", "peer", "ratio", "goal");
+        for (const Row& row : Rows()) {
+            const auto ours = mTimes.find(row.ours);
+            const auto peer = mTimes.find(row.peer);
+            if (ours == mTimes.end() || peer == mTimes.end()) continue;
+            const double ratio = ours->second / peer->second;
+            std::printf("%-52s %-44s %8.2f ", row.ours.c_str(), row.peer.c_str(), ratio);
+            if (row.goal > 0) {
+                std::printf("%8.2f%s\n", row.goal, ratio > row.goal ? "  above" : "");
+            } else {
+                std::printf("%8s\n", "-");
+            }
+        }
+    }
+
+private:
+    std::map<std::string, double> mTimes;
+};
+
+}  // namespace
+
+bool AddRatio(const std::string& ours, const std::string& peer, double goal) {
+    Rows().push_back({ours, peer, goal});
+    return true;
+}
+
+int main(int argc, char** argv) {
+    // Defaults first, so that a flag of the caller's comes later and wins.
+    std::vector<std::string> flags = {argv[0], "--benchmark_repetitions=9", "--benchmark_min_time=0.03",
+                                      "--benchmark_enable_random_interleaving=true"};
+    flags.insert(flags.end(), argv + 1, argv + argc);
+    std::vector<char*> pointers;
+    for (std::string& flag : flags) pointers.push_back(flag.data());
+    int count = static_cast<int>(pointers.size());
+    benchmark::Initialize(&count, pointers.data());
+    if (benchmark::ReportUnrecognizedArguments(count, pointers.data())) return 1;
+    BestTimes times;
+    benchmark::RunSpecifiedBenchmarks(&times);
+    times.PrintRatios();
+    return 0;
+}

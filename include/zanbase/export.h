@@ -1,0 +1,44 @@
+/// @file
+/// Macros that every public header uses: what is exported, and what the compiler checks of a caller.
+/// This header and the platform layer are the only places that may test for a compiler or a system.
+#ifndef ZANBASE_EXPORT_H
+#define ZANBASE_EXPORT_H
+
+/// @def ZANBASE_API
+/// Marks what the library exports; everything else stays hidden. It has three states: the library itself is
+/// being built (`ZANBASE_BUILDING`), its objects are linked statically (`ZANBASE_STATIC`), or a caller uses
+/// the shared library (neither).
+#if defined(_WIN32)
+#if defined(ZANBASE_BUILDING)
+#define ZANBASE_API __declspec(dllexport)
+#elif defined(ZANBASE_STATIC)
+#define ZANBASE_API
+#else
+#define ZANBASE_API __declspec(dllimport)
+#endif
+#else
+#define ZANBASE_API __attribute__((visibility("default")))
+#endif
+
+/// @def ZANBASE_PRINTF_FORMAT(format, first)
+/// Parameter number `format` is a `printf` format for the arguments from number `first` on; `first` is 0
+/// where the arguments come as a `va_list`. A member function counts its object as parameter 1.
+/// @def ZANBASE_NULL_TERMINATED
+/// The variable arguments end with a null pointer.
+/// @def ZANBASE_FORMAT_ARGUMENT(number)
+/// The result is a format that takes the same arguments as parameter number `number`.
+#if defined(__GNUC__)
+#if defined(__MINGW32__)
+#define ZANBASE_PRINTF_FORMAT(format, first) __attribute__((format(gnu_printf, format, first)))
+#else
+#define ZANBASE_PRINTF_FORMAT(format, first) __attribute__((format(printf, format, first)))
+#endif
+#define ZANBASE_NULL_TERMINATED __attribute__((sentinel))
+#define ZANBASE_FORMAT_ARGUMENT(number) __attribute__((format_arg(number)))
+#else
+#define ZANBASE_PRINTF_FORMAT(format, first)
+#define ZANBASE_NULL_TERMINATED
+#define ZANBASE_FORMAT_ARGUMENT(number)
+#endif
+
+#endif

@@ -1,0 +1,17 @@
+/// @file
+/// The whole public interface in one include, and the version of the library that it belongs to.
+#ifndef ZANBASE_ZANBASE_H
+#define ZANBASE_ZANBASE_H
+
+#include "zanbase/allocation.h"
+#include "zanbase/export.h"
+#include "zanbase/mutex.h"
+
+/// The version of these headers; the same numbers stand in the CMake package and in `zanbase.pc`.
+#define ZANBASE_VERSION_MAJOR 0
+#define ZANBASE_VERSION_MINOR 1
+#define ZANBASE_VERSION_PATCH 0
+/// The version as one number that can be compared: 0.1.0 is 100.
+#define ZANBASE_VERSION (ZANBASE_VERSION_MAJOR * 10000 + ZANBASE_VERSION_MINOR * 100 + ZANBASE_VERSION_PATCH)
+
+#endif

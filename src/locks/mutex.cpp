@@ -1,0 +1,45 @@
+// HMutex passes every call to the platform's lock; HMutexLock adds the orders of releasing and taking.
+#include "zanbase/mutex.h"
+
+#include <cstdlib>
+
+#include "platform/lock.h"
+#include "zanbase/allocation.h"
+
+HMutex::HMutex() : mpoCriticalSection(static_cast<NativeLock*>(HMalloc(sizeof(NativeLock)))) {
+    OpenLock(mpoCriticalSection);
+}
+
+HMutex::~HMutex() {
+    CloseLock(mpoCriticalSection);
+    std::free(mpoCriticalSection);
+}
+
+void HMutex::Lock() const { TakeLock(mpoCriticalSection); }
+
+bool HMutex::TryLock() const { return TryTakeLock(mpoCriticalSection); }
+
+void HMutex::Unlock() const { GiveLock(mpoCriticalSection); }
+
+HMutexLock::HMutexLock(const HMutex* mutex) : mpoMutex(mutex) {
+    if (mpoMutex != nullptr) mpoMutex->Lock();
+}
+
+HMutexLock::HMutexLock(const HMutexLock& other) : HMutexLock(other.mpoMutex) {}
+
+HMutexLock::~HMutexLock() { HMutexLock::Release(); }
+
+HMutexLock& HMutexLock::operator=(const HMutexLock& other) {
+    Reset(other.mpoMutex);  // the argument is read before anything is released, so self-assignment is safe
+    return *this;
+}
+
+void HMutexLock::Release() { Reset(nullptr); }
+
+void HMutexLock::Reset(const HMutex* mutex) {
+    if (mpoMutex != nullptr) mpoMutex->Unlock();
+    mpoMutex = mutex;
+    if (mpoMutex != nullptr) mpoMutex->Lock();
+}
+
+const HMutex* HMutexLock::GetMutex() const { return mpoMutex; }
