@@ -20,8 +20,8 @@
 #define ZANBASE_API __attribute__((visibility("default")))
 #endif
 
-/// @def ZANBASE_PRINTF_FORMAT(format, first)
-/// Parameter number `format` is a `printf` format for the arguments from number `first` on; `first` is 0
+/// @def ZANBASE_PRINTF_FORMAT(text, first)
+/// Parameter number `text` is a `printf` format for the arguments from number `first` on; `first` is 0
 /// where the arguments come as a `va_list`. A member function counts its object as parameter 1.
 /// @def ZANBASE_NULL_TERMINATED
 /// The variable arguments end with a null pointer.
@@ -29,14 +29,14 @@
 /// The result is a format that takes the same arguments as parameter number `number`.
 #if defined(__GNUC__)
 #if defined(__MINGW32__)
-#define ZANBASE_PRINTF_FORMAT(format, first) __attribute__((format(gnu_printf, format, first)))
+#define ZANBASE_PRINTF_FORMAT(text, first) __attribute__((format(gnu_printf, text, first)))
 #else
-#define ZANBASE_PRINTF_FORMAT(format, first) __attribute__((format(printf, format, first)))
+#define ZANBASE_PRINTF_FORMAT(text, first) __attribute__((format(printf, text, first)))
 #endif
 #define ZANBASE_NULL_TERMINATED __attribute__((sentinel))
 #define ZANBASE_FORMAT_ARGUMENT(number) __attribute__((format_arg(number)))
 #else
-#define ZANBASE_PRINTF_FORMAT(format, first)
+#define ZANBASE_PRINTF_FORMAT(text, first)
 #define ZANBASE_NULL_TERMINATED
 #define ZANBASE_FORMAT_ARGUMENT(number)
 #endif

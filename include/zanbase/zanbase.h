@@ -6,6 +6,7 @@
 #include "zanbase/allocation.h"
 #include "zanbase/export.h"
 #include "zanbase/mutex.h"
+#include "zanbase/string_makers.h"
 
 /// The version of these headers; the same numbers stand in the CMake package and in `zanbase.pc`.
 #define ZANBASE_VERSION_MAJOR 0

@@ -1,0 +1,56 @@
+// The text rules on an area of the call's own.
+#include "zanbase/string_makers.h"
+
+#include "text/text_rules.h"
+
+namespace {
+
+template <class Integer>
+std::string DecimalString(Integer value) {
+    char area[kDecimalBytes];
+    char* const end = area + sizeof area;
+    return {WriteDecimal(value, end), end};
+}
+
+}  // namespace
+
+std::string MkString(short value) { return DecimalString(value); }
+std::string MkString(unsigned short value) { return DecimalString(value); }
+std::string MkString(int value) { return DecimalString(value); }
+std::string MkString(unsigned int value) { return DecimalString(value); }
+std::string MkString(long value) { return DecimalString(value); }
+std::string MkString(unsigned long value) { return DecimalString(value); }
+std::string MkString(long long value) { return DecimalString(value); }
+std::string MkString(unsigned long long value) { return DecimalString(value); }
+
+std::string MkString(double value, int decimals) {
+    char area[64];
+    const std::size_t length = WriteFixedPoint(value, decimals, area, sizeof area);
+    return {area, length};
+}
+
+// The areas are left as the stack has them: clearing 4096 bytes would cost as much as a short format.
+
+std::string MkString(const char* format, ...) {
+    char area[kTextBytes];
+    va_list arguments;
+    va_start(arguments, format);
+    WriteFormat(format, arguments, area, sizeof area);
+    va_end(arguments);
+    return area;
+}
+
+std::string MkStringV(const char* format, va_list arguments) {
+    char area[kTextBytes];
+    WriteFormat(format, arguments, area, sizeof area);
+    return area;
+}
+
+std::string MkTokenString(const char* first, ...) {
+    char area[kTextBytes];
+    va_list rest;
+    va_start(rest, first);
+    const std::size_t length = WriteTokens(first, rest, area, sizeof area);
+    va_end(rest);
+    return {area, length};
+}

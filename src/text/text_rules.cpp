@@ -1,0 +1,50 @@
+// Fixed-point, format and token text.
+#include "text/text_rules.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstdio>
+
+namespace {
+
+constexpr int kSignificantDigits = 14;  // of a number whose count of decimals is automatic
+constexpr char kSeparator = '|';
+
+int AutomaticDecimals(double value) noexcept {
+    if (value == 0 || !std::isfinite(value)) return 0;
+    const int exponent = static_cast<int>(std::floor(std::log10(std::fabs(value))));  // -324 to 308
+    return std::max(kSignificantDigits - 1 - exponent, 0);
+}
+
+}  // namespace
+
+// An infinity or a NaN is the runtime's text of it, whatever the count: "inf", "-inf", "nan".
+std::size_t WriteFixedPoint(double value, int decimals, char* area, std::size_t bytes) noexcept {
+    // The digits of a double end at the latest 1074 places behind the point. More places would only be zeros,
+    // which are removed again, at the cost of a runtime that allocates for them.
+    constexpr int kMostDecimals = 1074;
+    const int count = decimals < 0 ? AutomaticDecimals(value) : std::min(decimals, kMostDecimals);
+    const auto whole_length = static_cast<std::size_t>(std::snprintf(area, bytes, "%.*f", count, value));
+    char* end = area + std::min(whole_length, bytes - 1);
+    if (std::memchr(area, '.', static_cast<std::size_t>(end - area)) != nullptr) {
+        while (end[-1] == '0') --end;
+        if (end[-1] == '.') --end;
+        *end = '\0';
+    }
+    return static_cast<std::size_t>(end - area);
+}
+
+void WriteFormat(const char* format, va_list arguments, char* area, std::size_t bytes) noexcept {
+    std::vsnprintf(area, bytes, format, arguments);
+}
+
+std::size_t WriteTokens(const char* first, va_list rest, char* area, std::size_t bytes) noexcept {
+    const std::size_t most = bytes - 1;
+    std::size_t length = 0;
+    for (const char* token = first; token != nullptr && length < most; token = va_arg(rest, const char*)) {
+        if (length != 0) area[length++] = kSeparator;
+        while (*token != '\0' && length < most) area[length++] = *token++;
+    }
+    area[length] = '\0';
+    return length;
+}
