@@ -5,6 +5,7 @@
 
 #include "zanbase/allocation.h"
 #include "zanbase/export.h"
+#include "zanbase/message_catalogue.h"
 #include "zanbase/mutex.h"
 #include "zanbase/string_makers.h"
 
