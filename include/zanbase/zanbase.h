@@ -7,6 +7,7 @@
 #include "zanbase/export.h"
 #include "zanbase/message_catalogue.h"
 #include "zanbase/mutex.h"
+#include "zanbase/name_ring.h"
 #include "zanbase/string_makers.h"
 
 /// The version of these headers; the same numbers stand in the CMake package and in `zanbase.pc`.
