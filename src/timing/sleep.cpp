@@ -1,0 +1,31 @@
+// The sleep hook and the routine that stands in it until a caller installs another.
+#include "zanbase/sleep.h"
+
+#include <algorithm>
+#include <atomic>
+
+#include "platform/clock.h"
+
+namespace {
+
+// Waits for a tenth of the requested time at least, one tick at the fewest: the single pause is expected to
+// take the rest. The difference of two readings is right across the wrap of the tick count too.
+void SleepByTicks(int microseconds) {
+    const auto amount = static_cast<unsigned int>(microseconds);
+    const unsigned int ticks_to_wait = std::max(amount / 10000, 1U);
+    const unsigned int start = ReadTicks();
+    do {
+        PauseFor(amount / 1000);
+    } while (ReadTicks() - start < ticks_to_wait);
+}
+
+// Never null. Release and acquire, so that what a caller prepared for its routine is there when it runs.
+std::atomic<void (*)(int)> mpfnUSleepHook{SleepByTicks};
+
+}  // namespace
+
+void USleep(int microseconds) {
+    if (microseconds > 0) mpfnUSleepHook.load(std::memory_order_acquire)(microseconds);
+}
+
+void InstallUSleepHook(void (*hook)(int)) { mpfnUSleepHook.store(hook, std::memory_order_release); }
