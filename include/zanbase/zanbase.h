@@ -6,6 +6,7 @@
 #include "zanbase/allocation.h"
 #include "zanbase/export.h"
 #include "zanbase/mutex.h"
+#include "zanbase/openmp.h"
 #include "zanbase/sleep.h"
 #include "zanbase/string_makers.h"
 
