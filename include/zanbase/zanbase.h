@@ -4,6 +4,7 @@
 #define ZANBASE_ZANBASE_H
 
 #include "zanbase/allocation.h"
+#include "zanbase/clock.h"
 #include "zanbase/export.h"
 #include "zanbase/mutex.h"
 #include "zanbase/openmp.h"
