@@ -8,6 +8,7 @@
 #include "zanbase/export.h"
 #include "zanbase/mutex.h"
 #include "zanbase/openmp.h"
+#include "zanbase/random.h"
 #include "zanbase/sleep.h"
 #include "zanbase/string_makers.h"
 
