@@ -6,11 +6,14 @@
 #include "zanbase/allocation.h"
 #include "zanbase/clock.h"
 #include "zanbase/export.h"
+#include "zanbase/message_catalogue.h"
 #include "zanbase/mutex.h"
+#include "zanbase/name_ring.h"
 #include "zanbase/openmp.h"
 #include "zanbase/random.h"
 #include "zanbase/sleep.h"
 #include "zanbase/string_makers.h"
+#include "zanbase/thread.h"
 
 /// The version of these headers; the same numbers stand in the CMake package and in `zanbase.pc`.
 #define ZANBASE_VERSION_MAJOR 0
