@@ -1,0 +1,142 @@
+// Numbers into and out of text fields.
+#include "zanbase/field_text.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstddef>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <type_traits>
+
+#include "text/text_rules.h"
+
+namespace {
+
+constexpr int kDefaultWidth = 40;         // of a field whose reader gives none
+constexpr std::size_t kLongestText = 64;  // that PrintDouble and its like put into a field
+
+char gacDoubleText[80];
+char gacInt64Text[22];
+
+// The pointer carries no format attribute: the format is the caller's, and nothing here can check it.
+int (*const kPrint)(char*, std::size_t, const char*, ...) = std::snprintf;
+
+// Prints to `area` and returns the length of the text, which is 0 where the runtime can't print.
+template <class Value>
+std::size_t Print(char (&area)[kLongestText + 1], const char* format, Value value) noexcept {
+    const int length = kPrint(area, sizeof area, format, value);
+    return std::min(static_cast<std::size_t>(std::max(length, 0)), kLongestText);
+}
+
+// Counts down what is left of the field: a pointer to its end may be one that no array has.
+template <class Integer>
+Integer ScanInteger(const char* field, int width) noexcept {
+    int left = width < 1 ? kDefaultWidth : width;
+    while (left > 0 && (*field == ' ' || *field == '\t')) ++field, --left;
+    const bool is_negative = left > 0 && *field == '-';
+    if (left > 0 && (is_negative || *field == '+')) ++field, --left;
+    std::make_unsigned_t<Integer> magnitude = 0;  // unsigned arithmetic wraps
+    for (; left > 0; ++field, --left) {
+        const unsigned int digit = static_cast<unsigned char>(*field) - static_cast<unsigned int>('0');
+        if (digit > 9) break;
+        magnitude = magnitude * 10 + digit;
+    }
+    return static_cast<Integer>(is_negative ? 0 - magnitude : magnitude);
+}
+
+// Moves the letters from `first` to `last` by `distance`.
+void ShiftLetters(char* text, char first, char last, int distance) noexcept {
+    for (; *text != '\0'; ++text) {
+        if (first <= *text && *text <= last) *text = static_cast<char>(*text + distance);
+    }
+}
+
+}  // namespace
+
+const char* FormatDouble(double value, char* buffer) noexcept {
+    char* const area = buffer != nullptr ? buffer : gacDoubleText;
+    const double magnitude = std::fabs(value);
+    if (-2147483648.0 < value && value < 2147483647.0) {
+        const double below = std::floor(value);
+        if (value == below || (magnitude > 0.5 && value - below < 1e-11)) {
+            char digits[kDecimalBytes];
+            char* const end = digits + sizeof digits;
+            *std::copy(WriteDecimal(static_cast<int>(below), end), end, area) = '\0';
+            return area;
+        }
+    }
+    constexpr std::size_t kBufferBytes = 25;
+    std::snprintf(area, kBufferBytes, magnitude > 1e7 || magnitude < 1e-7 ? "%24.15e" : "%24.11f", value);
+    return area;
+}
+
+void PrintDouble(char* field, const char* format, double value) noexcept {
+    char area[kLongestText + 1];
+    const std::size_t length = Print(area, format, value);
+    std::replace_copy_if(
+        area, area + length, field, [](char c) { return c == 'E' || c == 'e'; }, 'D');
+}
+
+void PrintFloat(char* field, const char* format, double value) noexcept {
+    char area[kLongestText + 1];
+    std::memcpy(field, area, Print(area, format, value));
+}
+
+void PrintInt(char* field, const char* format, long value) noexcept {
+    char area[kLongestText + 1];
+    std::memcpy(field, area, Print(area, format, value));
+}
+
+const char* PrintInt64(long long value) noexcept {
+    char* const terminator = gacInt64Text + sizeof gacInt64Text - 1;
+    std::fill(gacInt64Text, terminator, ' ');
+    *terminator = '\0';
+    return WriteDecimal(value, terminator);
+}
+
+// strtod reads what "%lE" of sscanf reads, and where that finds no number it gives what atof would: one call
+// has the result of both. (They differ in the payload of a "nan(…)".)
+double ScanDouble(const char* field, int width) noexcept {
+    constexpr int kLongestField = 63;
+    char copy[kLongestField + 1];
+    const int most = width < 1 ? kDefaultWidth : std::min(width, kLongestField);
+    int length = 0;
+    for (; length < most && field[length] != '\0'; ++length) {
+        const char c = field[length];
+        copy[length] = c == 'D' ? 'E' : c == 'd' ? 'e' : c;
+    }
+    copy[length] = '\0';
+    return std::strtod(copy, nullptr);
+}
+
+int ScanInt(const char* field, int width) noexcept { return ScanInteger<int>(field, width); }
+
+long long ScanInt64(const char* field, int width) noexcept { return ScanInteger<long long>(field, width); }
+
+void TextFieldFill(char* field, const char* text, int width) noexcept {
+    if (width <= 0) return;
+    const auto size = static_cast<std::size_t>(width);
+    const void* const terminator = std::memchr(text, '\0', size);  // looks no further than it must
+    const std::size_t length =
+        terminator != nullptr ? static_cast<std::size_t>(static_cast<const char*>(terminator) - text) : size;
+    std::memmove(field, text, length);
+    std::memset(field + length, ' ', size - length);
+}
+
+void UCaseString(char* text) noexcept { ShiftLetters(text, 'a', 'z', 'A' - 'a'); }
+
+void LCaseString(char* text) noexcept { ShiftLetters(text, 'A', 'Z', 'a' - 'A'); }
+
+int NextMult(int value, int multiple) noexcept {
+    // The sum wraps in unsigned arithmetic. Its product with the quotient then stays in range, except that
+    // the least int has no quotient by -1; but a number divided and multiplied by -1 is itself.
+    const auto sum =
+        static_cast<int>(static_cast<unsigned int>(value) + static_cast<unsigned int>(multiple) - 1u);
+    return multiple == -1 ? sum : sum / multiple * multiple;
+}
+
+double ZAN_modf(double value, double* whole) noexcept {
+    *whole = std::trunc(value);
+    return value - *whole;
+}
