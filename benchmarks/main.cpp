@@ -3,6 +3,7 @@
 #include <benchmark/benchmark.h>
 
 #include <algorithm>
+#include <cmath>
 #include <cstdio>
 #include <map>
 #include <string>
@@ -15,6 +16,7 @@ namespace {
 struct Row {
     std::string ours;
     std::string peer;
+    std::vector<Ratio> ratios;  // the row shows their geometric mean
     double goal;
 };
 
@@ -43,10 +45,8 @@ public:
     void PrintRatios() const {
         std::printf("\n%-52s %-44s %8s %8s\n", "ours", "peer", "ratio", "goal");
         for (const Row& row : Rows()) {
-            const auto ours = mTimes.find(row.ours);
-            const auto peer = mTimes.find(row.peer);
-            if (ours == mTimes.end() || peer == mTimes.end()) continue;
-            const double ratio = ours->second / peer->second;
+            const double ratio = MeanOf(row.ratios);
+            if (std::isnan(ratio)) continue;
             std::printf("%-52s %-44s %8.2f ", row.ours.c_str(), row.peer.c_str(), ratio);
             if (row.goal > 0) {
                 std::printf("%8.2f%s\n", row.goal, ratio > row.goal ? "  above" : "");
@@ -57,13 +57,30 @@ public:
     }
 
 private:
+    // NaN if one of them was not measured.
+    double MeanOf(const std::vector<Ratio>& ratios) const {
+        double logarithms = 0;
+        for (const Ratio& ratio : ratios) {
+            const auto ours = mTimes.find(ratio.ours);
+            const auto peer = mTimes.find(ratio.peer);
+            if (ours == mTimes.end() || peer == mTimes.end()) return NAN;
+            logarithms += std::log(ours->second / peer->second);
+        }
+        return std::exp(logarithms / static_cast<double>(ratios.size()));
+    }
+
     std::map<std::string, double> mTimes;
 };
 
 }  // namespace
 
 bool AddRatio(const std::string& ours, const std::string& peer, double goal) {
-    Rows().push_back({ours, peer, goal});
+    return AddMeanRatio(ours, peer, {{ours, peer}}, goal);
+}
+
+bool AddMeanRatio(const std::string& ours, const std::string& peer, const std::vector<Ratio>& ratios,
+                  double goal) {
+    Rows().push_back({ours, peer, ratios, goal});
     return true;
 }
 

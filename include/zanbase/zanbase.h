@@ -13,6 +13,7 @@
 #include "zanbase/openmp.h"
 #include "zanbase/random.h"
 #include "zanbase/sleep.h"
+#include "zanbase/sort.h"
 #include "zanbase/string_makers.h"
 #include "zanbase/thread.h"
 
