@@ -5,7 +5,7 @@ include(GNUInstallDirs)
 include(CMakePackageConfigHelpers)
 
 install(TARGETS zanbase EXPORT zanbaseTargets)
-install(DIRECTORY include/zanbase DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+install(DIRECTORY include/zanbase ${CMAKE_CURRENT_BINARY_DIR}/include/zanbase DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
 install(EXPORT zanbaseTargets NAMESPACE zanbase:: DESTINATION ${CMAKE_INSTALL_LIBDIR}/cmake/zanbase)
 
 configure_package_config_file(cmake/zanbaseConfig.cmake.in zanbaseConfig.cmake

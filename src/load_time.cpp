@@ -3,6 +3,8 @@
 // linked against this one, so the loader builds these objects before any code of theirs runs.
 #include "environment/message_catalogue.h"
 #include "text/name_ring.h"
+#include "zanbase/memory.h"
 
+HMutex HMemory::moMutex;
 MessageCatalogue goMessageCatalogue;
 NameRing goNameRing;

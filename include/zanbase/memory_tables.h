@@ -1,0 +1,29 @@
+/// @file
+/// For code that reads the tracker's tables through a class derived from `HMemory`: Boost's map and the saved
+/// state, complete. Not part of zanbase/zanbase.h, because it needs Boost, and the very version of it that
+/// the library was built with: the layout of the maps is that version's.
+#ifndef ZANBASE_MEMORY_TABLES_H
+#define ZANBASE_MEMORY_TABLES_H
+
+#include <cstddef>
+#include <list>
+
+#include <boost/unordered_map.hpp>
+#include <boost/version.hpp>
+
+#include "zanbase/boost_version.h"
+#include "zanbase/memory.h"
+
+#if BOOST_VERSION != ZANBASE_BOOST_VERSION
+#error "zanbase was built with another version of Boost: see ZANBASE_BOOST_VERSION in zanbase/boost_version.h"
+#endif
+
+/// What `HMemory::Push` saved: copies that share nothing with the live tables.
+struct HMemory::MemoryState {
+    FileMap moFileMap;
+    MemoryMap moMemoryMap;
+    std::size_t mnSavedTotal;  ///< bytes
+    std::size_t mnSavedPeek;   ///< bytes
+};
+
+#endif

@@ -1,0 +1,21 @@
+// Texts that the printed reports share. None of these functions has a state.
+#ifndef ZANBASE_MEMORY_REPORT_TEXT_H
+#define ZANBASE_MEMORY_REPORT_TEXT_H
+
+#include <cstddef>
+#include <string>
+
+// A byte count in the largest of the units K, M and G (powers of 1024) that it is greater than, with two
+// decimals; up to 1024 bytes a plain number: "1024", "1.00K", "1024.00K", "1.00M".
+std::string SizeText(std::size_t bytes);
+
+// The same for a count of K, which never comes out as a plain number: "0.00K", "1024.00K", "1.00M".
+std::string KiloSizeText(double kilobytes);
+
+// `text` filled with blanks to `width`, on the left if `rightAlign`, else on the right. Nothing is ever cut.
+std::string FitField(const std::string& text, unsigned int width, bool rightAlign);
+
+// `path` from the "src/" of its first "/src/" on; whole if there is none.
+std::string ShortSourcePath(const std::string& path);
+
+#endif
