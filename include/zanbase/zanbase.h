@@ -16,6 +16,7 @@
 #include "zanbase/sleep.h"
 #include "zanbase/sort.h"
 #include "zanbase/string_makers.h"
+#include "zanbase/terminal.h"
 #include "zanbase/thread.h"
 
 /// The version of these headers; the same numbers stand in the CMake package and in `zanbase.pc`.

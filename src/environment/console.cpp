@@ -1,0 +1,22 @@
+// The console's flag logic; what a console is, the platform knows.
+#include "platform/console.h"
+
+#include "zanbase/terminal.h"
+
+namespace {
+
+int mnConsoleCreated = 0;  // 1 from the first console on, for the life of the process
+
+}  // namespace
+
+int CreateConsole() {
+    if (mnConsoleCreated != 0) return 1;
+    if (!OpenConsole()) return 0;
+    mnConsoleCreated = 1;
+    ConnectStandardStreams();
+    return 1;
+}
+
+int DestroyConsole() { return CloseConsole() ? 1 : 0; }
+
+void ShowConsole(int show) { ShowConsoleWindow(show != 0); }

@@ -1,0 +1,21 @@
+// Contract: a text console for the process. The four functions are for one thread at a time.
+#ifndef ZANBASE_PLATFORM_CONSOLE_H
+#define ZANBASE_PLATFORM_CONSOLE_H
+
+// Gives the process a console and waits until it can be used. False, with nothing changed, where none can be
+// had. To be called at most once with success.
+bool OpenConsole() noexcept;
+
+// Makes the standard input, output and error, in this order, use the open console, and all three unbuffered.
+// What they hold for output is written to where they went before, and an error or end of input is forgotten.
+// A stream that can't be connected stays where it was, as usable as before; there is no other sign of it.
+void ConnectStandardStreams() noexcept;
+
+// Takes the console away; those standard streams that use it go to the null device, unbuffered. False if no
+// console is open, or if it had to be left as it is.
+bool CloseConsole() noexcept;
+
+// Shows or hides the console's window, if it has one that this process may hide; else does nothing.
+void ShowConsoleWindow(bool show) noexcept;
+
+#endif

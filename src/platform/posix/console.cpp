@@ -1,0 +1,77 @@
+// The console of a POSIX process: the terminal it was started from, or else a terminal window of its own.
+#include "platform/console.h"
+
+#include <array>
+#include <cstdio>
+
+#include <stdio_ext.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include "platform/posix/terminal_window.h"
+
+namespace {
+
+int gnConsole = -1;        // descriptor on the open console, -1 if none; kept, since the streams may move on
+bool gbOwnWindow = false;  // whether the open console is a window that we started
+
+struct StandardStream {
+    std::FILE* stream;
+    int descriptor;
+};
+
+std::array<StandardStream, 3> StandardStreams() noexcept {
+    return {{{stdin, STDIN_FILENO}, {stdout, STDOUT_FILENO}, {stderr, STDERR_FILENO}}};
+}
+
+// A failed dup2 leaves the stream where it was. A stream that the program closed stays closed: the C library
+// answers these calls with an error.
+void Connect(const StandardStream& standard, int target) noexcept {
+    std::fflush(standard.stream);
+    if (standard.stream == stdin) __fpurge(stdin);  // a pipe's input, which can't be given back
+    dup2(target, standard.descriptor);
+    std::clearerr(standard.stream);
+    std::setvbuf(standard.stream, nullptr, _IONBF, 0);
+}
+
+bool UsesConsole(int descriptor) noexcept {
+    struct stat console {};
+    struct stat used {};
+    return fstat(gnConsole, &console) == 0 && fstat(descriptor, &used) == 0 &&
+           console.st_dev == used.st_dev && console.st_ino == used.st_ino;
+}
+
+}  // namespace
+
+bool OpenConsole() noexcept {
+    gnConsole = OpenAboveStreams("/dev/tty");
+    gbOwnWindow = gnConsole < 0;
+    if (gbOwnWindow) gnConsole = OpenTerminalWindow();
+    return gnConsole >= 0;
+}
+
+void ConnectStandardStreams() noexcept {
+    for (const StandardStream& standard : StandardStreams()) Connect(standard, gnConsole);
+}
+
+bool CloseConsole() noexcept {
+    if (gnConsole < 0) return false;
+    const int null_device = OpenAboveStreams("/dev/null");
+    if (null_device < 0) return false;
+    for (const StandardStream& standard : StandardStreams()) {
+        if (UsesConsole(standard.descriptor)) Connect(standard, null_device);
+    }
+    close(null_device);
+    close(gnConsole);  // a window of our own ends once nothing uses it
+    gnConsole = -1;
+    gbOwnWindow = false;
+    return true;
+}
+
+void ShowConsoleWindow(bool show) noexcept {
+    constexpr char kRestore[] = "\033[1t";
+    constexpr char kIconify[] = "\033[2t";
+    if (!gbOwnWindow || gnConsole < 0) return;
+    // Fails only if the user has closed the window; then there is none to show or hide.
+    if (write(gnConsole, show ? kRestore : kIconify, sizeof(kRestore) - 1) < 0) return;
+}

@@ -1,0 +1,144 @@
+// Starting an xterm for a terminal that this process has open.
+//
+// The pseudo-terminal has two ends. We keep the terminal, xterm alone gets the other one. So whatever goes
+// wrong on its side, closes that end and wakes us; and when we close the terminal, xterm sees the end and
+// goes. Once it has a window, xterm types a line with the window's number into the terminal.
+#include "platform/posix/terminal_window.h"
+
+#include <cerrno>
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <utility>
+
+#include <fcntl.h>
+#include <poll.h>
+#include <sys/syscall.h>
+#include <sys/wait.h>
+#include <termios.h>
+#include <unistd.h>
+
+#include "platform/clock.h"
+
+namespace {
+
+constexpr unsigned int kStartLimitMs = 30000;
+
+// Where xterm finds its end.
+constexpr int kXtermEnd = 3;
+
+// Window operations for xterm to refuse: its usual list without restoring and iconifying.
+char gaResources[] =
+    "*disallowedWindowOps: 3,4,5,6,7,8,9,11,13,14,18,19,20,21,GetSelection,SetSelection,SetWinLines,SetXprop";
+
+// A descriptor that is closed with its scope.
+class Descriptor {
+public:
+    explicit Descriptor(int descriptor) noexcept : mnDescriptor(descriptor) {}
+    ~Descriptor() { Close(); }
+    Descriptor(const Descriptor&) = delete;
+    Descriptor& operator=(const Descriptor&) = delete;
+
+    int Get() const noexcept { return mnDescriptor; }
+    int Release() noexcept { return std::exchange(mnDescriptor, -1); }
+    void Close() noexcept {
+        if (mnDescriptor >= 0) close(Release());
+    }
+
+private:
+    int mnDescriptor;  // -1: none
+};
+
+using TerminalPath = char[64];
+
+// Opens the terminal of the pseudo-terminal whose other end is `end`, and tells its path.
+int OpenTerminalOf(int end, TerminalPath& path) noexcept {
+    const bool named = grantpt(end) == 0 && unlockpt(end) == 0 && ptsname_r(end, path, sizeof(path)) == 0;
+    return named ? OpenAboveStreams(path) : -1;
+}
+
+// Ends a copy of this process at once. The raw call: some tools hang work onto _exit, the flushing of streams
+// for one, and what waits in our streams is ours to write.
+[[noreturn]] void LeaveCopy() noexcept {
+    for (;;) syscall(SYS_exit_group, 0);
+}
+
+// Becomes xterm, with `end` and the null device as its only descriptors and a session of its own, so that no
+// signal to our process group reaches it. Runs in a copy of a process that may have had other threads: calls
+// nothing that takes a lock.
+[[noreturn]] void BecomeXterm(char* option, int end) noexcept {
+    setsid();
+    sigset_t none;
+    sigemptyset(&none);
+    sigprocmask(SIG_SETMASK, &none, nullptr);
+    if (end == kXtermEnd) {
+        fcntl(end, F_SETFD, 0);
+    } else {
+        dup2(end, kXtermEnd);
+    }
+    const int null_device = open("/dev/null", O_RDWR);
+    for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream) dup2(null_device, stream);
+    close_range(kXtermEnd + 1, ~0U, 0);
+    char name[] = "xterm";
+    char resource_option[] = "-xrm";
+    char* const arguments[] = {name, option, resource_option, gaResources, nullptr};
+    execvp(name, arguments);
+    LeaveCopy();
+}
+
+// Starts xterm as a process that isn't our child, so that no wait of the program ever meets it.
+void StartXterm(const char* terminal_name, int end) noexcept {
+    char option[sizeof(TerminalPath) + 16];
+    std::snprintf(option, sizeof(option), "-S%s/%d", terminal_name, kXtermEnd);
+    const pid_t between = fork();
+    if (between == 0) {
+        if (fork() == 0) BecomeXterm(option, end);
+        LeaveCopy();
+    }
+    while (between > 0 && waitpid(between, nullptr, 0) < 0 && errno == EINTR) {
+    }
+}
+
+// Waits for the line that says that the window is there; false if the other end was closed before.
+bool WindowAppears(int terminal) noexcept {
+    const unsigned int start = ReadTicks();
+    pollfd news{terminal, POLLIN, 0};
+    int ready = 0;
+    do {
+        const unsigned int waited = ReadTicks() - start;
+        if (waited >= kStartLimitMs) return false;
+        ready = poll(&news, 1, static_cast<int>(kStartLimitMs - waited));
+    } while (ready < 0 && errno == EINTR);
+    char line[64];
+    return ready > 0 && read(terminal, line, sizeof(line)) > 0;
+}
+
+}  // namespace
+
+int OpenAboveStreams(const char* path) noexcept {
+    Descriptor opened(open(path, O_RDWR | O_NOCTTY | O_CLOEXEC));
+    if (opened.Get() > STDERR_FILENO) return opened.Release();
+    return fcntl(opened.Get(), F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+}
+
+int OpenTerminalWindow() noexcept {
+    const char* const display = std::getenv("DISPLAY");
+    if (display == nullptr || *display == '\0') return -1;
+    TerminalPath path;
+    Descriptor end(posix_openpt(O_RDWR | O_NOCTTY | O_CLOEXEC));
+    Descriptor terminal(OpenTerminalOf(end.Get(), path));
+    if (terminal.Get() < 0) return -1;
+
+    termios modes{};
+    tcgetattr(terminal.Get(), &modes);
+    termios silent = modes;
+    silent.c_lflag &= ~static_cast<tcflag_t>(ECHO);  // or the window would show the line that xterm types
+    tcsetattr(terminal.Get(), TCSANOW, &silent);
+    StartXterm(std::strrchr(path, '/') + 1, end.Get());
+    end.Close();
+    if (!WindowAppears(terminal.Get())) return -1;
+    modes.c_iflag |= IUTF8;  // the erase key takes whole characters
+    tcsetattr(terminal.Get(), TCSANOW, &modes);
+    return terminal.Release();
+}
