@@ -1,9 +1,16 @@
 # Makes message catalogues for tests and examples.
 
-find_program(ZANBASE_MSGFMT msgfmt REQUIRED)
+find_program(ZANBASE_MSGFMT msgfmt)
+if(ZANBASE_BUILD_TESTS AND NOT ZANBASE_MSGFMT)
+    message(FATAL_ERROR "The tests need msgfmt, which the package gettext has")
+endif()
 
-# Compiles `po` with `target` to locale/LANGUAGE/LC_MESSAGES/ZAN.mo in the target's build folder.
+# Compiles `po` with `target` to locale/LANGUAGE/LC_MESSAGES/ZAN.mo in the target's build folder. Without msgfmt
+# there is no catalogue, and the target speaks English.
 function(zanbase_catalogue target language po)
+    if(NOT ZANBASE_MSGFMT)
+        return()
+    endif()
     set(folder ${CMAKE_CURRENT_BINARY_DIR}/locale/${language}/LC_MESSAGES)
     set(source ${CMAKE_CURRENT_SOURCE_DIR}/${po})
     add_custom_command(OUTPUT ${folder}/ZAN.mo
