@@ -17,8 +17,8 @@ void ExpectExact(unsigned long long bits) {
 TEST(MkString, WritesTheExactDecimalText) {
     for (unsigned long long two = 1, ten = 1, round = 0; round < 64; ++round, two *= 2, ten *= 10) {
         for (const unsigned long long bits : {two - 1, two, 0 - two, ten - 1, ten, 0 - ten}) {
-            ExpectExact<short, unsigned short, int, unsigned, long, unsigned long, long long,
-                        unsigned long long>(bits);
+            ExpectExact<short, unsigned short, int, unsigned>(bits);
+            ExpectExact<long, unsigned long, long long, unsigned long long>(bits);
         }
     }
 }

@@ -42,7 +42,7 @@ ZANBASE_API char* MkName(unsigned long long value);
 /// `value` in fixed-point form with at most `decimals` places, as `printf` rounds it, without trailing zeros
 /// behind the point. A negative `decimals` asks for 14 significant digits, and never for fewer than the
 /// digits of the whole part. A value that rounds to zero from below keeps its sign ("-0"); an infinity or a
-/// NaN is as `printf` has it.
+/// NaN is as `printf` has it. Under a numeric locale whose decimal sign is not a point no zeros are removed.
 ZANBASE_API char* MkName(double value, int decimals);
 
 /// The text of a `printf` format and its arguments. `format` must not be null. An argument may be an earlier

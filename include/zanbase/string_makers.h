@@ -41,7 +41,8 @@
 /// `value` in fixed-point form with at most `decimals` places, as `printf` rounds it, without trailing zeros
 /// behind the point. A negative `decimals` asks for 14 significant digits, and never for fewer than the
 /// digits of the whole part. The text is cut to its first 63 characters before the zeros go. A value that
-/// rounds to zero from below keeps its sign ("-0"); an infinity or a NaN is as `printf` has it.
+/// rounds to zero from below keeps its sign ("-0"); an infinity or a NaN is as `printf` has it. Under a
+/// numeric locale whose decimal sign is not a point no zeros are removed.
 [[nodiscard]] ZANBASE_API std::string MkString(double value, int decimals);
 
 /// The text of a `printf` format and its arguments: at most the first 4095 characters of it, and nothing from

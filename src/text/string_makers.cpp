@@ -29,7 +29,7 @@ std::string MkString(double value, int decimals) {
     return {area, length};
 }
 
-// The areas are left as the stack has them: clearing 4096 bytes would cost as much as a short format.
+// The areas are left as the stack has them: clearing 4096 bytes would slow a short text down.
 
 std::string MkString(const char* format, ...) {
     char area[kTextBytes];
