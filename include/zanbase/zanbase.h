@@ -7,6 +7,7 @@
 #include "zanbase/clock.h"
 #include "zanbase/export.h"
 #include "zanbase/field_text.h"
+#include "zanbase/global_timer.h"
 #include "zanbase/memory.h"
 #include "zanbase/message_catalogue.h"
 #include "zanbase/mutex.h"

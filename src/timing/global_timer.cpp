@@ -1,0 +1,119 @@
+// The timers: slots in rows, names beside them.
+//
+// A slot is running exactly while moStart has a value:
+//
+//   stopped -> running   Toggle: moStart = clock
+//   running -> stopped   Toggle: mnElapsed += clock - moStart      any -> stopped   ResetAll: mnElapsed = 0
+#include "zanbase/global_timer.h"
+
+#include <algorithm>
+#include <iostream>
+#include <map>
+#include <optional>
+#include <utility>
+#include <vector>
+
+#include "platform/clock.h"
+#include "timing/row_table.h"
+#include "zanbase/mutex.h"
+#include "zanbase/openmp.h"
+
+namespace {
+
+// Held while rows are added in Toggle, and for nothing else.
+const HMutex& GrowthMutex() {
+    static const HMutex mutex;
+    return mutex;
+}
+
+// The value of GetMicroSeconds as a whole number, without the way through a double: below 2^53, some 285
+// years, that way is exact. Differences are right modulo 2^64, also for a clock before 1970.
+unsigned long long ReadClock() {
+    const WallClock now = ReadWallClock();
+    return static_cast<unsigned long long>(now.seconds) * 1000000 + now.milliseconds * 1000ULL;
+}
+
+}  // namespace
+
+struct GlobalTimer::TimerSlot {
+    unsigned long long mnElapsed = 0;           // microseconds, of finished intervals
+    std::optional<unsigned long long> moStart;  // microseconds; when the open interval began
+};
+
+struct GlobalTimer::Impl {
+    // The growth mutex is made here, before the instance is, so that it is there as long as the timers are.
+    Impl() : moRows(static_cast<std::size_t>(OMPGetMaxThreads())) { GrowthMutex(); }
+
+    // At exit nobody is left to be told that the report could not be made.
+    ~Impl() {
+        try {
+            Report();
+        } catch (...) {
+        }
+    }
+
+    Impl(const Impl&) = delete;
+    Impl& operator=(const Impl&) = delete;
+
+    double TotalOf(unsigned long long id) const {
+        double total = 0.0;
+        for (const auto& row : moRows.Rows()) total += static_cast<double>((*row)[id].mnElapsed);
+        return total;
+    }
+
+    // Timers with equal totals come in order of registration.
+    void Report() const {
+        std::vector<std::pair<const std::string*, double>> totals;
+        totals.reserve(moNames.size());
+        for (const auto& [id, name] : moNames) totals.emplace_back(&name, TotalOf(id));
+        std::stable_sort(totals.begin(), totals.end(),
+                         [](const auto& left, const auto& right) { return left.second < right.second; });
+        for (const auto& [name, total] : totals) std::cout << *name << ": " << total / 1000000.0 << '\n';
+        std::cout << std::flush;
+    }
+
+    RowTable<TimerSlot> moRows;  // row t belongs to OpenMP thread number t; slot i of each to timer i
+    std::map<unsigned long long, std::string> moNames;
+};
+
+GlobalTimer& GlobalTimer::GetInstance() {
+    static GlobalTimer instance;
+    return instance;
+}
+
+GlobalTimer::GlobalTimer() : mpoImpl(new Impl) {}
+
+GlobalTimer::~GlobalTimer() { delete mpoImpl; }
+
+GlobalTimer& GlobalTimer::operator=(const GlobalTimer&) = default;
+
+unsigned long long GlobalTimer::RegisterNewTimer(std::string name) {
+    const unsigned long long id = mpoImpl->moRows.RowLength();
+    mpoImpl->moRows.ReserveSlot();
+    mpoImpl->moNames.emplace(id, std::move(name));
+    mpoImpl->moRows.AddSlot();
+    return id;
+}
+
+void GlobalTimer::Toggle(unsigned long long id) {
+    RowTable<TimerSlot>& rows = mpoImpl->moRows;
+    const auto thread = static_cast<std::size_t>(OMPGetThreadNum());
+    if (thread >= rows.Rows().size()) {
+        const HMutexLock lock(&GrowthMutex());
+        rows.GrowTo(thread + 1);
+    }
+    const unsigned long long now = ReadClock();
+    TimerSlot& slot = (*rows.Rows()[thread])[id];
+    if (slot.moStart.has_value()) {
+        slot.mnElapsed += now - *slot.moStart;
+        slot.moStart.reset();
+    } else {
+        slot.moStart = now;
+    }
+}
+
+void GlobalTimer::Report() const { mpoImpl->Report(); }
+
+void GlobalTimer::ResetAll() {
+    for (const auto& row : mpoImpl->moRows.Rows()) std::fill(row->begin(), row->end(), TimerSlot());
+}
