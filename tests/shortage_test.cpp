@@ -5,9 +5,12 @@
 #include <cstdint>
 #include <cstdlib>
 #include <new>
+#include <string>
 #include <thread>
 
+#include "diskio/ledger.h"
 #include "support/run_in_child.h"
+#include "zanbase/disk_io.h"
 #include "zanbase/memory_tables.h"
 
 namespace {
@@ -46,25 +49,26 @@ namespace {
 
 void* At(std::uintptr_t address) { return reinterpret_cast<void*>(address); }
 
+bool FreeForOthers(const HMutex& mutex) {
+    bool taken = false;
+    std::thread([&] {
+        taken = mutex.TryLock();
+        if (taken) mutex.Unlock();
+    }).join();
+    return taken;
+}
+
 class Tables : public HMemory {
 public:
     static bool Missing() { return mpoFileMap == nullptr; }
     static std::size_t Blocks() { return Missing() ? 0 : mpoMemoryMap->size(); }
     static std::size_t Total() { return mnTotalMemory; }
     static std::size_t Peak() { return mnPeekMemory; }
-
-    static bool FreeForOthers() {
-        bool taken = false;
-        std::thread([&] {
-            taken = moMutex.TryLock();
-            if (taken) moMutex.Unlock();
-        }).join();
-        return taken;
-    }
+    static const HMutex& Mutex() { return moMutex; }
 };
 
 void ExpectTracked(std::size_t blocks, std::size_t bytes) {
-    EXPECT_TRUE(Tables::FreeForOthers());
+    EXPECT_TRUE(FreeForOthers(Tables::Mutex()));
     EXPECT_EQ(Tables::Blocks(), blocks);
     EXPECT_EQ(Tables::Total(), bytes);
     EXPECT_EQ(Tables::Peak(), bytes);
@@ -89,6 +93,44 @@ TEST(HMemory, StaysSoundWhenItsOwnMemoryRunsOut) {
         for (std::uintptr_t address = 2; address < 60; ++address)
             FailAtEachCall([&] { alloc(address); }, [&] { ExpectTracked(address - 1, 10 * (address - 1)); });
         ExpectTracked(59, 590);
+        return testing::Test::HasFailure() ? 1 : 0;
+    });
+    EXPECT_EQ(child.exit_code, 0) << child.out;
+}
+
+// Counted opens of `name` and how often a read on `handle` reaches its record.
+void ExpectRecorded(const std::string& name, void* handle, unsigned int opens, unsigned int reads) {
+    ASSERT_NE(LedgerMutexIfMade(), nullptr);
+    EXPECT_TRUE(FreeForOthers(*LedgerMutexIfMade()));
+    HDiskIORead(handle, 0, 0);
+    const auto file = mpoDiskIOFileMap->find(name);
+    ASSERT_NE(file, mpoDiskIOFileMap->end());
+    EXPECT_EQ(file->second.mnOpenCount, opens);
+    EXPECT_EQ(file->second.mnReadCount, reads);
+}
+
+TEST(DiskIO, StaysSoundWhenMemoryRunsOut) {
+    const ChildResult child = RunInChild([] {
+        const std::string first(40, 'a');  // long enough for a block of its own
+        const std::string second(40, 'b');
+        FailAtEachCall([&] { HDiskIOOpen(first, At(1), 1); },
+                       [&] {
+                           if (LedgerMutexIfMade() == nullptr) return;
+                           EXPECT_TRUE(FreeForOthers(*LedgerMutexIfMade()));
+                           HDiskIORead(At(1), 1, 1);  // bound or not, there is nothing to credit
+                           EXPECT_TRUE(mpoDiskIOFileMap->empty());
+                       });
+        ExpectRecorded(first, At(1), 1, 1);
+        const auto bound_before = [&] { return HDiskIOGetFilename(At(1)) == first; };
+        unsigned int reads = 1;
+        FailAtEachCall([&] { HDiskIOOpen(second, At(1), 1); },
+                       [&] { ExpectRecorded(first, At(1), 1, bound_before() ? ++reads : reads); });
+        ExpectRecorded(second, At(1), 1, 1);
+        FailAtEachCall([] { HDiskIOPush(); },
+                       [&, reads = 1U]() mutable { ExpectRecorded(second, At(1), 1, ++reads); });
+        FailAtEachCall([] { HDiskIOPop(); }, [] { FAIL() << "a pop needs no memory"; });
+        EXPECT_EQ(mpoDiskIOFileMap->size(), 2U);
+        EXPECT_TRUE(mpoDiskIOStack->empty());
         return testing::Test::HasFailure() ? 1 : 0;
     });
     EXPECT_EQ(child.exit_code, 0) << child.out;

@@ -5,6 +5,7 @@
 
 #include "zanbase/allocation.h"
 #include "zanbase/clock.h"
+#include "zanbase/disk_io.h"
 #include "zanbase/export.h"
 #include "zanbase/field_text.h"
 #include "zanbase/global_timer.h"

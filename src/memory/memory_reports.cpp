@@ -93,8 +93,6 @@ std::string UsageSection(const char* file, int line, const Usage& usage) {
            "): " + FitField(freed, size_width, true) + "\n\n";
 }
 
-void Write(std::FILE* stream, const std::string& text) { std::fprintf(stream, "%s", text.c_str()); }
-
 }  // namespace
 
 void HMemory::LeakReport(std::FILE* stream) {
@@ -109,15 +107,15 @@ void HMemory::LeakReport(std::FILE* stream) {
     std::multimap<std::size_t, const LeakGroup*> by_size;
     for (const auto& [site, group] : groups) by_size.emplace(group.size, &group);
 
-    Write(stream, kLeakHeading);
+    WriteText(stream, kLeakHeading);
     std::size_t size = 0;
     int blocks = 0;
     for (const auto& [group_size, group] : by_size) {
-        Write(stream, LeakRow(*group));
+        WriteText(stream, LeakRow(*group));
         size += group_size;
         blocks += group->blocks;
     }
-    Write(stream, LeakFooter(size, blocks));
+    WriteText(stream, LeakFooter(size, blocks));
 }
 
 void HMemory::UsageReport(std::FILE* stream) {
@@ -133,13 +131,13 @@ void HMemory::UsageReport(std::FILE* stream) {
     }
     const std::size_t threshold = UsageThreshold(totals);
 
-    Write(stream, "Memory Usage Report By File:\n\n");
+    WriteText(stream, "Memory Usage Report By File:\n\n");
     for (const auto& [allocated, entry] : by_size) {
         if (allocated < threshold) {
             totals.below_threshold += Kilobytes(allocated);
         } else {
-            Write(stream, UsageSection(entry->first.first, entry->first.second, entry->second));
+            WriteText(stream, UsageSection(entry->first.first, entry->first.second, entry->second));
         }
     }
-    Write(stream, UsageFooter(totals, mnPeekMemory));
+    WriteText(stream, UsageFooter(totals, mnPeekMemory));
 }

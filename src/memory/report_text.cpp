@@ -30,3 +30,5 @@ std::string ShortSourcePath(const std::string& path) {
     const std::size_t source = path.find("/src/");
     return source == std::string::npos ? path : path.substr(source + 1);
 }
+
+void WriteText(std::FILE* stream, const std::string& text) { std::fprintf(stream, "%s", text.c_str()); }

@@ -1,8 +1,9 @@
-// Texts that the printed reports share. None of these functions has a state.
+// Texts that the printed reports share, as functions without a state.
 #ifndef ZANBASE_MEMORY_REPORT_TEXT_H
 #define ZANBASE_MEMORY_REPORT_TEXT_H
 
 #include <cstddef>
+#include <cstdio>
 #include <string>
 
 // A byte count in the largest of the units K, M and G (powers of 1024) that it is greater than, with two
@@ -17,5 +18,8 @@ std::string FitField(const std::string& text, unsigned int width, bool rightAlig
 
 // `path` from the "src/" of its first "/src/" on; whole if there is none.
 std::string ShortSourcePath(const std::string& path);
+
+// Writes `text` in one call. What becomes of it is up to the stream's owner.
+void WriteText(std::FILE* stream, const std::string& text);
 
 #endif
