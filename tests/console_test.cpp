@@ -26,7 +26,8 @@ TEST(Console, IsTheTerminalOfTheSession) {
     if (child == 0) {
         dup(STDIN_FILENO);  // the screen is there until nothing uses the terminal any more
         for (int stream = 0; stream < 3; ++stream) close(stream);
-        std::fclose(stdout);  // can't be connected
+        open("/dev/null", O_RDONLY);  // becomes the standard input, which is at its end at once
+        std::fclose(stdout);          // can't be connected
         CLAIM(std::getchar() == EOF);
         CLAIM(CreateConsole() == 1);
         char word[8] = "";
@@ -81,7 +82,7 @@ TEST(Console, IsAWindowOnADisplay) {
         ShowConsole(7);
         CLAIM(DestroyConsole() == 1 && std::printf("late") == 4);
         ShowConsole(1);
-        CLAIM(dup(STDERR_FILENO) == last_descriptor + 1);
+        CLAIM(dup(STDERR_FILENO) == last_descriptor + 1 && dup(STDERR_FILENO) == last_descriptor + 2);
         return 0;
     });
     EXPECT_EQ(child.exit_code, 0);
