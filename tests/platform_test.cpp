@@ -4,6 +4,8 @@
 #include <chrono>
 
 #include "platform/clock.h"
+#include "platform/console.h"
+#include "platform/messages.h"
 #include "platform/processors.h"
 
 namespace {
@@ -32,6 +34,17 @@ TEST(Processors, AreKnownAndMakeUpCores) {
     EXPECT_GE(CountLogicalProcessors(), 1);
     EXPECT_GE(CountProcessorCores(), 1);
     EXPECT_LE(CountProcessorCores(), CountLogicalProcessors());
+}
+
+TEST(Messages, AreTheirOwnTranslationWithoutACatalogue) {
+    SetMessageLocale("no such locale");
+    BindMessages("no_such_domain", nullptr);
+    EXPECT_STREQ(Translate("text"), "text");
+}
+
+TEST(Console, IsLeftAloneWhereNoneIsOpen) {
+    ShowConsoleWindow(false);
+    EXPECT_FALSE(CloseConsole());
 }
 
 }  // namespace

@@ -41,8 +41,8 @@ public:
 
     /// The time since the start; negative if the system time was set back meanwhile.
     [[nodiscard]] double GetTimeInSeconds() const;
-    [[nodiscard]] double GetTimeInMinutes() const;
-    [[nodiscard]] double GetTimeInHours() const;
+    [[nodiscard]] double GetTimeInMinutes() const;  ///< The same in minutes.
+    [[nodiscard]] double GetTimeInHours() const;    ///< The same in hours.
 
     /// The time since the start as text. From a minute on it has weeks, days, hours, minutes and seconds,
     /// without those in front that are zero and without a fraction: "1m00s", "10w00d00h00m00s". From a second

@@ -95,16 +95,19 @@ protected:
     struct MemoryBlock {
         std::size_t mnSize;   ///< bytes
         const char* mpcFile;  ///< not owned, not null
-        int mnLine;
+        int mnLine;           ///< line in that file
     };
 
     /// A saved state; zanbase/memory_tables.h completes it.
     struct MemoryState;
 
+    /// A file's text, by its address, and a line in it.
     using CallSite = std::pair<const char*, int>;
+    /// What each call site did.
     using FileMap =
         boost::unordered::unordered_map<CallSite, MemoryUsage, boost::hash<CallSite>, std::equal_to<CallSite>,
                                         std::allocator<std::pair<const CallSite, MemoryUsage>>>;
+    /// The live blocks by their address.
     using MemoryMap =
         boost::unordered::unordered_map<void*, MemoryBlock, boost::hash<void*>, std::equal_to<void*>,
                                         std::allocator<std::pair<void* const, MemoryBlock>>>;

@@ -20,8 +20,8 @@
 
 /// What `HMemory::Push` saved: copies that share nothing with the live tables.
 struct HMemory::MemoryState {
-    FileMap moFileMap;
-    MemoryMap moMemoryMap;
+    FileMap moFileMap;         ///< usage of each site
+    MemoryMap moMemoryMap;     ///< live blocks by address
     std::size_t mnSavedTotal;  ///< bytes
     std::size_t mnSavedPeek;   ///< bytes
 };

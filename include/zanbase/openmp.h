@@ -24,8 +24,11 @@
 /// where it has no effect.
 class ZANBASE_API OMPDynamic {
 public:
+    /// Asks for dynamic adjustment, or with false for none.
     OMPDynamic(bool enable);
     ~OMPDynamic();
+
+    /// Takes over the notes of the other scope.
     OMPDynamic& operator=(const OMPDynamic&);
 
 private:
@@ -40,6 +43,8 @@ public:
     /// `count` is clamped to the range from 1 to `OMPGetMaxThreads()`.
     OMPThreadCount(long long count);
     ~OMPThreadCount();
+
+    /// Takes over the notes of the other scope.
     OMPThreadCount& operator=(const OMPThreadCount&);
 
 private:
@@ -55,8 +60,11 @@ private:
 /// it. `std::bad_alloc` out of the constructor leaves the settings as they were.
 class ZANBASE_API OMPNested {
 public:
+    /// Asks for nesting, or with false for none.
     OMPNested(bool enable);
     ~OMPNested();
+
+    /// Takes over the notes of the other scope.
     OMPNested& operator=(const OMPNested&);
 
 private:

@@ -1,13 +1,13 @@
 /// @file
 /// What a program asks about its surroundings: terminal codes, the revision, a text console, screen measures.
+///
+/// Nothing here takes a lock. `IMPTerminal`, `IMPAutomaticTerm` and `IsWin32s` may be called by any thread at
+/// any time; the first call of `IMPGetMajorRev`, the console operations and `SetScreenSize` belong to one
+/// thread at a time, as a rule the one that starts the program.
 #ifndef ZANBASE_TERMINAL_H
 #define ZANBASE_TERMINAL_H
 
 #include "zanbase/export.h"
-
-// Nothing here takes a lock. `IMPTerminal`, `IMPAutomaticTerm` and `IsWin32s` may be called by any thread at
-// any time; the first call of `IMPGetMajorRev`, the console operations and `SetScreenSize` belong to one
-// thread at a time, as a rule the one that starts the program.
 
 /// The code of the terminal called `name`, which is not null. A name counts by its beginning, letters of
 /// either case alike, so `vt100-w` is a VT100:

@@ -21,10 +21,10 @@
 #include "zanbase/terminal.h"
 #include "zanbase/thread.h"
 
-/// The version of these headers; the same numbers stand in the CMake package and in `zanbase.pc`.
+/// The version of these headers, first part; the same numbers stand in the CMake package and in `zanbase.pc`.
 #define ZANBASE_VERSION_MAJOR 0
-#define ZANBASE_VERSION_MINOR 1
-#define ZANBASE_VERSION_PATCH 0
+#define ZANBASE_VERSION_MINOR 1  ///< second part
+#define ZANBASE_VERSION_PATCH 0  ///< third part
 /// The version as one number that can be compared: 0.1.0 is 100.
 #define ZANBASE_VERSION (ZANBASE_VERSION_MAJOR * 10000 + ZANBASE_VERSION_MINOR * 100 + ZANBASE_VERSION_PATCH)
 
