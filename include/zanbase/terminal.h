@@ -50,7 +50,7 @@ ZANBASE_API int CreateConsole();
 
 /// Takes away the console that `CreateConsole` made: those of the three standard streams that still use it
 /// go to the null device from now on, unbuffered, and a window of our own closes. 1 if that was done, 0 if
-/// there was no such console. It can't be made again.
+/// there was no such console (or no null device, and then it stays). It can't be made again.
 ZANBASE_API int DestroyConsole();
 
 /// Shows (`show` not 0) or hides (0) the window of the console. On Linux it iconifies and restores a window
