@@ -42,8 +42,16 @@ pkg-config)
     # shellcheck disable=SC2046 # flags are to be split
     without_boost $(pkg-config --cflags zanbase)
     # shellcheck disable=SC2046
-    "$compiler" -std=c++17 -Wall -Wextra -Werror $(pkg-config --cflags zanbase) "$here/consumer/main.cpp" \
+    "$compiler" -std=c++17 -Wall -Wextra -Werror $(pkg-config --cflags zanbase) "$here"/consumer/*.cpp \
         $(pkg-config --libs zanbase) -o "$work/program"
-    LD_LIBRARY_PATH=$library "$work/program"
+    export LD_LIBRARY_PATH=$library
+    "$work/program"
+    # The program on the first screen of the README prints what stands below it.
+    awk '/^```/ {block += 1; next} block == 1' "$sources/README.md" >"$work/first.cpp"
+    awk '/^```/ {block += 1; next} block == 3' "$sources/README.md" >"$work/first.txt"
+    # shellcheck disable=SC2046
+    "$compiler" -std=c++17 $(pkg-config --cflags zanbase) "$work/first.cpp" $(pkg-config --libs zanbase) \
+        -o "$work/first"
+    diff "$work/first.txt" <("$work/first" | sed '$d')  # but for the blank line at the end
     ;;
 esac
