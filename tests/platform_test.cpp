@@ -8,30 +8,24 @@
 #include "platform/messages.h"
 #include "platform/processors.h"
 
-namespace {
-
-TEST(Clock, GivesTheWallTimeInMilliseconds) {
+TEST(PlatformClock, GivesTheWallTimeInMilliseconds) {
     const WallClock before = ReadWallClock();
     const long long now = std::chrono::system_clock::now().time_since_epoch() / std::chrono::milliseconds(1);
     const WallClock after = ReadWallClock();
-    EXPECT_LT(before.milliseconds, 1000);
     EXPECT_LE(before.seconds * 1000 + before.milliseconds, now);
     EXPECT_GE(after.seconds * 1000 + after.milliseconds, now);
+    EXPECT_LT(after.milliseconds, 1000);
 }
 
-TEST(Clock, PausesForAtLeastTheTimeGiven) {
-    for (const unsigned int ms : {0U, 1U, 2U, 30U}) {
-        const unsigned int ticks_before = ReadTicks();
-        const auto before = std::chrono::steady_clock::now();
-        PauseFor(ms);
-        const auto passed = (std::chrono::steady_clock::now() - before) / std::chrono::milliseconds(1);
-        EXPECT_GE(passed, ms);
-        EXPECT_GE(ReadTicks() - ticks_before, ms);
-    }
+TEST(PlatformClock, PausesForAtLeastTheTimeGiven) {
+    const unsigned int start = ReadTicks();
+    const auto before = std::chrono::steady_clock::now();
+    for (const unsigned int ms : {0U, 1U, 29U}) PauseFor(ms);
+    EXPECT_GE(std::chrono::steady_clock::now() - before, std::chrono::milliseconds(30));
+    EXPECT_GE(ReadTicks() - start, 30U);
 }
 
-TEST(Processors, AreKnownAndMakeUpCores) {
-    EXPECT_GE(CountLogicalProcessors(), 1);
+TEST(PlatformProcessors, AreKnownAndMakeUpCores) {
     EXPECT_GE(CountProcessorCores(), 1);
     EXPECT_LE(CountProcessorCores(), CountLogicalProcessors());
 }
@@ -46,5 +40,3 @@ TEST(Console, IsLeftAloneWhereNoneIsOpen) {
     ShowConsoleWindow(false);
     EXPECT_FALSE(CloseConsole());
 }
-
-}  // namespace
