@@ -10,10 +10,10 @@
 // step within 32 bits is due to L. Schrage, "A more portable Fortran random number generator", ACM
 // Transactions on Mathematical Software 5(2), 1979, pages 132 to 138.
 //
-// All draws step one sequence, which a seed fixes; a program that never seeds gets the same sequence every
-// time, the one of the seed -1 from its start. There is no lock: one thread at a time may draw or seed, and
-// threads that share the generator hold a lock of their own around each call. Not for secrets, nor where more
-// than 2^31 draws, several streams or good low bits are needed; `<random>` has generators for that.
+// All draws step one sequence, which a seed fixes; a program that never seeds gets the same one every time:
+// 2147466840, 1865008398, 524833574, … There is no lock: one thread at a time may draw or seed, and threads
+// that share the generator hold a lock of their own around each call. Not for secrets, nor where more than
+// 2^31 draws, several streams or good low bits are needed; `<random>` has generators for that.
 
 /// Seeds the generator and returns the seed, so that a run can be repeated. The seed itself is never drawn:
 /// the state becomes one step from it.
