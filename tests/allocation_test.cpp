@@ -3,6 +3,7 @@
 
 #include <gtest/gtest.h>
 
+#include <csignal>
 #include <cstdlib>
 #include <cstring>
 #include <new>
@@ -11,10 +12,9 @@
 
 namespace {
 
-// How the next attempts of this thread go: the first `failures` of them fail, by null or by an exception.
-thread_local int failures = 0;
-thread_local bool throws = false;
-thread_local int attempts = 0;
+// The first `failures` attempts fail, by null or by an exception.
+int failures = 0, attempts = 0, handled = 0;
+bool throws = false;
 
 bool Fails() {
     ++attempts;
@@ -24,14 +24,15 @@ bool Fails() {
     return true;
 }
 
-int handled = 0;
-void CountingHandler() { ++handled; }
-void OtherHandler() { handled += 100; }
-void ThrowingHandler() { throw std::bad_alloc(); }
-void RemovingHandler() {
-    ++handled;
-    HOutOfMemoryHandler(nullptr);
+void FailNext(int times, bool by_exception = false) {
+    handled = attempts = 0;
+    failures = times;
+    throws = by_exception;
 }
+
+void Count() { ++handled; }
+void Throw() { throw std::bad_alloc(); }
+void CountAndLeave() { ++handled, HOutOfMemoryHandler(nullptr); }
 
 }  // namespace
 
@@ -48,113 +49,71 @@ void* __wrap_realloc(void* ptr, std::size_t size) { return Fails() ? nullptr : _
 
 namespace {
 
-struct Allocator {
+const struct {
     const char* name;
     void* (*allocate)();
-    bool passes_bad_alloc;  // a std::bad_alloc out of the attempt itself
-};
+    bool passes_bad_alloc;  // one out of the attempt itself
+} kAllocators[] = {{"HMalloc", [] { return HMalloc(0); }, false},
+                   {"HCalloc", [] { return HCalloc(4, 10); }, false},
+                   {"HRealloc", [] { return HRealloc(nullptr, 40); }, false},
+                   {"HString", [] { return static_cast<void*>(HString("text")); }, true},
+                   {"HString(null)", [] { return static_cast<void*>(HString(nullptr)); }, true}};
 
-class Allocators : public testing::TestWithParam<Allocator> {
-protected:
-    void SetUp() override { HOutOfMemoryHandler(CountingHandler); }
-    void TearDown() override { HOutOfMemoryHandler(nullptr); }
-
-    static void* AllocateFailing(int times, bool by_exception = false) {
-        handled = attempts = 0;
-        failures = times;
-        throws = by_exception;
-        void* const block = GetParam().allocate();
-        failures = 0;
-        throws = false;
-        return block;
-    }
-};
-
-TEST_P(Allocators, CallTheHandlerOnceForEachFailedAttempt) {
-    for (const int times : {0, 1, 2, 7}) {
-        void* const block = AllocateFailing(times);
-        EXPECT_NE(block, nullptr);
-        EXPECT_EQ(handled, times);
-        EXPECT_EQ(attempts, times + 1);
-        std::free(block);
-    }
-}
-
-TEST_P(Allocators, TakeABadAllocOfTheAttemptForANull) {
-    if (GetParam().passes_bad_alloc) {
-        EXPECT_THROW(AllocateFailing(1, true), std::bad_alloc);
-        EXPECT_EQ(handled, 0);
-        failures = 0;
-        throws = false;
-    } else {
-        void* const block = AllocateFailing(2, true);
-        EXPECT_NE(block, nullptr);
-        EXPECT_EQ(handled, 2);
-        std::free(block);
+TEST(Allocators, CallTheHandlerOnceForEachFailedAttempt) {
+    for (const auto& [name, allocate, passes_bad_alloc] : kAllocators) {
+        SCOPED_TRACE(name);
+        for (void (*const handler)() :
+             {Count, CountAndLeave}) {  // who leaves is called once, and patience follows
+            HOutOfMemoryHandler(handler);
+            FailNext(3);
+            std::free(allocate());
+            EXPECT_EQ(attempts, 4);
+            EXPECT_EQ(handled, handler == Count ? 3 : 1);
+        }
+        HOutOfMemoryHandler(Count);
+        FailNext(1, true);
+        if (passes_bad_alloc) {
+            EXPECT_THROW(allocate(), std::bad_alloc);
+        } else {
+            std::free(allocate());
+        }
+        EXPECT_EQ(handled, passes_bad_alloc ? 0 : 1);
+        HOutOfMemoryHandler(Throw);
+        FailNext(1);
+        EXPECT_THROW(allocate(), std::bad_alloc);
+        EXPECT_EQ(attempts, 1);
     }
 }
 
-TEST_P(Allocators, PassOnWhatTheHandlerThrows) {
-    HOutOfMemoryHandler(ThrowingHandler);
-    EXPECT_THROW(AllocateFailing(1), std::bad_alloc);
-    EXPECT_EQ(attempts, 1);
-}
-
-TEST_P(Allocators, SurviveAShortageAfterTheHandlerTookItselfAway) {
-    HOutOfMemoryHandler(RemovingHandler);
-    void* const block = AllocateFailing(3);
-    EXPECT_NE(block, nullptr);
-    EXPECT_EQ(handled, 1);
-    EXPECT_EQ(attempts, 4);
-    std::free(block);
-}
-
-TEST_P(Allocators, StopTheProcessWhenNobodyHandlesALastingShortage) {
+TEST(Allocators, StopTheProcessWhenNobodyHandlesALastingShortage) {
     const ChildResult child = RunInChild([] {
         HOutOfMemoryHandler(nullptr);
-        AllocateFailing(1000000);
-        return 0;
+        FailNext(1000000);
+        return HMalloc(8) == nullptr ? 1 : 2;
     });
     EXPECT_EQ(child.signal, SIGABRT);
     EXPECT_EQ(child.err, "zanbase: memory exhausted and no handler installed\n");
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    All, Allocators,
-    testing::Values(Allocator{"HMalloc", [] { return HMalloc(40); }, false},
-                    Allocator{"HMallocZero", [] { return HMalloc(0); }, false},
-                    Allocator{"HCalloc", [] { return HCalloc(4, 10); }, false},
-                    Allocator{"HReallocFresh", [] { return HRealloc(nullptr, 40); }, false},
-                    Allocator{"HString", [] { return static_cast<void*>(HString("text")); }, true},
-                    Allocator{"HStringNull", [] { return static_cast<void*>(HString(nullptr)); }, true}),
-    [](const auto& test) { return test.param.name; });
-
-TEST(HRealloc, KeepsTheOldBlockUntilAnAttemptSucceeds) {
-    HOutOfMemoryHandler(CountingHandler);
+TEST(HRealloc, KeepsTheOldBlockUntilAnAttemptSucceedsAndAsksOnceForNothing) {
+    HOutOfMemoryHandler(Count);
+    FailNext(0);
     char* block = static_cast<char*>(HMalloc(4));
     std::memcpy(block, "abc", 4);
-    failures = 2;
+    FailNext(2);
     block = static_cast<char*>(HRealloc(block, 4000));
     EXPECT_STREQ(block, "abc");
-    handled = attempts = 0;
-    failures = 1;
-    EXPECT_EQ(HRealloc(block, 0), nullptr);  // one attempt, its null handed on, no handler
-    EXPECT_EQ(attempts, 1);
-    EXPECT_EQ(handled, 0);
-    std::free(block);
-    HOutOfMemoryHandler(nullptr);
-}
-
-TEST(HCalloc, ZeroFills) {
-    void* const dirty = HMalloc(64);
-    std::memset(dirty, 0xff, 64);
-    std::free(dirty);
-    char* const block = static_cast<char*>(HCalloc(8, 8));
-    EXPECT_EQ(std::string(block, 64), std::string(64, '\0'));
+    for (const bool by_exception : {false, true}) {
+        FailNext(2, by_exception);
+        EXPECT_EQ(HRealloc(block, 0), nullptr);
+        EXPECT_EQ(attempts, 1);
+        EXPECT_EQ(handled, 0);
+    }
+    FailNext(0);
     std::free(block);
 }
 
-TEST(HString, CopiesIntoABlockOfItsOwn) {
+TEST(HString, HasABlockOfItsOwn) {
     char source[] = "text";
     char* const copy = HString(source);
     source[0] = 'T';
@@ -164,18 +123,6 @@ TEST(HString, CopiesIntoABlockOfItsOwn) {
     EXPECT_EQ(empty[0], '\0');
     std::memset(empty, 'x', 16);  // sixteen bytes are there; the address sanitizer looks on
     std::free(empty);
-}
-
-TEST(HHandleOutOfMemory, CallsTheNewestHandlerOnly) {
-    handled = 0;
-    HHandleOutOfMemory();
-    HOutOfMemoryHandler(OtherHandler);
-    HOutOfMemoryHandler(CountingHandler);
-    HHandleOutOfMemory();
-    EXPECT_EQ(handled, 1);
-    HOutOfMemoryHandler(nullptr);
-    HHandleOutOfMemory();
-    EXPECT_EQ(handled, 1);
 }
 
 }  // namespace
