@@ -5,17 +5,19 @@
 
 #include "zanbase/export.h"
 
-// A field is a run of characters of known width inside a larger record. Writers put text into it without a
-// terminator and leave the bytes behind the text alone; readers stop at its width, or at a terminator before:
+// A field is a stretch of a record that has its place and width, and no terminator of its own. Printing a
+// number touches as many characters as its text has; reading ends with the width, or with a terminator
+// before:
 //
 //     char record[20];
 //     TextFieldFill(record, "pump 7", 10);          // "pump 7    "
 //     PrintDouble(record + 10, "%10.3E", 1500.0);   // " 1.500D+03"
 //     double value = ScanDouble(record + 10, 10);   // 1500.0
 //
-// Nothing here allocates, fails or reports. No pointer may be null but `buffer` of `FormatDouble`. Any thread
-// may call any of these functions at any time, except where a function says that its result lies in a static
-// area: calls of such a function must not overlap, and its text holds until the next call.
+// Nothing here allocates, fails or reports. No pointer may be null but `buffer` of `FormatDouble`. Real
+// numbers have the decimal point of LC_NUMERIC, which `InitLocale` keeps at ".". Any thread may call any of
+// these functions at any time, except where a function says that its result lies in a static area: calls of
+// such a function must not overlap, and its text holds until the next call.
 
 /// The general text of `value`, written to `buffer` (at least 25 bytes), which is returned. A null `buffer`
 /// means a static area. A value strictly between -2^31 and 2^31 - 1 that is whole, or above a whole number by
@@ -54,15 +56,16 @@ ZANBASE_API void PrintInt(char* field, const char* format, long value) noexcept;
 /// characters, then blanks. Does nothing if `width` is 0 or less.
 ZANBASE_API void TextFieldFill(char* field, const char* text, int width) noexcept;
 
-/// Changes `a` to `z` to upper case in place up to the terminator; other bytes stay, whatever the locale.
+/// Makes capitals of the letters `a` to `z` of a terminated text, in place. All other bytes stay, whatever
+/// the locale.
 ZANBASE_API void UCaseString(char* text) noexcept;
 
-/// Changes `A` to `Z` to lower case in place up to the terminator; other bytes stay, whatever the locale.
+/// Makes small letters of `A` to `Z` in the same way.
 ZANBASE_API void LCaseString(char* text) noexcept;
 
-/// `((value + multiple - 1) / multiple) * multiple` in 32-bit arithmetic that wraps, with the division cut
-/// towards zero: for positive arguments the smallest multiple of `multiple` not below `value`. `multiple`
-/// must not be 0.
+/// Rounds a `value` that isn't negative up to a multiple of a positive `multiple`: 10 and 4 give 12. For any
+/// arguments it is `(value + multiple - 1) / multiple * multiple`, where the sum wraps at 32 bits and the
+/// division cuts towards zero, so -5 and 4 give 0. `multiple` must not be 0.
 [[nodiscard]] ZANBASE_API int NextMult(int value, int multiple) noexcept;
 
 /// Stores `value` cut towards zero in `*whole` and returns `value` minus that. Unlike the runtime's `modf`,

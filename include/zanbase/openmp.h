@@ -17,8 +17,9 @@
 //
 // The settings are the runtime's and belong to the calling thread there; a scope must end on the thread that
 // began it. Scopes end in reverse order of their beginning. To set the threads of a single region, its
-// `num_threads` clause is enough and no scope is needed. A copy, or an object assigned to, makes no call of
-// the runtime by that, and its destructor sets back what its source would.
+// `num_threads` clause is enough and no scope is needed. Copying and assigning hand on the notes, so the
+// destructor sets back what that of the source would; of these only an assignment to an `OMPNested` may call
+// the runtime, as told there.
 
 /// Sets the runtime's dynamic adjustment of team sizes for a scope. Not for use inside a parallel region,
 /// where it has no effect.
@@ -75,12 +76,13 @@ private:
 
 // The functions below may be called by any thread at any time, in parallel regions too.
 
-/// The library's thread limit, at least 1: what `OMPSetMaxThreads` set, else `OMP_NUM_THREADS` of the
-/// environment if that is a positive number, else the count of logical processors. It is settled at the first
-/// call, and the environment is not read again.
+/// How many threads a scope of this library may ask for, 1 or more: what `OMPSetMaxThreads` set, else
+/// `OMP_NUM_THREADS` of the environment if that is a positive number, else the count of logical processors.
+/// It is settled at the first call, and the environment is not read again.
 [[nodiscard]] ZANBASE_API int OMPGetMaxThreads();
 
-/// Sets the limit, at least 1. It calls nothing in the runtime: only later scopes look at it.
+/// Sets that limit, to 1 if `limit` is less. The runtime's own settings stay; scopes that begin later go by
+/// it.
 ZANBASE_API void OMPSetMaxThreads(int limit);
 
 /// The number of threads in the current team, 1 outside a parallel region.

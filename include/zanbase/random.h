@@ -15,8 +15,8 @@
 // that share the generator hold a lock of their own around each call. Not for secrets, nor where more than
 // 2^31 draws, several streams or good low bits are needed; `<random>` has generators for that.
 
-/// Seeds the generator and returns the seed, so that a run can be repeated. The seed itself is never drawn:
-/// the state becomes one step from it.
+/// Begins the sequence of `seed` and returns it: whoever keeps it can have the same run again. The state
+/// becomes one step from the seed, so the first draw is two steps from it.
 ///
 /// 0 takes a seed from the wall clock: its microseconds modulo 2^31. No seed is refused, but 2147483647,
 /// -2147483647 and a clock's seed of 0 lead into a state that steps to itself: `IMPRandInt` then gives

@@ -39,10 +39,10 @@
 [[nodiscard]] ZANBASE_API std::string MkString(unsigned long long value);
 
 /// `value` in fixed-point form with at most `decimals` places, as `printf` rounds it, without trailing zeros
-/// behind the point. A negative `decimals` asks for 14 significant digits, and never for fewer than the
-/// digits of the whole part. The text is cut to its first 63 characters before the zeros go. A value that
-/// rounds to zero from below keeps its sign ("-0"); an infinity or a NaN is as `printf` has it. Under a
-/// numeric locale whose decimal sign is not a point no zeros are removed.
+/// behind the point. With `decimals` below 0 it has 14 significant digits, or all of the whole part if those
+/// are more. The text is cut to its first 63 characters before the zeros go. A value that rounds to zero from
+/// below keeps its sign ("-0"); an infinity or a NaN is as `printf` has it. Under a numeric locale whose
+/// decimal sign is not a point no zeros are removed.
 [[nodiscard]] ZANBASE_API std::string MkString(double value, int decimals);
 
 /// The text of a `printf` format and its arguments: at most the first 4095 characters of it, and nothing from
@@ -53,9 +53,9 @@
 [[nodiscard]] ZANBASE_API std::string MkStringV(const char* format, va_list arguments)
     ZANBASE_PRINTF_FORMAT(1, 0);
 
-/// The given strings joined by "|", at most the first 4095 characters of the whole. The list ends with a null
-/// pointer, which may be `first` itself. Empty strings at the head bring no separator; behind other text each
-/// brings one.
+/// Joins strings with "|" up to the null pointer that ends the list; `first` may be it. No separator goes
+/// before the first string that isn't empty; every string behind that one has its own, empty or not ("a||b").
+/// The whole is cut to its first 4095 characters.
 [[nodiscard]] ZANBASE_API std::string MkTokenString(const char* first, ...) ZANBASE_NULL_TERMINATED;
 
 #endif
