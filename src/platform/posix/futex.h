@@ -1,16 +1,14 @@
 // The one place that blocks: waits on a 32-bit word, with one rule for deadlines and for threads that are
 // ended while they wait. Lock, condition and semaphore of this back end stand on it.
 //
-// A wake-up is given to one sleeping thread. If that thread is ended before it acts on the wake-up, nobody
-// else would ever get it. So a thread notes the word that it sleeps on, or is about to wake others on, in
-// `tnpWakeDebt`, and the code that ends a thread calls PassWakeUpOn() on it as its last act. A wake-up too
-// many is harmless: everybody who sleeps on a word looks at it again.
+// A wake-up goes to one sleeping thread. If that thread is ended before it acts on it, or the thread that is
+// about to wake it is ended first, nobody would get it. So a thread notes the word that it sleeps on or wakes
+// others on in `toWakeDebts`, and the code that ends a thread calls PassWakeUpOn() on it as its last act. A
+// wake-up too many is harmless: everybody who sleeps on a word looks at it again.
 #ifndef ZANBASE_PLATFORM_POSIX_FUTEX_H
 #define ZANBASE_PLATFORM_POSIX_FUTEX_H
 
 #include <atomic>
-#include <cerrno>
-#include <climits>
 #include <ctime>
 
 #include <linux/futex.h>
@@ -22,38 +20,65 @@ static_assert(sizeof(FutexWord) == 4 && FutexWord::is_always_lock_free, "the ker
 
 #define ZANBASE_FAST_THREAD_LOCAL __thread __attribute__((tls_model("initial-exec")))
 
-extern ZANBASE_FAST_THREAD_LOCAL FutexWord* tnpWakeDebt;
+constexpr int kEverySleeper = 0x7fffffff;
 
-inline void WakeSleepers(FutexWord& word, int most) noexcept {
-    syscall(SYS_futex, &word, FUTEX_WAKE_PRIVATE, most, nullptr, nullptr, 0);
+// Wakes up to `most` threads that sleep on `word` and tells how many there were. Touches only the address, so
+// the word may be gone already.
+inline int WakeSleepers(FutexWord& word, int most) noexcept {
+    return static_cast<int>(syscall(SYS_futex, &word, FUTEX_WAKE_PRIVATE, most, nullptr, nullptr, 0));
 }
 
 // Sleeps as long as `word` is `expected`, until a wake-up or the absolute monotonic `deadline` (null: none).
-// False if the deadline has passed. May return true for no reason, so callers look at the word again.
+// False if the deadline has passed. True says only that it is time to look at the word again.
 bool SleepWhile(FutexWord& word, unsigned int expected, const timespec* deadline) noexcept;
 
 // Now plus `ms` milliseconds on the monotonic clock.
 timespec DeadlineIn(unsigned int ms) noexcept;
 
-// Called on a thread that is being ended: another sleeper gets the wake-up that this thread may have
-// swallowed.
-inline void PassWakeUpOn() noexcept {
-    if (tnpWakeDebt != nullptr) WakeSleepers(*tnpWakeDebt, 1);
-}
+// What a thread owes to others. A thread that was woken on a condition owes that until it has its lock back,
+// so it can have both kinds of debt at once, but never two of a kind.
+struct WakeDebts {
+    FutexWord* mpoWord;       // a lock's or a semaphore's; null: none
+    FutexWord* mpoCondition;  // null: none
+    unsigned int mnSeen;      // the condition's word as it was when this thread began to wait
+};
+extern ZANBASE_FAST_THREAD_LOCAL WakeDebts toWakeDebts;
 
-// Notes a wake debt for a scope.
+// Called on a thread that is being ended: another sleeper gets the wake-up that this thread may have
+// swallowed, or all get the one that it was about to send. A condition that nobody has signalled since owes
+// nothing.
+void PassWakeUpOn() noexcept;
+
+// Notes a debt on a lock or semaphore for a scope.
 class WakeDebt {
 public:
     explicit WakeDebt(FutexWord& word) noexcept {
-        tnpWakeDebt = &word;
+        toWakeDebts.mpoWord = &word;
         std::atomic_signal_fence(std::memory_order_seq_cst);
     }
     ~WakeDebt() {
         std::atomic_signal_fence(std::memory_order_seq_cst);
-        tnpWakeDebt = nullptr;
+        toWakeDebts.mpoWord = nullptr;
     }
     WakeDebt(const WakeDebt&) = delete;
     WakeDebt& operator=(const WakeDebt&) = delete;
+};
+
+// The same for a condition, whose word was `seen` at the start of the wait.
+class SignalDebt {
+public:
+    SignalDebt(FutexWord& word, unsigned int seen) noexcept {
+        toWakeDebts.mnSeen = seen;
+        std::atomic_signal_fence(std::memory_order_seq_cst);
+        toWakeDebts.mpoCondition = &word;
+        std::atomic_signal_fence(std::memory_order_seq_cst);
+    }
+    ~SignalDebt() {
+        std::atomic_signal_fence(std::memory_order_seq_cst);
+        toWakeDebts.mpoCondition = nullptr;
+    }
+    SignalDebt(const SignalDebt&) = delete;
+    SignalDebt& operator=(const SignalDebt&) = delete;
 };
 
 #endif

@@ -1,0 +1,43 @@
+// The condition of this system: the algorithm of futex_condition.h in the caller's storage.
+#include "platform/condition.h"
+
+#include <new>
+
+#include "platform/posix/futex_condition.h"
+#include "platform/posix/system_lock.h"
+
+namespace {
+
+using Condition = FutexCondition<FutexSystem>;
+static_assert(sizeof(Condition) <= sizeof(NativeCondition::storage));
+
+Condition& In(NativeCondition* condition) noexcept {
+    return *std::launder(reinterpret_cast<Condition*>(condition->storage));
+}
+
+// One level of a lock that the calling thread holds.
+struct OneLevel {
+    SystemLock& mrLock;
+    void Give() const noexcept { mrLock.Give(); }
+    void Take() const noexcept { mrLock.TakeAfterSleep(LockThread()); }
+};
+
+}  // namespace
+
+void OpenCondition(NativeCondition* condition) noexcept { new (condition->storage) Condition; }
+
+bool SleepOn(NativeCondition* condition, NativeLock* lock, unsigned int limit_ms) noexcept {
+    const OneLevel level{In(lock)};
+    if (limit_ms == kForever) return In(condition).Sleep(level, nullptr);
+    if (limit_ms == 0) {
+        level.Give();
+        level.Take();
+        return false;
+    }
+    const timespec deadline = DeadlineIn(limit_ms);
+    return In(condition).Sleep(level, &deadline);
+}
+
+void WakeOne(NativeCondition* condition) noexcept { In(condition).WakeOne(); }
+
+void WakeAll(NativeCondition* condition) noexcept { In(condition).WakeAll(); }

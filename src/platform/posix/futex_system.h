@@ -1,0 +1,49 @@
+// What the algorithms of lock, condition and semaphore need of the system, as one type. They are templates
+// over it, so that a test can run the very same code under every order of steps.
+#ifndef ZANBASE_PLATFORM_POSIX_FUTEX_SYSTEM_H
+#define ZANBASE_PLATFORM_POSIX_FUTEX_SYSTEM_H
+
+#include "platform/posix/futex.h"
+#include "platform/posix/restartable.h"
+
+struct FutexSystem {
+    using Word = FutexWord;
+    using Owner = std::atomic<unsigned long long>;
+    using Deadline = const timespec*;  // null: none
+    using WakeDebt = ::WakeDebt;
+    using SignalDebt = ::SignalDebt;
+    static constexpr int kEverySleeper = ::kEverySleeper;
+
+    static bool SleepWhile(Word& word, unsigned int expected, Deadline deadline) noexcept {
+        return ::SleepWhile(word, expected, deadline);
+    }
+    static int WakeSleepers(Word& word, int most) noexcept { return ::WakeSleepers(word, most); }
+    static bool StoreIfStill(Word& word, unsigned int expected, unsigned int desired) noexcept {
+        return ::StoreIfStill(word, expected, desired);
+    }
+    static void BreakStores() noexcept { ::BreakStores(); }
+
+    // Makes `attempt` a few times with growing pauses; true as soon as it succeeds. Lasts about as long as
+    // going to sleep and being woken would, so a wait costs at most twice of what the better way had cost.
+    template <class Attempt>
+    static bool Spin(Attempt attempt) noexcept {
+        for (int pauses = 1; pauses <= kLongestSpin; pauses *= 2) {
+            for (int pause = 0; pause < pauses; ++pause) Relax();
+            if (attempt()) return true;
+        }
+        return false;
+    }
+
+private:
+    static constexpr int kLongestSpin = 32;
+
+    static void Relax() noexcept {
+#if defined(__x86_64__) || defined(__i386__)
+        __builtin_ia32_pause();
+#elif defined(__aarch64__)
+        asm volatile("isb");
+#endif
+    }
+};
+
+#endif
