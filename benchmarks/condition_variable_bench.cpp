@@ -1,0 +1,76 @@
+// The condition variable beside the standard library's for any lock, both with a re-entrant mutex: two
+// threads that pass the turn back and forth, and a signal that nobody waits for.
+#include "zanbase/condition_variable.h"
+
+#include <benchmark/benchmark.h>
+
+#include <condition_variable>
+#include <mutex>
+#include <thread>
+
+#include "ratios.h"
+
+namespace {
+
+struct Ours {
+    void Lock() { mMutex.Lock(); }
+    void Unlock() { mMutex.Unlock(); }
+    void Wait() { mChanged.Wait(mMutex); }
+    void Signal() { mChanged.Signal(); }
+
+private:
+    HMutex mMutex;
+    HCondVar mChanged;
+};
+
+struct Standard {
+    void Lock() { mMutex.lock(); }
+    void Unlock() { mMutex.unlock(); }
+    void Wait() { mChanged.wait(mMutex); }
+    void Signal() { mChanged.notify_one(); }
+
+private:
+    std::recursive_mutex mMutex;
+    std::condition_variable_any mChanged;
+};
+
+enum Turn { kMain, kPeer, kEnd };
+
+template <class Pair>
+void ConditionPingPong(benchmark::State& state) {
+    Pair pair;
+    Turn turn = kMain;  // guarded by the pair's mutex
+    const auto pass_to = [&](Turn next, Turn own) {
+        turn = next;
+        pair.Signal();
+        while (turn != own && turn != kEnd) pair.Wait();
+    };
+    std::thread peer([&] {
+        pair.Lock();
+        while (turn == kMain) pair.Wait();
+        while (turn != kEnd) pass_to(kMain, kPeer);
+        pair.Unlock();
+    });
+    pair.Lock();
+    for (auto _ : state) pass_to(kPeer, kMain);
+    turn = kEnd;
+    pair.Signal();
+    pair.Unlock();
+    peer.join();
+}
+BENCHMARK_TEMPLATE(ConditionPingPong, Ours)->UseRealTime();
+BENCHMARK_TEMPLATE(ConditionPingPong, Standard)->UseRealTime();
+
+template <class Pair>
+void SignalForNobody(benchmark::State& state) {
+    Pair pair;
+    for (auto _ : state) pair.Signal();
+}
+BENCHMARK_TEMPLATE(SignalForNobody, Ours);
+BENCHMARK_TEMPLATE(SignalForNobody, Standard);
+
+const bool rows =
+    AddRatio("ConditionPingPong<Ours>/real_time", "ConditionPingPong<Standard>/real_time", 1.0) &&
+    AddRatio("SignalForNobody<Ours>", "SignalForNobody<Standard>", 0);
+
+}  // namespace

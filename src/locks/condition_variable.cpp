@@ -1,0 +1,28 @@
+// HCondVar passes every call to the platform's condition, together with the lock inside the mutex.
+#include "zanbase/condition_variable.h"
+
+#include <cstdlib>
+#include <new>
+
+#include "locks/milliseconds.h"
+#include "platform/condition.h"
+
+HCondVar::HCondVar() : mpoCondition(static_cast<NativeCondition*>(std::malloc(sizeof(NativeCondition)))) {
+    if (mpoCondition == nullptr) throw std::bad_alloc();
+    OpenCondition(mpoCondition);
+}
+
+HCondVar::~HCondVar() { std::free(mpoCondition); }
+
+void HCondVar::Signal() const { WakeOne(mpoCondition); }
+
+void HCondVar::Broadcast() const { WakeAll(mpoCondition); }
+
+void HCondVar::Wait(const HMutex& mutex) const {
+    // Without a limit there is nothing to tell but that it woke up.
+    static_cast<void>(SleepOn(mpoCondition, mutex.mpoCriticalSection, kForever));
+}
+
+bool HCondVar::TryWait(const HMutex& mutex, double seconds) const {
+    return SleepOn(mpoCondition, mutex.mpoCriticalSection, MillisecondsIn(seconds));
+}

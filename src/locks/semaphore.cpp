@@ -1,0 +1,39 @@
+// HSemaphore passes every call to the platform's semaphore; HSemaphoreLock adds the orders of releasing and
+// taking.
+#include "zanbase/semaphore.h"
+
+#include "locks/milliseconds.h"
+#include "platform/semaphore.h"
+
+HSemaphore::HSemaphore(unsigned int count) : mpoHandle(NewSemaphore(count)) {}
+
+HSemaphore::~HSemaphore() { EndSemaphore(mpoHandle); }
+
+void HSemaphore::Lock() const {
+    static_cast<void>(TakeUnit(mpoHandle, kForever));  // without a limit it returns with a unit only
+}
+
+bool HSemaphore::TryLock(double seconds) const { return TakeUnit(mpoHandle, MillisecondsIn(seconds)); }
+
+void HSemaphore::Unlock() const { GiveUnit(mpoHandle); }
+
+HSemaphoreLock::HSemaphoreLock(HSemaphore* semaphore) : mpoSemaphore(semaphore) {
+    if (mpoSemaphore != nullptr) mpoSemaphore->Lock();
+}
+
+HSemaphoreLock::HSemaphoreLock(const HSemaphoreLock& other) : HSemaphoreLock(other.mpoSemaphore) {}
+
+HSemaphoreLock::~HSemaphoreLock() { HSemaphoreLock::Release(); }
+
+HSemaphoreLock& HSemaphoreLock::operator=(const HSemaphoreLock& other) {
+    Reset(other.mpoSemaphore);  // the argument is read before anything is released: safe for itself
+    return *this;
+}
+
+void HSemaphoreLock::Release() { Reset(nullptr); }
+
+void HSemaphoreLock::Reset(HSemaphore* semaphore) {
+    if (mpoSemaphore != nullptr) mpoSemaphore->Unlock();
+    mpoSemaphore = semaphore;
+    if (mpoSemaphore != nullptr) mpoSemaphore->Lock();
+}
