@@ -5,6 +5,7 @@
 
 #include "zanbase/allocation.h"
 #include "zanbase/clock.h"
+#include "zanbase/condition_variable.h"
 #include "zanbase/disk_io.h"
 #include "zanbase/export.h"
 #include "zanbase/field_text.h"
@@ -15,6 +16,8 @@
 #include "zanbase/name_ring.h"
 #include "zanbase/openmp.h"
 #include "zanbase/random.h"
+#include "zanbase/read_write_mutex.h"
+#include "zanbase/semaphore.h"
 #include "zanbase/sleep.h"
 #include "zanbase/sort.h"
 #include "zanbase/string_makers.h"

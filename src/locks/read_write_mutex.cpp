@@ -1,0 +1,71 @@
+// The two read-write locks on the steps of read_write_steps.h, and the orders of their scoped holders.
+#include "zanbase/read_write_mutex.h"
+
+#include "locks/read_write_steps.h"
+#include "zanbase/thread.h"
+
+namespace {
+
+using Downgrade = ReadWriteSteps::Downgrade;
+
+unsigned long long Self() { return HThread::GetCurrentThreadId(); }
+
+}  // namespace
+
+HReadWriteMutex::~HReadWriteMutex() = default;
+
+HReadPrefMutex::HReadPrefMutex() = default;
+HReadPrefMutex::~HReadPrefMutex() = default;
+void HReadPrefMutex::ReadLock() const { ReadWriteSteps::ReadLockAtOnce(*this, Self()); }
+void HReadPrefMutex::ReadUnlock() const { ReadWriteSteps::ReadUnlock<Downgrade::kAllowed>(*this, Self()); }
+void HReadPrefMutex::WriteLock() const { ReadWriteSteps::WriteLock(*this, Self()); }
+void HReadPrefMutex::WriteUnlock() const { ReadWriteSteps::WriteUnlock<Downgrade::kAllowed>(*this, Self()); }
+
+HWritePrefMutex::HWritePrefMutex() = default;
+HWritePrefMutex::~HWritePrefMutex() = default;
+void HWritePrefMutex::ReadLock() const { ReadWriteSteps::ReadLockInTurn(*this, Self()); }
+void HWritePrefMutex::ReadUnlock() const { ReadWriteSteps::ReadUnlock<Downgrade::kBarred>(*this, Self()); }
+void HWritePrefMutex::WriteLock() const { ReadWriteSteps::WriteLock(*this, Self()); }
+void HWritePrefMutex::WriteUnlock() const { ReadWriteSteps::WriteUnlock<Downgrade::kBarred>(*this, Self()); }
+
+HReaderLock::HReaderLock(const HReadWriteMutex* mutex) : mpoMutex(mutex) {
+    if (mpoMutex != nullptr) mpoMutex->ReadLock();
+}
+
+HReaderLock::HReaderLock(const HReaderLock& other) : HReaderLock(other.mpoMutex) {}
+
+HReaderLock::~HReaderLock() { HReaderLock::Release(); }
+
+HReaderLock& HReaderLock::operator=(const HReaderLock& other) {
+    Reset(other.mpoMutex);  // the argument is read before anything is released: safe for itself
+    return *this;
+}
+
+void HReaderLock::Release() { Reset(nullptr); }
+
+void HReaderLock::Reset(const HReadWriteMutex* mutex) {
+    if (mpoMutex != nullptr) mpoMutex->ReadUnlock();
+    mpoMutex = mutex;
+    if (mpoMutex != nullptr) mpoMutex->ReadLock();
+}
+
+HWriterLock::HWriterLock(const HReadWriteMutex* mutex) : mpoMutex(mutex) {
+    if (mpoMutex != nullptr) mpoMutex->WriteLock();
+}
+
+HWriterLock::HWriterLock(const HWriterLock& other) : HWriterLock(other.mpoMutex) {}
+
+HWriterLock::~HWriterLock() { HWriterLock::Release(); }
+
+HWriterLock& HWriterLock::operator=(const HWriterLock& other) {
+    Reset(other.mpoMutex);
+    return *this;
+}
+
+void HWriterLock::Release() { Reset(nullptr); }
+
+void HWriterLock::Reset(const HReadWriteMutex* mutex) {
+    if (mpoMutex != nullptr) mpoMutex->WriteUnlock();
+    mpoMutex = mutex;
+    if (mpoMutex != nullptr) mpoMutex->WriteLock();
+}
