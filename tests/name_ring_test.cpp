@@ -35,7 +35,8 @@ TEST(NameRing, GivesEachNameASlotAndTheWholeOfIt) {
                 MkName(INT_MIN), "-2147483648", MkName(UINT_MAX), "4294967295", MkName(LONG_MIN),
                 std::to_string(LONG_MIN), MkName(ULONG_MAX), std::to_string(ULONG_MAX), MkName(ULLONG_MAX),
                 "18446744073709551615", MkName("%s", full.c_str()), full, MkName("%s", more.c_str()), full,
-                MkNameC("%s", more.c_str()), full, MkTokenName(more.c_str(), nullptr), full, MkName(1e70, 2),
+                MkName(5e-324, INT_MAX), MkString("%.1074f", 5e-324), MkNameC("%s", more.c_str()), full,
+                MkTokenName(more.c_str(), nullptr), full, MkName(1e70, 2),
                 "10000000000000000725314363815292351261583744096465219555182101554790400");
 }
 

@@ -39,7 +39,8 @@ TEST(OMPGetMaxThreads, IsSettledOnceByTheFirstSource) {
         const char* environment;
         int set;  // 0: not called
         int limit;
-    } rows[] = {{"4", 0, 4}, {"-2", 0, 6}, {"many", 0, 6}, {nullptr, 0, 6}, {"4", -1, 1}, {"4", 12, 12}};
+    } rows[] = {{"4", 0, 4},     {"-2", 0, 6}, {"many", 0, 6}, {"4294967298", 0, INT_MAX & 255},
+                {nullptr, 0, 6}, {"4", -1, 1}, {"4", 12, 12}};
     for (const auto& row : rows) {
         const ChildResult child = RunInChild([&] {
             unsetenv("OMP_NUM_THREADS");
@@ -102,9 +103,10 @@ TEST(OpenMPScopes, CallTheRuntimeOnlyToChangeASettingOutsideRegions) {
          "nested 1;num_threads 8;num_threads 5;"},
         {[] {
              OMPThreadCount outer(4), inner(4);
-             outer = inner;
+             OMPDynamic on(true), still_on(true);
+             outer = inner, on = still_on;
          },
-         "num_threads 4;"},
+         "num_threads 4;dynamic 1;"},
         {ScopesInsideARegion, "nested 1;num_threads 8;in;out;num_threads 8;"},
     };
     for (const auto& [scopes, expected] : rows) {

@@ -25,6 +25,7 @@ TEST(IMPInitRandom, TakesAnySeedAndTheClockForZero) {
         EXPECT_EQ(IMPInitRandom(seed), seed);
         EXPECT_EQ(IMPRandInt(), first);
     }
+    EXPECT_EQ(IMPRandom(), 1.0);  // the last seed's state steps to itself
     double before = 0;
     int seed = 0;
     do {

@@ -1,6 +1,7 @@
 // What the tables are after `operator new` failed, at each of the calls that an operation makes in turn. Not
 // part of the thread sanitizer's build, whose runtime brings its own `operator new`.
 #include <gtest/gtest.h>
+#include <omp.h>
 
 #include <cstdint>
 #include <cstdlib>
@@ -12,6 +13,7 @@
 #include "support/run_in_child.h"
 #include "zanbase/disk_io.h"
 #include "zanbase/memory_tables.h"
+#include "zanbase/openmp.h"
 
 namespace {
 
@@ -96,6 +98,17 @@ TEST(HMemory, StaysSoundWhenItsOwnMemoryRunsOut) {
         return testing::Test::HasFailure() ? 1 : 0;
     });
     EXPECT_EQ(child.exit_code, 0) << child.out;
+}
+
+TEST(OMPNested, LeavesTheSettingsWhenMemoryRunsOut) {
+    OMPSetMaxThreads(3);
+    omp_set_num_threads(2);
+    const int failures = FailAtEachCall([] { OMPNested(true); },
+                                        [] {
+                                            EXPECT_EQ(omp_get_max_active_levels(), 1);
+                                            EXPECT_EQ(omp_get_max_threads(), 2);
+                                        });
+    EXPECT_GT(failures, 0);
 }
 
 // Counted opens of `name` and how often a read on `handle` reaches its record.

@@ -24,11 +24,12 @@ TEST(MkString, WritesTheExactDecimalText) {
 }
 
 TEST(MkString, WritesFixedPointWithoutTrailingZeros) {
-    ExpectPairs(MkString(2.0, 3), "2", MkString(1.5, 3), "1.5", MkString(100.0, 0), "100", MkString(-0.5, 2),
-                "-0.5", MkString(-0.001, 2), "-0", MkString(0.0, -1), "0", MkString(0.001, -7), "0.001",
-                MkString(-1.0 / 3, INT_MIN), "-0.33333333333333", MkString(123456789012345.6, -1),
-                "123456789012346", MkString(1e-70, -1), "0", MkString(HUGE_VAL, 2), "inf",
-                MkString(-HUGE_VAL, -1), "-inf", MkString(std::nan(""), -1), "nan");
+    ExpectPairs(MkString(2.0, 3), "2", MkString(1.5, 3), "1.5", MkString(100.0, 0), "100", MkString(2.75, 0),
+                "3", MkString(-0.5, 2), "-0.5", MkString(-0.001, 2), "-0", MkString(0.0, -1), "0",
+                MkString(0.001, -7), "0.001", MkString(-1.0 / 3, INT_MIN), "-0.33333333333333",
+                MkString(123456789012345.6, -1), "123456789012346", MkString(1e-70, -1), "0",
+                MkString(HUGE_VAL, 2), "inf", MkString(-HUGE_VAL, -1), "-inf", MkString(std::nan(""), -1),
+                "nan");
     ExpectPairs(MkString(0.1, INT_MAX), "0.1000000000000000055511151231257827021181583404541015625",
                 MkString(std::ldexp(1, 205), 3),
                 "51422017416287688817342786954917203280710495801049370729644032", MkString(1e70, 3),

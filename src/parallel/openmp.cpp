@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <climits>
 #include <cstdlib>
 
 #include "platform/processors.h"
@@ -77,8 +78,10 @@ int OMPGetMaxThreads() {
     int settled = gnMaxThreads.load(kRelaxed);
     if (settled != -1) return settled;
     const char* const text = std::getenv("OMP_NUM_THREADS");
-    int limit = text != nullptr ? std::atoi(text) : 0;
-    if (limit <= 0) limit = GetLogicalProcessorCount();
+    // Not atoi, which promises nothing about a number beyond an int; here that is the largest int.
+    const long number = text != nullptr ? std::strtol(text, nullptr, 10) : 0;
+    const int limit =
+        number > 0 ? static_cast<int>(std::min<long>(number, INT_MAX)) : GetLogicalProcessorCount();
     // A limit that was set meanwhile stays.
     return gnMaxThreads.compare_exchange_strong(settled, limit, kRelaxed) ? limit : settled;
 }
