@@ -1,214 +1,187 @@
-// What the tracker's operations leave in its tables, read as a deriving class reads them.
-#include "zanbase/memory.h"
-
+// What the tracker's operations leave in its tables, read as a deriving class reads them, and its reports.
 #include <gtest/gtest.h>
 
-#include <map>
-#include <string>
-#include <thread>
-#include <vector>
+#include <future>
+#include <set>
+#include <sstream>
 
-#include "support/run_in_child.h"
+#include "memory/report_text.h"
+#include "support/failing_new.h"
 #include "support/written_text.h"
 #include "zanbase/memory_tables.h"
+#include "zanbase/string_makers.h"
 
 namespace {
 
-const char kA[] = "same";
-const char kB[] = "same";
+// Files a to h, in one array, so that the order of the pointers is known. a and c are the same text.
+const char kFiles[][60] = {"/home/me/src/core/table",
+                           "/home/me/src/io/reader",
+                           "/home/me/src/core/table",
+                           "",
+                           "/23456789/123456789/123456789/123456789/1234567",
+                           "d/123456789/123456789/123456789/123456789/123456",
+                           "a_file_name_that_is_longer_than_all_of_the_column",
+                           "/somewhere/buffers/tiles/cache/tile_cache_store_file"};
 
-void* At(std::uintptr_t address) { return reinterpret_cast<void*>(address); }
+void* At(int address) { return reinterpret_cast<void*>(static_cast<std::size_t>(address)); }
 
-class Tables : public HMemory {
+class Tracker : public HMemory {
 public:
-    static bool Exist() {
-        return mpoFileMap != nullptr && mpoMemoryMap != nullptr && mpoMemoryStack != nullptr;
+    // "+1:10a2" records 10 bytes at address 1 for line 2 of file a, "-1" frees address 1; { and } push and
+    // pop, ! resets, ~ resets the usage.
+    static void Run(const std::string& script) {
+        std::istringstream words(script);
+        for (std::string word; words >> word;) {
+            void* ptr = nullptr;
+            std::size_t size = 0;
+            char file = 0;
+            int line = 0;
+            std::sscanf(word.c_str() + 1, "%p:%zu%c%d", &ptr, &size, &file, &line);
+            if (word[0] == '+') Alloc(ptr, size, kFiles[file - 'a'], line);
+            if (word[0] == '-') Free(ptr);
+            if (word[0] == '{') Push();
+            if (word[0] == '}') Pop();
+            if (word[0] == '!') Reset();
+            if (word[0] == '~') UsageReset();
+        }
     }
-    static bool Missing() {
-        return mpoFileMap == nullptr && mpoMemoryMap == nullptr && mpoMemoryStack == nullptr;
-    }
-    static std::size_t Blocks() { return mpoMemoryMap->size(); }
 
-    static std::string Site(const CallSite& site) {
-        return (site.first == kA ? "a" : "b") + std::to_string(site.second);
-    }
-
-    // Blocks as address=size@site, sites as site+count/bytes-count/bytes, then total, peak and saved states.
+    // Total/peak/saved states; blocks as address=size@site; sites as site+calls/bytes-calls/bytes.
     static std::string State() {
-        const HMutexLock lock(&moMutex);
-        std::map<void*, std::string> blocks;
-        for (const auto& [address, block] : *mpoMemoryMap)
-            blocks[address] = std::to_string(reinterpret_cast<std::uintptr_t>(address)) + "=" +
-                              std::to_string(block.mnSize) + "@" + Site({block.mpcFile, block.mnLine});
-        std::map<std::string, std::string> sites;
-        for (const auto& [site, usage] : *mpoFileMap)
-            sites[Site(site)] = "+" + std::to_string(usage.mnAllocCount) + "/" +
-                                std::to_string(usage.mnAllocated) + "-" + std::to_string(usage.mnFreeCount) +
-                                "/" + std::to_string(usage.mnFreed);
-        std::string text;
-        for (const auto& [address, block] : blocks) text += block + " ";
-        for (const auto& [site, usage] : sites) text += site + usage + " ";
-        return text + "total " + std::to_string(mnTotalMemory) + " peak " + std::to_string(mnPeekMemory) +
-               " saved " + std::to_string(mpoMemoryStack->size());
-    }
-
-    static void Clear() {
-        HMemory::Alloc(At(1), 1, kA, 1);
-        mpoMemoryStack->clear();
-        HMemory::Reset();
+        if (mpoFileMap == nullptr && mpoMemoryMap == nullptr && mpoMemoryStack == nullptr) return "nothing";
+        const auto site = [](const char* file, int line) {
+            for (char letter = 'a';; ++letter)
+                if (file == kFiles[letter - 'a']) return letter + MkString(line);
+        };
+        std::set<std::string> parts;
+        for (const auto& [ptr, block] : *mpoMemoryMap)
+            parts.insert(MkString(" %p=%zu@", ptr, block.mnSize) + site(block.mpcFile, block.mnLine));
+        for (const auto& [key, use] : *mpoFileMap)
+            parts.insert(
+                " " + site(key.first, key.second) +
+                MkString("+%u/%zu-%u/%zu", use.mnAllocCount, use.mnAllocated, use.mnFreeCount, use.mnFreed));
+        std::string text = MkString("%zu/%zu/%zu", mnTotalMemory, mnPeekMemory, mpoMemoryStack->size());
+        for (const std::string& part : parts) text += part;
+        return text;
     }
 };
 
-struct Case {
-    const char* name;
-    void (*run)();
-    const char* state;
-};
-
-class Tracker : public testing::TestWithParam<Case> {};
-
-TEST_P(Tracker, LeavesItsTablesAsTold) {
-    Tables::Clear();
-    GetParam().run();
-    EXPECT_EQ(Tables::State(), GetParam().state);
-}
-
-const Case kCases[] = {
-    {"Alloc",
-     [] {
-         HMemory::Alloc(At(1), 10, kA, 1);
-         HMemory::Alloc(At(2), 20, kA, 2);
-         HMemory::Alloc(At(3), 0, kB, 1);
-         HMemory::Alloc(At(0), 5, kA, 1);
-     },
-     "0=5@a1 1=10@a1 2=20@a2 3=0@b1 a1+2/15-0/0 a2+1/20-0/0 b1+1/0-0/0 total 35 peak 35 saved 0"},
-    {"Free",
-     [] {
-         HMemory::Alloc(At(0), 10, kA, 1);
-         HMemory::Alloc(At(2), 20, kA, 1);
-         for (const int address : {0, 0, 7}) HMemory::Free(At(static_cast<std::uintptr_t>(address)));
-         HMemory::Alloc(At(3), 5, kA, 1);
-     },
-     "2=20@a1 3=5@a1 a1+3/35-1/10 total 25 peak 30 saved 0"},
-    {"AllocAtAnAddressThatIsHeld",
-     [] {
-         HMemory::Alloc(At(9), 1, kA, 9);
-         HMemory::Free(At(9));  // leaves a node that the second record could take
-         HMemory::Alloc(At(1), 10, kA, 1);
-         HMemory::Alloc(At(1), 30, kB, 2);
-         HMemory::Alloc(At(1), 30, kB, 2);
-         HMemory::Free(At(1));
-     },
-     "a1+1/10-1/10 a9+1/1-1/1 b2+2/60-0/0 total 60 peak 70 saved 0"},
-    {"UsageResetKeepsBlocks",
-     [] {
-         HMemory::Alloc(At(1), 10, kA, 1);
-         HMemory::Alloc(At(2), 20, kA, 1);
-         HMemory::UsageReset();
-         HMemory::Free(At(1));
-     },
-     "2=20@a1 a1+0/0-1/10 total 20 peak 30 saved 0"},
-    {"ResetForgetsBlocks",
-     [] {
-         HMemory::Alloc(At(1), 10, kA, 1);
-         HMemory::Reset();
-         HMemory::Free(At(1));
-     },
-     "total 0 peak 0 saved 0"},
-    {"PushStartsAfresh",
-     [] {
-         HMemory::Alloc(At(1), 10, kA, 1);
-         HMemory::Push();
-         HMemory::Free(At(1));
-         HMemory::Alloc(At(2), 99, kA, 1);
-     },
-     "2=99@a1 a1+1/99-0/0 total 99 peak 99 saved 1"},
-    {"PopRestores",
-     [] {
-         HMemory::Alloc(At(1), 10, kA, 1);
-         HMemory::Push();
-         HMemory::Alloc(At(1), 99, kA, 1);
-         HMemory::Free(At(1));
-         HMemory::Alloc(At(2), 99, kB, 1);
-         HMemory::Reset();
-         HMemory::Pop();
-         HMemory::Free(At(2));
-         HMemory::Alloc(At(3), 1, kA, 1);
-     },
-     "1=10@a1 3=1@a1 a1+2/11-0/0 total 11 peak 11 saved 0"},
-    {"NestedPushesRestoreInReverse",
-     [] {
-         HMemory::Push();
-         HMemory::Alloc(At(1), 10, kA, 1);
-         HMemory::Push();
-         HMemory::Alloc(At(2), 20, kA, 1);
-         HMemory::Push();
-         HMemory::Pop();
-         HMemory::Pop();
-         HMemory::Free(At(1));
-     },
-     "a1+1/10-1/10 total 0 peak 10 saved 1"},
-    {"PopWithNothingSavedKeepsAll",
-     [] {
-         HMemory::Alloc(At(1), 10, kA, 1);
-         HMemory::Pop();
-     },
-     "1=10@a1 a1+1/10-0/0 total 10 peak 10 saved 0"},
-};
-
-INSTANTIATE_TEST_SUITE_P(All, Tracker, testing::ValuesIn(kCases),
-                         [](const auto& test) { return test.param.name; });
-
-TEST(HMemory, DoesNothingBeforeTheFirstAlloc) {
-    const ChildResult child = RunInChild([] {
-        HMemory::Free(nullptr);
-        HMemory::Pop();
-        HMemory::Reset();
-        HMemory::UsageReset();
-        HMemory::Push();
-        EXPECT_TRUE(Tables::Missing());
-        HMemory::Alloc(At(1), 10, kA, 1);
-        HMemory::Pop();  // the push saved nothing
-        EXPECT_EQ(Tables::State(), "1=10@a1 a1+1/10-0/0 total 10 peak 10 saved 0");
-        return testing::Test::HasFailure() ? 1 : 0;
-    });
-    EXPECT_EQ(child.exit_code, 0) << child.out;
-}
-
-// Blocks come and go in bursts, past what is kept of nodes and sites.
-TEST(HMemory, CountsBurstsOverManySites) {
-    Tables::Clear();
-    constexpr int kBlocks = 3000;
-    constexpr int kRounds = 4;
-    for (int round = 0; round < kRounds; ++round) {
-        for (int i = 1; i <= kBlocks; ++i)
-            HMemory::Alloc(At(16U * static_cast<unsigned int>(i)), 8, kA, i % 700);
-        EXPECT_EQ(Tables::Blocks(), static_cast<std::size_t>(kBlocks));
-        for (int i = kBlocks; i >= 1; --i) HMemory::Free(At(16U * static_cast<unsigned int>(i)));
-        EXPECT_EQ(Tables::Blocks(), 0U);
+TEST(HMemory, LeavesItsTablesAsTold) {
+    const auto reports = [] { return WrittenBy(HMemory::LeakReport) + WrittenBy(HMemory::UsageReport); };
+    Tracker::Run("-0 } ! ~ {");
+    EXPECT_EQ(Tracker::State() + reports(), "nothing");
+    const char* const cases[][2] = {
+        {"+1:10a1 }", "10/10/0 0x1=10@a1 a1+1/10-0/0"},  // the push above saved nothing
+        {"+1:1a1 +2:2a2 +3:0c1 +0:5a1",
+         "8/8/0 (nil)=5@a1 0x1=1@a1 0x2=2@a2 0x3=0@c1 a1+2/6-0/0 a2+1/2-0/0 c1+1/0-0/0"},
+        {"+0:10a1 +2:20a1 -0 -0 -7 +3:5a1", "25/30/0 0x2=20@a1 0x3=5@a1 a1+3/35-1/10"},
+        {"+9:1a9 -9 +1:10a1 +1:30b2", "40/40/0 0x1=10@a1 a1+1/10-0/0 a9+1/1-1/1 b2+1/30-0/0"},
+        {"+1:10a1 +1:30b2 -1 -1", "30/40/0 a1+1/10-1/10 b2+1/30-0/0"},
+        {"+1:10a1 +2:20a1 ~ -1", "20/30/0 0x2=20@a1 a1+0/0-1/10"},
+        {"+1:10a1 { -1 +2:99a1", "99/99/1 0x2=99@a1 a1+1/99-0/0"},
+        {"+1:10a1 { +1:99a1 -1 ! +2:99a1 } -2 +3:1a1", "11/11/0 0x1=10@a1 0x3=1@a1 a1+2/11-0/0"},
+        {"{ +1:10a1 { +2:20a1 { } } -1", "0/10/1 a1+1/10-1/10"},
+        {"+1:10a1 ! -1", "0/0/0"},
+    };
+    for (const auto& [script, state] : cases) {
+        Tracker::Run(script);
+        EXPECT_EQ(Tracker::State(), state) << script;
+        Tracker::Run("} } !");
+        EXPECT_EQ(reports(), "");
     }
-    const std::string state = Tables::State();
-    EXPECT_NE(state.find("a7+20/160-20/160 "), std::string::npos);
-    EXPECT_NE(state.find(" total 0 peak 24000 "), std::string::npos);
 }
 
-TEST(HMemory, CountsOfManyThreadsAddUp) {
-    Tables::Clear();
-    constexpr int kThreads = 4;
-    constexpr int kRounds = 3000;
-    std::vector<std::thread> threads;
-    for (int thread = 0; thread < kThreads; ++thread) {
-        threads.emplace_back([thread] {
-            for (int round = 0; round < kRounds; ++round) {
-                HMemory::Alloc(At(1U + static_cast<unsigned int>(thread)), 2, kA, 1);
-                if (round + 1 < kRounds) HMemory::Free(At(1U + static_cast<unsigned int>(thread)));
-            }
-        });
+// A call that fails may have come as far as the usage. In the second round the nodes of freed blocks serve
+// again, so that the growth of the tables is all that can fail.
+TEST(HMemory, StaysSoundWhenItsMemoryRunsOut) {
+    const auto record = [](int i) { HMemory::Alloc(At(i), 1, kFiles[0], i); };
+    FailAtEachNew([&] { record(0); }, [] { EXPECT_EQ(WrittenBy(HMemory::LeakReport), ""); });
+    HMemory::Reset();
+    for (int round = 0; round < 2; ++round) {
+        const std::string saved = Tracker::State();
+        FailAtEachNew(HMemory::Push, [&] { EXPECT_EQ(Tracker::State(), saved); });
+        for (int i = 0; i < 60; ++i) {
+            HMemory::UsageReset();
+            const std::string before = Tracker::State();
+            FailAtEachNew([&] { record(i); }, [&] { EXPECT_EQ(Tracker::State().rfind(before, 0), 0U) << i; });
+        }
+        for (int i = 0; i < 60; ++i) HMemory::Free(At(i));
+        EXPECT_EQ(FailAtEachNew(HMemory::Pop, [] {}), 0);
+        EXPECT_EQ(Tracker::State(), saved);
     }
-    for (std::thread& thread : threads) thread.join();
-    const std::string state = Tables::State();
-    EXPECT_EQ(state.substr(0, state.find(" peak")),
-              "1=2@a1 2=2@a1 3=2@a1 4=2@a1 a1+12000/24000-11996/23992 total 8");
+}
+
+// In bursts past what is kept of nodes and sites, with reports in between.
+TEST(HMemory, CountsWhatManyThreadsRecord) {
+    HMemory::Reset();
+    const auto record = [](int thread) {
+        for (int round = 0; round < 20; ++round) {
+            for (int i = 0; i < 300; ++i) HMemory::Alloc(At(i * 2 + thread), 2, kFiles[0], i);
+            EXPECT_NE(WrittenBy(HMemory::LeakReport) + WrittenBy(HMemory::UsageReport), "");
+            for (int i = round < 19 ? 0 : 1; i < 300; ++i) HMemory::Free(At(i * 2 + thread));
+        }
+    };
+    const std::future<void> other = std::async(std::launch::async, record, 1);
+    record(0);
+    other.wait();
+    const std::string state = Tracker::State();
+    EXPECT_NE(state.find("/0 (nil)=2@a0 0x1=2@a0 a0+40/80-38/76 a1+40/80-40/80 "), std::string::npos);
+    EXPECT_NE(state.find(" a299+40/80-40/80"), std::string::npos);
+}
+
+TEST(ReportText, FitsSizesFieldsAndPaths) {
+    std::string text;
+    for (const std::size_t bytes :
+         {0ULL, 1024ULL, 1025ULL, 1048576ULL, 1048577ULL, 1ULL << 30, 3ULL << 29, ~0ULL})
+        text += SizeText(bytes) + " ";
+    EXPECT_EQ(text, "0 1024 1.00K 1024.00K 1.00M 1024.00M 1.50G 17179869184.00G ");
+    EXPECT_EQ(KiloSizeText(0) + KiloSizeText(1024) + KiloSizeText(1024.1) + KiloSizeText(1048576),
+              "0.00K1024.00K1.00M1024.00M");
+    EXPECT_EQ(FitField("a", 3, true) + FitField("b", 3, false) + FitField("abc", 2, true), "  ab  abc");
+    EXPECT_EQ(ShortSourcePath("/a/src/b/src/c") + ShortSourcePath("src/a\\src\\a"),
+              "src/b/src/csrc/a\\src\\a");
+}
+
+// By size, then by file pointer, then by line, which is signed.
+TEST(HMemory, ReportsLeaks) {
+    Tracker::Run(
+        "! +1:7g2 +2:7f2 +3:7d2 +4:7c2 +5:7a2 +6:7e123456789 +7:7a-3 +8:3221225472h88 +9:768b120 +a:768b120 "
+        "~");
+    EXPECT_EQ(WrittenBy(HMemory::LeakReport),
+              "Memory Leak Report:\n"
+              " ______________________________________________________________________________ \n"
+              "|          |        |        |                                                 |\n"
+              "|   Size   | Blocks |  Line  | File                                            |\n"
+              "|__________|________|________|_________________________________________________|\n"
+              "|          |        |        |                                                 |\n"
+              "|        7 |      1 |     -3 | src/core/table                                  |\n"
+              "|        7 |      1 |      2 | src/core/table                                  |\n"
+              "|        7 |      1 |      2 | src/core/table                                  |\n"
+              "|        7 |      1 |      2 |                                                 |\n"
+              "|        7 |      1 |123456789 | /23456789/123456789/123456789/123456789/1234567 |\n"
+              "|        7 |      1 |      2 | 123456789/123456789/123456789/123456789/123456  |\n"
+              "|        7 |      1 |      2 | a_file_name_that_is_longer_than_all_of_the_column |\n"
+              "|    1.50K |      2 |    120 | src/io/reader                                   |\n"
+              "|    3.00G |      1 |     88 | buffers/tiles/cache/tile_cache_store_file       |\n"
+              "|          |        |        |                                                 |\n"
+              "|    3.00G |     10 |        |                                                 |\n"
+              "|__________|________|________|_________________________________________________|\n\n");
+    EXPECT_EQ(WrittenBy(HMemory::UsageReport), "");
+}
+
+// The sites d1 and c1 are below the threshold of 1229 bytes, until c1 has grown by one.
+TEST(HMemory, ReportsUsage) {
+    Tracker::Run("! +9:0d1 ~ -9 +1:89378b120 +2:89378b120 +3:2097152a57 +5:1228c1");
+    for (int i = 0; i < 118; ++i) Tracker::Run("+4:87381b120 -4");
+    EXPECT_EQ(WrittenBy(HMemory::UsageReport),
+              "Memory Usage Report By File:\n\n"
+              "File: src/core/table, Line: 57\nAllocated (1): 2.00M\nFreed     (0):     0\n\n"
+              "File: src/io/reader, Line: 120\nAllocated (120): 10.00M\nFreed     (118):  9.83M\n\n"
+              "Total Below Threshold: 1.20K\n\n"
+              "Total Allocated:   12.00M\nTotal Freed:        9.83M\n\nPeek Allocated:     2.25M\n\n");
+    Tracker::Run("+6:1c1");
+    EXPECT_NE(WrittenBy(HMemory::UsageReport).find("Allocated (2): 1.20K\nFreed     (0):     0\n"),
+              std::string::npos);
 }
 
 }  // namespace

@@ -11,6 +11,7 @@
 #include <tuple>
 #include <utility>
 
+#include "support/failing_new.h"
 #include "support/run_in_child.h"
 
 std::string calls;                      // of the runtime's setters, in order
@@ -85,6 +86,9 @@ TEST(OpenMPScopes, CallTheRuntimeOnlyToChangeASettingOutsideRegions) {
         {[] { OMPDynamic(false), OMPNested(false), OMPThreadCount(5); }, ""},
         {[] { OMPDynamic(true); }, "dynamic 1;dynamic 0;"},
         {[] { OMPNested(true); }, "nested 1;num_threads 8;nested 0;num_threads 5;"},
+        {[] { FailAtEachNew([] { OMPNested(true); }, [] { calls += "failed;"; }); },
+         "nested 1;nested 0;failed;nested 1;num_threads 8;num_threads 5;nested 0;failed;"
+         "nested 1;num_threads 8;nested 0;num_threads 5;"},
         {[] { __real_omp_set_nested(1), OMPNested(true), OMPNested(false); },
          "num_threads 8;nested 0;nested 1;num_threads 5;"},
         {[] { OMPThreadCount(LLONG_MIN); }, "num_threads 1;num_threads 5;"},
