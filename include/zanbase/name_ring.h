@@ -56,8 +56,9 @@ ZANBASE_API char* MkNameV(const char* format, va_list arguments) ZANBASE_PRINTF_
 /// `MkName(format, …)` with C linkage, for C code and for look-up by name.
 extern "C" ZANBASE_API char* MkNameC(const char* format, ...) ZANBASE_PRINTF_FORMAT(1, 2);
 
-/// Joins strings with "|" up to the null pointer that ends the list; `first` may be it. No separator goes
-/// before the first string that isn't empty; every string behind that one has its own, empty or not ("a||b").
+/// Joins strings with "|" up to the null pointer that ends the list. A null `first` is the empty list (the
+/// compiler still asks for the null at the end). No separator goes before the first string that isn't empty;
+/// every string behind that one has its own, empty or not ("a||b").
 ZANBASE_API char* MkTokenName(const char* first, ...) ZANBASE_NULL_TERMINATED;
 
 #endif

@@ -53,9 +53,10 @@
 [[nodiscard]] ZANBASE_API std::string MkStringV(const char* format, va_list arguments)
     ZANBASE_PRINTF_FORMAT(1, 0);
 
-/// Joins strings with "|" up to the null pointer that ends the list; `first` may be it. No separator goes
-/// before the first string that isn't empty; every string behind that one has its own, empty or not ("a||b").
-/// The whole is cut to its first 4095 characters.
+/// Joins strings with "|" up to the null pointer that ends the list. A null `first` is the empty list (the
+/// compiler still asks for the null at the end). No separator goes before the first string that isn't empty;
+/// every string behind that one has its own, empty or not ("a||b"). The whole is cut to its first 4095
+/// characters.
 [[nodiscard]] ZANBASE_API std::string MkTokenString(const char* first, ...) ZANBASE_NULL_TERMINATED;
 
 #endif
