@@ -33,7 +33,7 @@ void Play(const std::string& script) {
         if (word[0] == '{') HDiskIOPush();
         if (word[0] == '}') HDiskIOPop();
         if (word[0] == '!') HDiskIOReset();
-        if (word[0] == '?') (void)HDiskIOGetFilename(handle);
+        if (word[0] == '?') HDiskIOGetFilename(handle);
     }
 }
 

@@ -52,7 +52,7 @@ ZANBASE_API void HDiskIOWrite(void* handle, unsigned long long bytes, double sec
 ZANBASE_API void _HDiskIOMapFD(const std::string& name, void* handle);
 
 /// The name that `handle` is bound to, or an empty text.
-[[nodiscard]] ZANBASE_API std::string HDiskIOGetFilename(void* handle);
+ZANBASE_API std::string HDiskIOGetFilename(void* handle);
 
 /// True if `name` has a record; then its read and write sums go to those of the pointers that are not null.
 /// Otherwise false, and nothing is written.

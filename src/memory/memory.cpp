@@ -36,6 +36,7 @@ public:
         mpoFileMap = file_map.release();
         mpoMemoryMap = memory_map.release();
         mpoMemoryStack = memory_stack.release();
+        ForgetSites();
     }
 
     static MemoryUsage& UsageOf(const char* file, int line) {

@@ -66,9 +66,9 @@ double Kilobytes(std::size_t bytes) { return static_cast<double>(bytes) / 1024; 
 
 // A tenth of the total's number of K is compared with numbers of bytes: the cut falls at 1/10240 of the
 // total.
-std::size_t UsageThreshold(const UsageTotals& totals) {
+unsigned long long UsageThreshold(const UsageTotals& totals) {
     constexpr double kLargest = 18446744073709549568.0;  // the last double below 2^64
-    return static_cast<std::size_t>(std::min(totals.allocated * 0.1, kLargest));
+    return static_cast<unsigned long long>(std::min(totals.allocated * 0.1, kLargest));
 }
 
 std::string UsageFooter(const UsageTotals& totals, std::size_t peak) {
@@ -129,7 +129,7 @@ void HMemory::UsageReport(std::FILE* stream) {
         totals.allocated += Kilobytes(entry.second.mnAllocated);
         totals.freed += Kilobytes(entry.second.mnFreed);
     }
-    const std::size_t threshold = UsageThreshold(totals);
+    const unsigned long long threshold = UsageThreshold(totals);
 
     WriteText(stream, "Memory Usage Report By File:\n\n");
     for (const auto& [allocated, entry] : by_size) {
