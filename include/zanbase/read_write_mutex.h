@@ -34,8 +34,9 @@
 /// `HMutex` costs, so short sections are better off with that.
 class ZANBASE_API HReadWriteMutex {
 public:
-    HReadWriteMutex() {}
-    HReadWriteMutex(const HReadWriteMutex&) {}
+    HReadWriteMutex() = default;
+    /// A lock of its own; whatever the other one is, nothing of it is taken over.
+    HReadWriteMutex(const HReadWriteMutex&) = default;
     virtual ~HReadWriteMutex();
 
     /// Waits until the thread may read, and counts one more read lock of it. Throws `std::bad_alloc` if there
@@ -49,17 +50,18 @@ public:
     virtual void WriteUnlock() const = 0;
 
     /// Changes nothing: a lock can't be handed over.
-    HReadWriteMutex& operator=(const HReadWriteMutex&) { return *this; }
+    HReadWriteMutex& operator=(const HReadWriteMutex&) = default;
 
 protected:
-    /// Gives a map its entries and keeps the last one it got back for the next, so that a lock that is read
-    /// by one thread at a time doesn't go to the heap each time. The map and its allocator belong together:
-    /// a copy has no entry to spare.
+    /// @cond
+    // Gives a map its entries, one at a time, and keeps the last one that it got back for the next, so that a
+    // lock doesn't go to the heap each time its first reader comes. Guarded like the map; copies have nothing
+    // to spare, and any of them can take back what another one gave.
     template <class T>
     class EntryAllocator {
     public:
         using value_type = T;
-        EntryAllocator() noexcept {}
+        EntryAllocator() noexcept = default;
         EntryAllocator(const EntryAllocator&) noexcept {}
         template <class Other>
         EntryAllocator(const EntryAllocator<Other>&) noexcept {}
@@ -78,9 +80,10 @@ protected:
         void* mpoSpare = nullptr;  // owned
     };
 
-    /// The read locks of each thread that has any, by the thread's identifier.
+    // The read locks of each thread that has any, by the thread's identifier.
     using ReadCounts = std::map<unsigned long long, unsigned int, std::less<unsigned long long>,
                                 EntryAllocator<std::pair<const unsigned long long, unsigned int>>>;
+    /// @endcond
 };
 
 /// The kind that prefers readers: as long as one reader is inside, a new one gets in at once, past waiting
@@ -93,7 +96,7 @@ protected:
 class ZANBASE_API HReadPrefMutex : public HReadWriteMutex {
 public:
     HReadPrefMutex();
-    virtual ~HReadPrefMutex();
+    ~HReadPrefMutex() override;
     void ReadLock() const override;
     void ReadUnlock() const override;
     void WriteLock() const override;
@@ -121,7 +124,7 @@ private:
 class ZANBASE_API HWritePrefMutex : public HReadWriteMutex {
 public:
     HWritePrefMutex();
-    virtual ~HWritePrefMutex();
+    ~HWritePrefMutex() override;
     void ReadLock() const override;
     void ReadUnlock() const override;
     void WriteLock() const override;
