@@ -48,20 +48,15 @@ TEST(Console, IsLeftAloneWhereNoneIsOpen) {
 TEST(PlatformLock, IsFreeAtLevelZeroOnly) {
     NativeLock lock;
     OpenLock(&lock);
-    const auto free_for_others = [&] {
-        bool taken = false;
-        std::thread([&] {
-            taken = TryTakeLock(&lock);
-            if (taken) GiveLock(&lock);
-        }).join();
-        return taken;
-    };
     TakeLock(&lock);
     EXPECT_TRUE(TryTakeLock(&lock));
-    GiveLock(&lock);
-    EXPECT_FALSE(free_for_others());
-    GiveLock(&lock);
-    EXPECT_TRUE(free_for_others());
+    for (const bool free_after : {false, true}) {
+        GiveLock(&lock);
+        std::thread([&] {
+            EXPECT_EQ(TryTakeLock(&lock), free_after);
+            if (free_after) GiveLock(&lock);
+        }).join();
+    }
     CloseLock(&lock);
 }
 
@@ -90,16 +85,16 @@ TEST(PlatformCondition, SleepsUntilAWakeUpOrTheLimit) {
 }
 
 TEST(PlatformSemaphore, CountsUnitsUpToItsMost) {
-    NativeSemaphore* const semaphore = NewSemaphore(1);
-    EXPECT_TRUE(TakeUnit(semaphore, 0));
-    EXPECT_FALSE(TakeUnit(semaphore, 0));
-    EXPECT_FALSE(TakeUnit(semaphore, 5));
-    std::thread giver([&] { GiveUnit(semaphore); });
-    EXPECT_TRUE(TakeUnit(semaphore, kForever));
-    giver.join();
+    NativeSemaphore* semaphore = NewSemaphore(0);
+    for (const unsigned int limit_ms : {0U, 5U}) EXPECT_FALSE(TakeUnit(semaphore, limit_ms));
+    for (const unsigned int limit_ms : {kForever, kForever - 1}) {
+        std::thread giver([&] { GiveUnit(semaphore); });
+        EXPECT_TRUE(TakeUnit(semaphore, limit_ms));
+        giver.join();
+    }
     EndSemaphore(semaphore);
-    NativeSemaphore* const full = NewSemaphore(kMostUnits);
-    GiveUnit(full);
-    EXPECT_TRUE(TakeUnit(full, 0));
-    EndSemaphore(full);
+    semaphore = NewSemaphore(kMostUnits);
+    GiveUnit(semaphore);
+    EXPECT_TRUE(TakeUnit(semaphore, 0));
+    EndSemaphore(semaphore);
 }

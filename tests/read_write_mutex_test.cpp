@@ -5,18 +5,23 @@
 
 #include <array>
 #include <atomic>
-#include <cctype>
 #include <sstream>
 #include <string>
 #include <thread>
 
 #include "support/blocked_thread.h"
-#include "zanbase/semaphore.h"
 #include "zanbase/thread.h"
 
 namespace {
 
-// A thread that makes the calls it is told: r, R, w, W for ReadLock, ReadUnlock, WriteLock, WriteUnlock.
+void Call(const HReadWriteMutex& mutex, char call) {
+    if (call == 'r') mutex.ReadLock();
+    if (call == 'R') mutex.ReadUnlock();
+    if (call == 'w') mutex.WriteLock();
+    if (call == 'W') mutex.WriteUnlock();
+}
+
+// A thread that makes the calls it is told.
 class Visitor {
 public:
     explicit Visitor(const HReadWriteMutex& mutex) : mThread([&] { Run(mutex); }) {}
@@ -30,10 +35,10 @@ public:
         mTurn.Unlock();
         while (mBegun == begun) std::this_thread::yield();
     }
-    void AwaitEnd() {
+    void AwaitEnd() const {
         while (mMade != mBegun) std::this_thread::yield();
     }
-    bool IsStuck() {
+    bool IsStuck() const {
         AwaitSleepOf(mNumber);
         return mMade != mBegun;
     }
@@ -41,16 +46,11 @@ public:
 private:
     void Run(const HReadWriteMutex& mutex) {
         mNumber = HThread::GetCurrentThreadId();
-        for (;;) {
+        for (char call = 0; call != '.'; ++mMade) {
             mTurn.Lock();
-            const char call = mCall;
+            call = mCall;
             ++mBegun;
-            if (call == '.') return;
-            if (call == 'r') mutex.ReadLock();
-            if (call == 'R') mutex.ReadUnlock();
-            if (call == 'w') mutex.WriteLock();
-            if (call == 'W') mutex.WriteUnlock();
-            ++mMade;
+            Call(mutex, call);
         }
     }
 
@@ -61,44 +61,39 @@ private:
     std::thread mThread;
 };
 
-// Plays a scene with the threads a, b and c. "ar": a calls ReadLock, which returns. "bw!": b calls WriteLock
-// and is stuck. "b!": b is still stuck. "b.": b's call returns. After the scene the mutex must be free.
+// Plays scenes with the threads a, b and c. "ar": a calls ReadLock, which returns. "bw!": b calls WriteLock
+// and is stuck. "b!": b is still stuck. "b.": b's call returns. After each scene the mutex must be free.
 template <class Mutex>
-void Play(const std::string& scene) {
-    SCOPED_TRACE(scene);
-    const Mutex mutex;
-    std::array<Visitor, 3> visitors{Visitor{mutex}, Visitor{mutex}, Visitor{mutex}};
-    std::istringstream steps(scene + " aw aW bw bW");
-    for (std::string step; steps >> step;) {
-        Visitor& visitor = visitors[static_cast<std::size_t>(step[0] - 'a')];
-        if (std::isalpha(step[1]) != 0) visitor.Begin(step[1]);
-        if (step.back() == '!') {
-            ASSERT_TRUE(visitor.IsStuck()) << step;
-        } else {
-            visitor.AwaitEnd();
+void Play(std::initializer_list<const char*> scenes) {
+    for (const std::string scene : scenes) {
+        SCOPED_TRACE(scene);
+        const Mutex mutex;
+        std::array<Visitor, 3> visitors{Visitor{mutex}, Visitor{mutex}, Visitor{mutex}};
+        std::istringstream steps(scene + " aw aW bw bW");
+        for (std::string step; steps >> step;) {
+            Visitor& visitor = visitors[static_cast<std::size_t>(step[0] - 'a')];
+            if (step[1] != '!' && step[1] != '.') visitor.Begin(step[1]);
+            if (step.back() != '!') visitor.AwaitEnd();
+            ASSERT_EQ(visitor.IsStuck(), step.back() == '!') << step;
         }
     }
 }
 
-TEST(ReadWriteMutexes, NestAndKeepOthersOutUntilTheLastUnlock) {
-    for (const char* scene :
-         {"ar ar bw! ar b! aR b! aR b! aR b. bW",  // the third is behind a waiting writer
-          "aw aw br! aW b! aW b. bR", "aw aw bw! aW b! aW b. bW", "ar br aR cw! bR c. cW"}) {
-        Play<HReadPrefMutex>(scene);
-        Play<HWritePrefMutex>(scene);
-    }
+TEST(ReadWriteMutexes, KeepOthersOutUntilTheLastUnlock) {
+    const auto scenes = {"ar ar bw! ar b! aR b! aR b! aR b. bW",  // the third nests behind a waiting writer
+                         "aw aw br! aW b! aW b. bR", "aw aw bw! aW b! aW b. bW", "ar br aR cw! bR c. cW"};
+    Play<HReadPrefMutex>(scenes);
+    Play<HWritePrefMutex>(scenes);
 }
 
-TEST(HReadPrefMutex, LetsReadersPastAWaitingWriter) { Play<HReadPrefMutex>("ar bw! cr aR b! cR b. bW"); }
-
-TEST(HWritePrefMutex, LetsAWaitingWriterPastNewReaders) {
-    Play<HWritePrefMutex>("ar bw! cr! aR b. c! bW c. cR");
+TEST(ReadWriteMutexes, DifferInWhoGoesFirst) {
+    Play<HReadPrefMutex>({"ar bw! cr aR b! cR b. bW"});
+    Play<HWritePrefMutex>({"ar bw! cr! aR b. c! bW c. cR"});
 }
 
 TEST(HReadPrefMutex, DowngradesFromWritingToReading) {
-    Play<HReadPrefMutex>("aw ar aW bw! cr cR b! aR b. bW");
-    Play<HReadPrefMutex>("aw ar cr aW bw! aR b! cR b. bW");
-    Play<HReadPrefMutex>("aw ar aR bw! aW b. cr! bW c. cR");
+    Play<HReadPrefMutex>({"aw ar aW bw! cr cR b! aR b. bW", "aw ar cr aW bw! aR b! cR b. bW",
+                          "aw ar aR bw! aW b. cr! bW c. cR"});
 }
 
 class NotingMutex : public HReadWriteMutex {
@@ -123,17 +118,15 @@ std::string CallsOf() {
         lock = copy;
         Holder& same = lock;
         lock = same;
-        mutex.mCalls += " ";
         lock = none;
         copy.Reset(&mutex);
-        mutex.mCalls += " ";
     }
     return mutex.mCalls;
 }
 
 TEST(Holders, GiveBackBeforeTheyTake) {
-    EXPECT_EQ(CallsOf<HReaderLock>(), "rrRrRr RRr R");
-    EXPECT_EQ(CallsOf<HWriterLock>(), "wwWwWw WWw W");
+    EXPECT_EQ(CallsOf<HReaderLock>(), "rrRrRrRRrR");
+    EXPECT_EQ(CallsOf<HWriterLock>(), "wwWwWwWWwW");
 }
 
 }  // namespace

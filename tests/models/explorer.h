@@ -1,8 +1,9 @@
-// Runs up to three threads of an algorithm under every order of their steps.
+// Runs three threads of an algorithm under every order of their steps.
 //
 // A thread is a list of calls, and each access to something shared is a step. A step is made by running the
 // call again from its start, with the results of its earlier steps played back, and leaving it by an
-// exception after the new one. So a state is plain data, and a state met before isn't gone through again.
+// exception before the step after the new one. So a state is plain data, and one met before isn't gone
+// through again.
 #ifndef ZANBASE_TESTS_EXPLORER_H
 #define ZANBASE_TESTS_EXPLORER_H
 
@@ -12,8 +13,6 @@
 #include <string>
 #include <unordered_set>
 #include <vector>
-
-namespace model {
 
 constexpr std::size_t kThreads = 3;
 using Value = unsigned long long;
@@ -30,13 +29,9 @@ struct State {
 
 class Explorer {
 public:
-    using Call = std::function<void()>;
-    using Check = std::function<const char*(const State&, bool at_the_end)>;  // what is wrong, or null
-    using Move = std::function<bool(State&, std::size_t thread)>;  // not by the thread; false: can't
-
-    std::array<std::vector<Call>, kThreads> calls;
-    Check check;
-    Move move;  // may be empty
+    std::array<std::vector<std::function<void()>>, kThreads> calls;
+    std::function<const char*(const State&, bool at_the_end)> check;  // what is wrong, or null
+    std::function<bool(State&, std::size_t thread)> kill;  // what may end a thread, if set; false: not now
 
     // What is wrong in some order of steps; empty if nothing is.
     std::string Explore(const State& start) {
@@ -46,80 +41,79 @@ public:
         return mFound;
     }
 
-    std::size_t Self() const { return mSelf; }
+    bool IsDone(const State& state, std::size_t thread) const {
+        return state.threads[thread].call == calls[thread].size();
+    }
 
-    // One step of the running thread: `body` changes the state and gives the result. Where it has a choice it
-    // asks Choose().
+    // For the running call. A step: `body` changes the state and gives the result.
     template <class Body>
     Value Step(Body body) {
-        std::vector<Value>& log = mState.threads[mSelf].log;
+        std::vector<Value>& log = now.threads[self].log;
         if (mPlayed == log.size()) {
             if (mStepped) throw Pause{};
             mStepped = true;
-            log.push_back(body(mState));
+            log.push_back(body(now));
         }
         return log[mPlayed++];
     }
-    State& Now() { return mState; }
-
-    // A number below `count`; every one of them is tried.
+    // In a step: a number below `count`, each of which is tried.
     std::size_t Choose(std::size_t count) {
         mChoices = count;
         return mChoice;
     }
-
-    // Ends the step as one that the thread can't make now.
-    [[noreturn]] static void Block() { throw Blocked{}; }
+    // In a step: the thread can't make it now.
+    [[noreturn]] static void Block() { throw Pause{}; }
     [[noreturn]] static void Fail(const char* what) { throw what; }
+
+    State now;
+    std::size_t self = 0;
 
 private:
     struct Pause {};
-    struct Blocked {};
 
     void Visit(const State& state) {
         if (!mFound.empty() || !mSeen.insert(Digest(state)).second) return;
-        if (const char* what = check(state, false)) mFound = what;
-        bool moved = false;
-        for (std::size_t thread = 0; thread < kThreads && mFound.empty(); ++thread) {
-            std::size_t choices = 1;
-            for (std::size_t choice = 0; choice < choices; ++choice) {
-                if (!Run(state, thread, choice)) break;
-                moved = true;
+        const char* what = check(state, false);
+        bool at_the_end = true;
+        for (std::size_t thread = 0; thread < kThreads && what == nullptr && mFound.empty(); ++thread) {
+            if (IsDone(state, thread) || state.threads[thread].dead) continue;
+            for (std::size_t choice = 0, choices = 1; choice < choices && Run(state, thread, choice);
+                 ++choice) {
+                at_the_end = false;
                 choices = mChoices;
-                Visit(State(mState));
+                Visit(State(now));
             }
-            State next = state;
-            if (move && move(next, thread)) Visit(next);
+            State killed = state;
+            if (kill && kill(killed, thread)) Visit(killed);
         }
-        if (moved || !mFound.empty()) return;
-        if (const char* what = check(state, true)) mFound = what;
+        if (what == nullptr && at_the_end && mFound.empty()) what = check(state, true);
+        if (what != nullptr) mFound = what;
     }
 
-    // Makes the thread's next step from `state`, into mState. False if there is none.
+    // Makes the thread's next step from `state`. False if it can't.
     bool Run(const State& state, std::size_t thread, std::size_t choice) {
-        if (state.threads[thread].dead || state.threads[thread].call == calls[thread].size()) return false;
-        mState = state;
-        mSelf = thread;
+        now = state;
+        self = thread;
         mPlayed = 0;
         mStepped = false;
         mChoice = choice;
         mChoices = 1;
+        State::Thread& mine = now.threads[thread];
         try {
-            calls[thread][state.threads[thread].call]();
-            ++mState.threads[thread].call;
-            mState.threads[thread].log.clear();
+            calls[thread][mine.call]();
+            ++mine.call;
+            mine.log.clear();
         } catch (const Pause&) {
-        } catch (const Blocked&) {
-            return false;
+            return mine.log.size() > state.threads[thread].log.size();
         } catch (const char* what) {
             mFound = what;
         }
         return true;
     }
 
-    // 64 bits stand for a state; two of a million states have the same with a chance of 1 to 10^7.
+    // 64 bits stand for a state: two of a million share them with a chance of 1 to 10^7.
     static Value Digest(const State& state) {
-        Value digest = 1469598103934665603U;
+        Value digest = 0;
         const auto add = [&](Value value) {
             digest = (digest ^ value) * 0x9E3779B97F4A7C15U;
             digest ^= digest >> 29;
@@ -133,13 +127,31 @@ private:
         return digest;
     }
 
-    State mState;
-    std::size_t mSelf = 0, mPlayed = 0, mChoice = 0, mChoices = 1;
+    std::size_t mPlayed = 0, mChoice = 0, mChoices = 1;
     bool mStepped = false;
     std::unordered_set<Value> mSeen;
     std::string mFound;
 };
 
-}  // namespace model
+// The explorer at work, and steps on one of its words.
+inline Explorer* running = nullptr;
+
+template <class Rule>
+Value Change(std::size_t place, Rule rule) {  // the result is the old value
+    return running->Step([&](State& state) {
+        const Value old = state.words[place];
+        state.words[place] = rule(old);
+        return old;
+    });
+}
+inline Value Get(std::size_t place) {
+    return Change(place, [](Value value) { return value; });
+}
+inline Value Set(std::size_t place, Value value) {
+    return Change(place, [=](Value) { return value; });
+}
+inline Value Add(std::size_t place, int amount) {
+    return Change(place, [=](Value value) { return value + static_cast<Value>(amount); });
+}
 
 #endif
