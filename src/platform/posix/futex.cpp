@@ -2,17 +2,44 @@
 #include "platform/posix/futex.h"
 
 #include <cerrno>
+#include <tuple>
 
 #include "platform/posix/restartable.h"
 
 ZANBASE_FAST_THREAD_LOCAL WakeDebts toWakeDebts = {nullptr, nullptr, 0};
 
-bool SleepWhile(FutexWord& word, unsigned int expected, const timespec* deadline) noexcept {
+namespace {
+
+// 0, or why there was no wake-up.
+int Wait(FutexWord& word, unsigned int expected, const timespec* deadline) noexcept {
+    const long result = syscall(SYS_futex, &word, FUTEX_WAIT_BITSET_PRIVATE, expected, deadline, nullptr,
+                                FUTEX_BITSET_MATCH_ANY);
+    return result == 0 ? 0 : errno;
+}
+
+#ifdef ZANBASE_THREAD_SANITIZER
+// That tool delivers no signal to a thread inside a system call it doesn't know, and threads are ended by a
+// signal. So a long wait is cut up, with a call between that it knows.
+int WaitInSlices(FutexWord& word, unsigned int expected, const timespec* deadline) noexcept {
     for (;;) {
-        const long result = syscall(SYS_futex, &word, FUTEX_WAIT_BITSET_PRIVATE, expected, deadline, nullptr,
-                                    FUTEX_BITSET_MATCH_ANY);
-        if (result == 0 || errno != EINTR) return result == 0 || errno != ETIMEDOUT;
+        const timespec soon = DeadlineIn(5);
+        const bool is_last = deadline != nullptr && std::tie(deadline->tv_sec, deadline->tv_nsec) <
+                                                        std::tie(soon.tv_sec, soon.tv_nsec);
+        const int error = Wait(word, expected, is_last ? deadline : &soon);
+        if (error != ETIMEDOUT || is_last) return error;
+        usleep(1);
     }
+}
+#else
+constexpr auto WaitInSlices = Wait;
+#endif
+
+}  // namespace
+
+bool SleepWhile(FutexWord& word, unsigned int expected, const timespec* deadline) noexcept {
+    int error = EINTR;
+    while (error == EINTR) error = WaitInSlices(word, expected, deadline);
+    return error != ETIMEDOUT;
 }
 
 timespec DeadlineIn(unsigned int ms) noexcept {
