@@ -20,9 +20,11 @@ cat >"$work/std.cpp" <<'END'
 #include <utility>
 END
 echo '#include <zanbase/zanbase.h>' >"$work/zanbase.cpp"
+# A usual C++ program: standard streams are set up in it already.
 cat >"$work/main.cpp" <<'END'
 #include <cstdio>
 #include <cstring>
+#include <iostream>
 int main(int argc, char**) {
     if (argc == 1) return 0;
     char line[256];
