@@ -22,7 +22,7 @@ struct NativeCondition;
 ///
 /// Any number of threads may call any of the operations at the same time. Which waiter a `Signal` wakes is
 /// open. A waiter that is ended by `HThread::Kill` takes no wake-up of the others with it. Nobody may be
-/// waiting when a condition variable is destroyed.
+/// inside any of the operations when a condition variable is destroyed.
 class ZANBASE_API HCondVar {
 public:
     /// Takes a small block from `malloc`; throws `std::bad_alloc` if there is none.

@@ -37,8 +37,10 @@ constexpr auto WaitInSlices = Wait;
 }  // namespace
 
 bool SleepWhile(FutexWord& word, unsigned int expected, const timespec* deadline) noexcept {
+    const int callers_errno = errno;  // nobody expects a lock to change it
     int error = EINTR;
     while (error == EINTR) error = WaitInSlices(word, expected, deadline);
+    errno = callers_errno;
     return error != ETIMEDOUT;
 }
 
