@@ -1,4 +1,5 @@
-// Whether a thread has gone to sleep, so that "it stays blocked" can be waited for and not guessed.
+// Whether a thread has gone to sleep, so that "it stays blocked" can be waited for and not guessed. Reads what
+// the kernel tells of its threads.
 #ifndef ZANBASE_TESTS_BLOCKED_THREAD_H
 #define ZANBASE_TESTS_BLOCKED_THREAD_H
 
