@@ -1,16 +1,20 @@
 // The platform contracts by themselves, in the words of their headers: every back end runs this file.
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <chrono>
 #include <thread>
 
 #include "platform/clock.h"
 #include "platform/condition.h"
 #include "platform/console.h"
+#include "platform/guard.h"
 #include "platform/lock.h"
 #include "platform/messages.h"
 #include "platform/processors.h"
 #include "platform/semaphore.h"
+#include "platform/thread.h"
+#include "support/faults.h"
 
 TEST(PlatformClock, GivesTheWallTimeInMilliseconds) {
     const WallClock before = ReadWallClock();
@@ -97,4 +101,54 @@ TEST(PlatformSemaphore, CountsUnitsUpToItsMost) {
     GiveUnit(semaphore);
     EXPECT_TRUE(TakeUnit(semaphore, 0));
     EndSemaphore(semaphore);
+}
+
+TEST(PlatformThread, HasItsSlotFromBeforeItsBodyToItsEnd) {
+    static ThreadSlot slot{nullptr};
+    static int bodies = 0;
+    const auto body = [](void* argument) {
+        if (slot.load() != nullptr && argument == &bodies) ++bodies;
+    };
+    for (int round = 0; round < 200; ++round) {
+        ASSERT_EQ(StartThread(slot, body, &bodies), 0) << SystemErrorText(0);
+        SetThreadImportance(slot, 0);
+        AwaitThread(slot);
+        EXPECT_EQ(slot.load(), nullptr);
+    }
+    EXPECT_EQ(bodies, 200);
+}
+
+TEST(PlatformThread, CanBeEndedAnywhere) {
+    static std::atomic<int> entered{0};
+    ThreadSlot slot{nullptr};
+    for (int round = 0; round < 200; ++round) {
+        const int before = entered;
+        ASSERT_EQ(StartThread(
+                      slot,
+                      [](void*) {
+                          for (++entered;; ++entered) GiveWay();
+                      },
+                      nullptr),
+                  0);
+        while (round % 2 == 0 && entered == before) GiveWay();
+        EndThread(slot);
+        EXPECT_EQ(slot.load(), nullptr);
+        const int after = entered;
+        GiveWay();
+        EXPECT_EQ(entered, after);
+    }
+}
+
+TEST(PlatformGuard, TellsFaultsFromOtherWaysOut) {
+    const auto fault = [](void*) { WriteToNull(); };
+    const auto nested = [](void* inner) {
+        *static_cast<bool*>(inner) = RunGuarded([](void*) { DivideByZero(); }, nullptr);
+    };
+    bool inner = false;
+    for (int round = 0; round < 3; ++round) {
+        EXPECT_TRUE(RunGuarded(fault, nullptr));
+        EXPECT_FALSE(RunGuarded(nested, &inner));
+        EXPECT_TRUE(inner);
+        EXPECT_THROW(RunGuarded([](void*) { throw 7; }, nullptr), int);
+    }
 }

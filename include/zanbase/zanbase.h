@@ -10,6 +10,7 @@
 #include "zanbase/export.h"
 #include "zanbase/field_text.h"
 #include "zanbase/global_timer.h"
+#include "zanbase/hibernate_thread.h"
 #include "zanbase/memory.h"
 #include "zanbase/message_catalogue.h"
 #include "zanbase/mutex.h"

@@ -1,6 +1,66 @@
-// HThread on the platform's threads.
+// HThread on the platform's threads: messages and priorities; the rest is the platform's.
 #include "zanbase/thread.h"
 
+#include <cstdio>
+
 #include "platform/thread.h"
+#include "threads/reported_body.h"
+
+static_assert(sizeof(ThreadSlot) == sizeof(void*));
+
+namespace {
+
+// The platform's importance for each priority.
+int ImportanceOf(HThreadPriority priority) {
+    constexpr int kImportances[] = {-15, -2, -1, 0, 1, 2, 15};
+    return priority <= HThreadPriorityTimeCritical ? kImportances[priority] : 0;
+}
+
+}  // namespace
+
+HThread::HThread(HThreadPriority priority) : mnPriority(priority) {}
+
+HThread::HThread(const HThread&) : HThread() {}
+
+HThread::~HThread() = default;
+
+HThread& HThread::operator=(const HThread&) { return *this; }
+
+bool HThread::Start(bool) {
+    if (IsRunning()) return false;
+    const auto body = [](void* thread) { _Run_(static_cast<HThread*>(thread)); };
+    if (const int error = StartThread(mpoThread, body, this)) {
+        std::printf("HThread::Start(%p) Error: %s\n", static_cast<void*>(this),
+                    SystemErrorText(error).c_str());
+        return false;
+    }
+    const HThreadPriority priority = mnPriority;
+    if (priority != HThreadPriorityNormal) SetThreadImportance(mpoThread, ImportanceOf(priority));
+    return IsRunning();
+}
+
+void HThread::Stop() {}
+
+bool HThread::IsRunning() const { return mpoThread.load(std::memory_order_acquire) != nullptr; }
+
+void HThread::Wait() { AwaitThread(mpoThread); }
+
+void HThread::Kill() { EndThread(mpoThread); }
+
+void HThread::SetPriority(HThreadPriority priority) {
+    if (mnPriority.exchange(priority) != priority) SetThreadImportance(mpoThread, ImportanceOf(priority));
+}
 
 unsigned long long HThread::GetCurrentThreadId() { return CurrentThreadNumber(); }
+
+void(HThread::Yield)() { GiveWay(); }
+
+void HThread::DestroyThread() { ForgetThread(mpoThread); }
+
+// The platform empties mpoThread when this returns, if it still leads to this thread, and that is the last
+// access to the object. It isn't done here, by DestroyThread, because the object may own another thread by
+// now.
+void HThread::_Run_(HThread* thread) {
+    RunReported(
+        "HThread::_Run_()", [](void* object) { static_cast<HThread*>(object)->Run(); }, thread);
+}

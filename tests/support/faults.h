@@ -1,0 +1,25 @@
+// Machine faults to order. The sanitizers are kept off them: they would report before the machine does.
+#ifndef ZANBASE_TESTS_FAULTS_H
+#define ZANBASE_TESTS_FAULTS_H
+
+#define ZANBASE_AS_WRITTEN __attribute__((noinline, no_sanitize("undefined", "address", "thread")))
+
+ZANBASE_AS_WRITTEN inline void WriteToNull() {
+    volatile int* volatile nowhere = nullptr;
+    *nowhere = 1;
+}
+
+ZANBASE_AS_WRITTEN inline void DivideByZero() {
+    volatile int zero = 0;
+    volatile int number = 7;
+    number = number / zero;
+}
+
+ZANBASE_AS_WRITTEN inline void RunIllegalInstruction() { __builtin_trap(); }
+
+// In steps of less than the page that guards a stack's end, and with no call, which might fault in its stead.
+ZANBASE_AS_WRITTEN inline void UseUpStack() {
+    for (;;) *static_cast<volatile char*>(__builtin_alloca(1024)) = 0;
+}
+
+#endif

@@ -1,0 +1,25 @@
+// A thread object whose Run is any function, with the protected part in reach.
+#ifndef ZANBASE_TESTS_RUNNER_H
+#define ZANBASE_TESTS_RUNNER_H
+
+#include <functional>
+#include <utility>
+
+#include "zanbase/thread.h"
+
+class Runner : public HThread {
+public:
+    Runner(std::function<void()> run, HThreadPriority priority = HThreadPriorityNormal)
+        : HThread(priority), moRun(std::move(run)) {}
+
+    using HThread::DestroyThread;
+    using HThread::Yield;
+    using HThread::operator=;
+
+private:
+    void Run() override { moRun(); }
+
+    std::function<void()> moRun;
+};
+
+#endif
