@@ -39,12 +39,14 @@ ZANBASE_API const char* IMPGetMajorRev();
 /// if `DestroyConsole` took that away since; 0 if none can be had, and then nothing has changed.
 ///
 /// After the call that made the console, the standard input, output and error use it, unbuffered, wherever
-/// they went before; what was written to them is flushed first, and input read ahead but not used is dropped.
-/// A stream that the program has closed stays closed. Later calls leave the streams alone.
+/// they went before. What they hold for output is written there first, or lost if that fails, and input read
+/// ahead but not used is dropped. A stream that the program has closed stays closed. Later calls leave the
+/// streams alone.
 ///
 /// On Linux the console is the terminal that the process was started from, if it has one; else a window of
 /// the program `xterm` on the display that the environment variable `DISPLAY` names, for which it waits half
-/// a minute at most. When the user closes that window, reading gives the end of input and writing fails.
+/// a minute at most. No signal and no child process shows the program that a window was started. When the
+/// user closes it, reading gives the end of input and writing fails.
 /// Not for a program that needs keys one by one or the mouse: it gives lines of text, no more.
 ZANBASE_API int CreateConsole();
 

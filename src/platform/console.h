@@ -7,8 +7,9 @@
 bool OpenConsole() noexcept;
 
 // Makes the standard input, output and error, in this order, use the open console, and all three unbuffered.
-// What they hold for output is written to where they went before, and an error or end of input is forgotten.
-// A stream that can't be connected stays where it was, as usable as before; there is no other sign of it.
+// What they hold for output is written to where they went before, or dropped if that fails; input read ahead
+// is dropped; an error or end of input is forgotten. A closed stream stays closed, and one that can't be
+// connected stays where it was, as usable as before; there is no other sign of it.
 void ConnectStandardStreams() noexcept;
 
 // Takes the console away; those standard streams that use it go to the null device, unbuffered. False if no

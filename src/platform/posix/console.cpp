@@ -13,25 +13,20 @@
 namespace {
 
 int gnConsole = -1;        // descriptor on the open console, -1 if none; kept, since the streams may move on
-bool gbOwnWindow = false;  // whether the open console is a window that we started
+bool gbOwnWindow = false;  // whether it is a window that we started
 
-struct StandardStream {
-    std::FILE* stream;
-    int descriptor;
-};
+std::array<std::FILE*, 3> StandardStreams() noexcept { return {stdin, stdout, stderr}; }
 
-std::array<StandardStream, 3> StandardStreams() noexcept {
-    return {{{stdin, STDIN_FILENO}, {stdout, STDOUT_FILENO}, {stderr, STDERR_FILENO}}};
-}
-
-// A failed dup2 leaves the stream where it was. A stream that the program closed stays closed: the C library
-// answers these calls with an error.
-void Connect(const StandardStream& standard, int target) noexcept {
-    std::fflush(standard.stream);
-    if (standard.stream == stdin) __fpurge(stdin);  // a pipe's input, which can't be given back
-    dup2(target, standard.descriptor);
-    std::clearerr(standard.stream);
-    std::setvbuf(standard.stream, nullptr, _IONBF, 0);
+// A failed dup2 leaves the stream where it was. A stream that the program closed has no descriptor, and the
+// number that it had may have gone to a file of the program's since.
+void Connect(std::FILE* stream, int target) noexcept {
+    const int descriptor = fileno(stream);
+    if (descriptor < 0) return;
+    std::fflush(stream);
+    __fpurge(stream);  // a pipe's input, which can't be given back, and output that nobody took
+    dup2(target, descriptor);
+    std::clearerr(stream);
+    std::setvbuf(stream, nullptr, _IONBF, 0);
 }
 
 bool UsesConsole(int descriptor) noexcept {
@@ -51,20 +46,19 @@ bool OpenConsole() noexcept {
 }
 
 void ConnectStandardStreams() noexcept {
-    for (const StandardStream& standard : StandardStreams()) Connect(standard, gnConsole);
+    for (std::FILE* const stream : StandardStreams()) Connect(stream, gnConsole);
 }
 
 bool CloseConsole() noexcept {
     if (gnConsole < 0) return false;
     const int null_device = OpenAboveStreams("/dev/null");
     if (null_device < 0) return false;
-    for (const StandardStream& standard : StandardStreams()) {
-        if (UsesConsole(standard.descriptor)) Connect(standard, null_device);
+    for (std::FILE* const stream : StandardStreams()) {
+        if (UsesConsole(fileno(stream))) Connect(stream, null_device);
     }
     close(null_device);
     close(gnConsole);  // a window of our own ends once nothing uses it
     gnConsole = -1;
-    gbOwnWindow = false;
     return true;
 }
 

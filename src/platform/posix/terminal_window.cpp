@@ -58,6 +58,10 @@ int OpenTerminalOf(int end, TerminalPath& path) noexcept {
     return named ? OpenAboveStreams(path) : -1;
 }
 
+// Copies this process; 0 in the copy. Nobody hears of it as of a fork: no handler hung onto forks runs, the
+// end of the copy raises no SIGCHLD, and no wait of the program meets it, except one for just such copies.
+pid_t CopyProcess() noexcept { return static_cast<pid_t>(syscall(SYS_clone, 0L, 0L, 0L, 0L, 0L)); }
+
 // Ends a copy of this process at once. The raw call: some tools hang work onto _exit, the flushing of streams
 // for one, and what waits in our streams is ours to write.
 [[noreturn]] void LeaveCopy() noexcept {
@@ -65,10 +69,11 @@ int OpenTerminalOf(int end, TerminalPath& path) noexcept {
 }
 
 // Becomes xterm, with `end` and the null device as its only descriptors and a session of its own, so that no
-// signal to our process group reaches it. Runs in a copy of a process that may have had other threads: calls
-// nothing that takes a lock.
+// signal to our process group reaches it. Runs in a copy of a process that may have had other threads, with
+// all signals blocked: calls nothing that takes a lock, and lets no handler of the program run.
 [[noreturn]] void BecomeXterm(char* option, int end) noexcept {
     setsid();
+    for (int number = 1; number <= SIGRTMAX; ++number) std::signal(number, SIG_DFL);
     sigset_t none;
     sigemptyset(&none);
     sigprocmask(SIG_SETMASK, &none, nullptr);
@@ -77,9 +82,11 @@ int OpenTerminalOf(int end, TerminalPath& path) noexcept {
     } else {
         dup2(end, kXtermEnd);
     }
-    const int null_device = open("/dev/null", O_RDWR);
-    for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream) dup2(null_device, stream);
+    close_range(STDIN_FILENO, STDERR_FILENO, 0);
     close_range(kXtermEnd + 1, ~0U, 0);
+    const int null_device = open("/dev/null", O_RDWR);  // gets the lowest free number, the standard input's
+    dup2(null_device, STDOUT_FILENO);
+    dup2(null_device, STDERR_FILENO);
     char name[] = "xterm";
     char resource_option[] = "-xrm";
     char* const arguments[] = {name, option, resource_option, gaResources, nullptr};
@@ -91,13 +98,17 @@ int OpenTerminalOf(int end, TerminalPath& path) noexcept {
 void StartXterm(const char* terminal_name, int end) noexcept {
     char option[sizeof(TerminalPath) + 16];
     std::snprintf(option, sizeof(option), "-S%s/%d", terminal_name, kXtermEnd);
-    const pid_t between = fork();
+    sigset_t all;
+    sigset_t before;
+    sigfillset(&all);
+    pthread_sigmask(SIG_SETMASK, &all, &before);
+    const pid_t between = CopyProcess();
     if (between == 0) {
-        if (fork() == 0) BecomeXterm(option, end);
+        if (CopyProcess() == 0) BecomeXterm(option, end);
         LeaveCopy();
     }
-    while (between > 0 && waitpid(between, nullptr, 0) < 0 && errno == EINTR) {
-    }
+    if (between > 0) waitpid(between, nullptr, __WALL);
+    pthread_sigmask(SIG_SETMASK, &before, nullptr);
 }
 
 // Waits for the line that says that the window is there; false if the other end was closed before.
