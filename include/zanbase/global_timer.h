@@ -19,9 +19,9 @@
 /// setting the system time shows in the totals.
 ///
 /// When the process exits, or calls `exit`, the report is printed once more on `std::cout`, also if `Report`
-/// was called before; a process that never asked for the instance prints nothing. An object with static
-/// storage that uses the timers in its destructor asks for the instance in its constructor, so that the
-/// timers outlive it.
+/// was called before; a process that never asked for the instance prints nothing. The timers are gone then:
+/// threads that toggle have to be through by that time, and an object with static storage that uses the
+/// timers in its destructor asks for the instance in its constructor, so that they outlive it.
 ///
 /// Not for threads that OpenMP gives the same number: outside parallel regions that is 0 for every thread,
 /// and nested teams number theirs from 0 again. Such threads must not toggle at the same time. Not for short

