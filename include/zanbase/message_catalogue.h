@@ -19,8 +19,8 @@
 /// Makes `locale` (a name as `std::setlocale` takes it) the locale of the process and of the message
 /// catalogue, except for numbers: they keep the format of "C", so text that a program writes and reads has a
 /// decimal point everywhere. Null or an empty text stands for what the environment asks for. A name that the
-/// system doesn't know changes nothing and is not reported. It changes the whole process: call it before
-/// other threads run.
+/// system doesn't know is not reported; numbers get the format of "C" all the same, and nothing else changes.
+/// It changes the whole process: call it before other threads run.
 ZANBASE_API void InitLocale(const char* locale);
 
 /// Takes catalogues from now on from below `directory`, which is copied; null leaves the place as it is.

@@ -3,7 +3,7 @@
 #define ZANBASE_PLATFORM_MESSAGES_H
 
 // Makes `locale` the locale of the C runtime and of the catalogues, for all categories, and then "C" that of
-// numbers. An empty name stands for the environment's choice; an unknown one leaves what was there.
+// numbers. An empty name stands for the environment's choice; an unknown one changes numbers alone.
 void SetMessageLocale(const char* locale) noexcept;
 
 // Makes `domain` the text domain that Translate asks, with its catalogues below `directory`; a null
