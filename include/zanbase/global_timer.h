@@ -24,15 +24,15 @@
 /// timers in its destructor asks for the instance in its constructor, so that they outlive it.
 ///
 /// Not for threads that OpenMP gives the same number: outside parallel regions that is 0 for every thread,
-/// and nested teams number theirs from 0 again. Such threads must not toggle at the same time. Not for short
-/// code either: a pair of toggles costs about two clock readings.
+/// and nested teams number theirs from 0 again. Such threads have to toggle one after the other. Not for
+/// short code either: a pair of toggles costs about two clock readings.
 class ZANBASE_API GlobalTimer {
 public:
     /// The one instance, built at the first call; any thread may make that. `std::bad_alloc` leaves it to the
     /// next call.
     static GlobalTimer& GetInstance();
 
-    /// Adds a timer and returns its identifier: 0, 1, 2, … in order of registration. Names need not differ;
+    /// Adds a timer and returns its identifier; identifiers count up from 0. Names need not differ;
     /// each registration is a timer of its own. No other call may be in progress, so as a rule it is made
     /// outside parallel regions. `std::bad_alloc` leaves the timers as they were.
     unsigned long long RegisterNewTimer(std::string name);

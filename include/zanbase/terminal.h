@@ -1,9 +1,9 @@
 /// @file
 /// What a program asks about its surroundings: terminal codes, the revision, a text console, screen measures.
 ///
-/// Nothing here takes a lock. `IMPTerminal`, `IMPAutomaticTerm` and `IsWin32s` may be called by any thread at
-/// any time; the first call of `IMPGetMajorRev`, the console operations and `SetScreenSize` belong to one
-/// thread at a time, as a rule the one that starts the program.
+/// Any thread may call `IMPTerminal`, `IMPAutomaticTerm` and `IsWin32s` at any time. The rest shares state
+/// that no lock guards: the first call of `IMPGetMajorRev`, the console operations and `SetScreenSize` belong
+/// to one thread at a time, as a rule the one that starts the program.
 #ifndef ZANBASE_TERMINAL_H
 #define ZANBASE_TERMINAL_H
 
@@ -67,9 +67,9 @@ ZANBASE_API int IsWin32s();
 /// 1 if they were stored, 0 if an earlier call had stored its own, which stay.
 ZANBASE_API int SetScreenSize(double first, double second, double third, double fourth);
 
-/// Hands out the measures that `SetScreenSize` stored through those pointers that are not null. 1 if it did;
-/// 0, with nothing written, if all four are null or nothing was stored. After the measures were stored, any
-/// thread may call it.
+/// Hands out the measures that `SetScreenSize` stored, each to its own pointer; one that isn't wanted may be
+/// null. 1 if it did; 0, with nothing written, if all four are null or nothing was stored. After the measures
+/// were stored, any thread may call it.
 ZANBASE_API int GetScreenSize(double* first, double* second, double* third, double* fourth);
 
 #endif

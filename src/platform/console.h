@@ -6,7 +6,7 @@
 // had. To be called at most once with success.
 bool OpenConsole() noexcept;
 
-// Makes the standard input, output and error, in this order, use the open console, and all three unbuffered.
+// Connects the three standard streams, the input first and the error last, to the open console, unbuffered.
 // What they hold for output is written to where they went before, or dropped if that fails; input read ahead
 // is dropped; an error or end of input is forgotten. A closed stream stays closed, and one that can't be
 // connected stays where it was, as usable as before; there is no other sign of it.
