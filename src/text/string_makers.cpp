@@ -32,12 +32,11 @@ std::string MkString(double value, int decimals) {
 // The areas are left as the stack has them: clearing 4096 bytes would slow a short text down.
 
 std::string MkString(const char* format, ...) {
-    char area[kTextBytes];
     va_list arguments;
     va_start(arguments, format);
-    WriteFormat(format, arguments, area, sizeof area);
+    std::string text = MkStringV(format, arguments);
     va_end(arguments);
-    return area;
+    return text;
 }
 
 std::string MkStringV(const char* format, va_list arguments) {
