@@ -1,51 +1,70 @@
-// The formulas of the clocks, the stopwatch on a clock of the test's own, and the text of a time.
+// Clocks, stopwatch, sleep and random numbers, on clocks of the test's own.
 #include "zanbase/clock.h"
 
 #include <gtest/gtest.h>
 
-#include <cmath>
+#include <climits>
+#include <random>
 
 #include "platform/clock.h"
 #include "timing/time_text.h"
+#include "zanbase/random.h"
+#include "zanbase/sleep.h"
 
 WallClock now = {};
+unsigned int ticks = UINT_MAX - 4, pauses = 1;  // a tick at every other pause
+std::string calls;
+
 extern "C" WallClock __wrap__Z13ReadWallClockv() { return now; }
+extern "C" unsigned int __wrap__Z9ReadTicksv() { return ticks; }
+extern "C" void __wrap__Z8PauseForj(unsigned ms) { ticks += ++pauses % 2, calls += std::to_string(ms) + ";"; }
 
 class CopyableTimer : public HTimer {};
 
-TEST(Clock, TellsTheTimeInEachUnitAndSinceATimersOwnStart) {
+TEST(Clock, TellsTimesInEachUnitAndAsText) {
     now = {-2, 250};
-    EXPECT_EQ(GetMicroSeconds(), -1750000.0);
-    EXPECT_EQ(GetMilliSeconds(), -1750.0);
-    EXPECT_EQ(GetTimeInSeconds(), -1.75);
+    EXPECT_EQ(std::pair(GetMicroSeconds(), GetMilliSeconds()), std::pair(-1750000.0, -1750.0));
     CopyableTimer timer;
     now = {7198, 750};
-    EXPECT_EQ(timer.GetTimeInSeconds(), 7200.5);
-    EXPECT_EQ(timer.GetTimeInMinutes(), 7200.5 / 60.0);
-    EXPECT_EQ(timer.GetTimeInHours(), 7200.5 / 60.0 / 60.0);
+    EXPECT_TRUE(timer.GetTimeInMinutes() == 7200.5 / 60 && timer.GetTimeInHours() == 7200.5 / 60 / 60);
     CopyableTimer copy(timer);  // starts anew, and keeps that when it is assigned to
     now = {7200, 750};
     EXPECT_EQ((copy = timer).GetTimeInSeconds(), 2.0);
     timer.Reset();
     now = {7200, 500};
-    EXPECT_EQ(timer.GetTimeAsString(), "-250.000 milliseconds");
+    std::string texts = timer.GetTimeAsString();
+    for (const double seconds : {0.9996, 1.0, 59.9996, 61.9, 3599.0, 3600.0, 90061.0, 604799.9, 6048000.0,
+                                 2147483647.9, 2147483648.0})
+        texts += '|' + TimeText(seconds);
+    EXPECT_EQ(texts,
+              "-250.000 milliseconds|999.600 milliseconds|1.000 seconds|60.000 seconds|1m01s|59m59s|1h00m00s|"
+              "1d01h01m01s|6d23h59m59s|10w00d00h00m00s|3550w05d03h14m07s|2147483648.000 seconds");
 }
 
-TEST(TimeText, ChoosesUnitsBySize) {
-    const std::pair<double, const char*> rows[] = {{0, "0.000 milliseconds"},
-                                                   {0.9996, "999.600 milliseconds"},
-                                                   {1, "1.000 seconds"},
-                                                   {59.9996, "60.000 seconds"},
-                                                   {61.9, "1m01s"},
-                                                   {3599, "59m59s"},
-                                                   {3600, "1h00m00s"},
-                                                   {90061, "1d01h01m01s"},
-                                                   {604799.9, "6d23h59m59s"},
-                                                   {6048000, "10w00d00h00m00s"},
-                                                   {2147483647.9, "3550w05d03h14m07s"},
-                                                   {2147483648.0, "2147483648.000 seconds"},
-                                                   {-90061, "-90061000.000 milliseconds"},
-                                                   {HUGE_VAL, "inf seconds"},
-                                                   {std::nan(""), "nan milliseconds"}};
-    for (const auto& [seconds, text] : rows) EXPECT_EQ(TimeText(seconds), text);
+TEST(USleep, PausesForATenthOfTheTimeAtLeastUntilAHookIsInstalled) {
+    for (const int microseconds : {0, INT_MIN, 1, 5000, 19999, 39999}) USleep(microseconds);
+    EXPECT_EQ(calls, "0;0;5;5;19;19;39;39;39;39;39;39;");
+    InstallUSleepHook([](int microseconds) { calls = std::to_string(microseconds); });
+    for (const int microseconds : {INT_MAX, 0, -1}) USleep(microseconds);
+    EXPECT_EQ(calls, "2147483647");
+}
+
+const int unseeded = IMPRandInt();  // before any test seeds
+
+TEST(Random, FollowsThePublishedGeneratorFromAnySeed) {
+    EXPECT_EQ(unseeded, 2147466840);
+    IMPInitRandom(1);
+    std::minstd_rand0 published(16807);  // the seed is not a draw, nor is the first step
+    for (int step = 2; step <= 10000; ++step) ASSERT_EQ(IMPRandInt(), static_cast<int>(published()));
+    now = {1750000000, 123};
+    const int rows[][3] = {
+        {0, 542982264, 16167894}, {INT_MIN, INT_MIN, 1865008398}, {INT_MAX, INT_MAX, INT_MAX}};
+    for (const auto& [seed, used, first] : rows)
+        EXPECT_TRUE(IMPInitRandom(seed) == used && IMPRandInt() == first) << seed;
+    EXPECT_EQ(IMPRandom(), 1.0);  // the last seed's state steps to itself
+    IMPInitRandom(42);
+    double sum = -6.0;
+    for (int draw = 0; draw < 12; ++draw) sum += IMPRandom();
+    IMPInitRandom(42);
+    EXPECT_EQ(IMPRandNorm(-2.0), sum * -2.0);
 }
