@@ -80,8 +80,7 @@ public:
     /// On Linux a signal ends the thread: of the real-time signals the highest but one, or the next below it
     /// that the program has no handler for. What that can't do, and what it breaks:
     ///   - A thread that blocks all signals is ended when it admits them again or has come to its end, and
-    ///   the
-    ///     call waits until then. So it does if the program uses every real-time signal.
+    ///     the call waits until then. So it does if the program uses every real-time signal.
     ///   - A thread inside the C library may hold a lock there, that of `malloc` or of a stream, which would
     ///     stop every other thread. So it is let out first, which takes microseconds as a rule; one that is
     ///     never found outside for ten seconds, as it fills memory without pause, is ended all the same. A
@@ -91,8 +90,7 @@ public:
     ///   - Other threads that wait for a `std::condition_variable` together with it may miss their wake-ups
     ///     from then on. Mutexes, the semaphores and the `HCondVar` of this library stay whole.
     ///   - The C library loses the thread's cache of freed blocks: about 0.7 kB, and what the thread has
-    ///   freed,
-    ///     up to 234 kB; also 32 bytes for each of its thread-local objects with a destructor.
+    ///     freed, up to 234 kB; also 32 bytes for each of its thread-local objects with a destructor.
     ///   - If the initial thread has ended by `pthread_exit`, the process ends without its exit handlers.
     void Kill();
 

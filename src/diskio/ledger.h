@@ -1,8 +1,7 @@
 // The tables of the disk ledger. Invariants, whenever its mutex is free:
 //
 // - A binding's record is that of its name, or null if that was not looked for or not there. So a record
-// found
-//   by the name of a binding is entered there, and never looked up by that binding again.
+//   found by the name of a binding is entered there, and never looked up by that binding again.
 // - Records and bindings leave together, and never singly: no binding outlives its record.
 // - A saved state shares nothing with the live tables.
 #ifndef ZANBASE_DISKIO_LEDGER_H

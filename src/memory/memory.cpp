@@ -2,8 +2,7 @@
 //
 // - The three tables exist all or none.
 // - A recent site points to an entry of *mpoFileMap, or is null. The table keeps an entry where it is until
-// the
-//   table is emptied or replaced, and whoever does that forgets the recent sites.
+//   the table is emptied or replaced, and whoever does that forgets the recent sites.
 // - A spare node belongs to no table, so no reader of the tables sees it.
 #include "zanbase/memory.h"
 

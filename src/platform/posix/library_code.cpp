@@ -5,9 +5,9 @@
 //                                        do nothing else
 //   in a wait of ours                    it came through the library's bare system call
 //   behind a system call cut short by    the library doesn't make such calls under its own locks, and must
-//   not the signal                           go on as if the wait were over at the same system call, with the
-//   it waits there: for input, for a mutex of the program. The library's own same stack, for the second time
-//   locks are held for less than the pause between two tries
+//   the signal                           go on as if the wait were over
+//   at the same system call, with the    it waits there: for input, for a mutex of the program. The library's
+//   same stack, for the second time      own locks are held for less than the pause between two tries
 //
 // What remains: a thread that waits for output to a stream (to a full pipe, say) dies with the stream locked,
 // and so does one that executes the program's code under a lock of the library, as a callback of

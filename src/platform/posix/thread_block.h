@@ -1,12 +1,12 @@
 // The control block of a thread: what its owner, those who wait for it and the thread itself share.
 //
-//   state      entered by                                        left by
-//   Starting   StartThread                                       the thread's first step; to Gone if none was
-//   made Live       the thread's first step                           the end of its body, or its death
-//   Leaving    the end of the body, somebody waiting             the last of the thread's exit routines
-//   Dead       the thread, where it was ended                    a waiter, or the next StartThread, who joins
-//   it Joining    who joins it                                      the same, when the system's thread is
-//   gone Gone       the end of the body, nobody waiting; see above    a new StartThread
+//   state      entered by                                     left by
+//   Starting   StartThread                                    the thread's first step; to Gone if none was made
+//   Live       the thread's first step                        the end of its body, or its death
+//   Leaving    the end of the body, somebody waiting          the last of the thread's exit routines
+//   Dead       the thread, where it was ended                 a waiter, or the next StartThread, who joins it
+//   Joining    who joins it                                   the same, when the system's thread is gone
+//   Gone       the end of the body, nobody waiting; above     a new StartThread
 //
 // A slot leads to a block only while it is Starting or Live, and not even then once the thread was forgotten.
 // A thread that comes to its end detaches itself. One that died can't: the C library has not seen it go, and

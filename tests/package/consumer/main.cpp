@@ -1,5 +1,5 @@
-// A program that takes the library as a stranger would: one header, and a call into every corner that could
-// miss a dependency at compile, link or load time.
+// A program that takes the library as a stranger would: one header, and a call
+// into every corner that could miss a dependency at compile, link or load time.
 #include <zanbase/zanbase.h>
 
 #include <cstdio>
@@ -10,6 +10,14 @@ extern bool worked_at_load;  // early.cpp
 static_assert(ZANBASE_VERSION >= 100, "version macros");
 
 namespace {
+
+class Worker : public HThread {
+public:
+    HSemaphore done{0};
+
+private:
+    void Run() override { done.Unlock(); }
+};
 
 int failures = 0;
 
@@ -24,6 +32,13 @@ void Check(bool holds, const char* what) {
 int main() {
     HMutex mutex;
     const HMutexLock lock = &mutex;
+    HWritePrefMutex table;
+    const HReaderLock reader = &table;
+    Worker worker;
+    worker.Start(true);
+    worker.done.Lock();
+    worker.Wait();
+
     HDiskIOOpen("a file", &mutex, 0.5);
     unsigned int opens = 1;
     unsigned long long bytes = 0;
@@ -37,6 +52,7 @@ int main() {
 
     Check(worked_at_load, "a static initialiser of another library");
     Check(lock.GetMutex() == &mutex, "mutex");
+    Check(!worker.IsRunning(), "thread");
     Check(opens == 1 && bytes == 100, "ledger");
     Check(numbers[0] == 1, "sort");
     Check(timer.GetTimeInSeconds() < 3600, "clock");
