@@ -1,0 +1,17 @@
+# The files of this back end.
+set(ZANBASE_PLATFORM_SOURCES
+    clock.cpp
+    condition.cpp
+    console.cpp
+    futex.cpp
+    guard.cpp
+    kill.cpp
+    library_code.cpp
+    lock.cpp
+    messages.cpp
+    processors.cpp
+    restartable.cpp
+    semaphore.cpp
+    terminal_window.cpp
+    thread.cpp
+    thread_block.cpp)
