@@ -203,8 +203,10 @@ TEST(HThread, RunsNothingOfAKilledThread) {
 }
 
 TEST(HThread, RunsOnWithoutItsObjectOnceLetGo) {
-    HSemaphore entered(0), leave(0), left(0);
+    HSemaphore entered(0), first_leave(0), second_leave(0), left(0);
+    std::atomic<int> runs{0};
     Runner runner([&] {
+        HSemaphore& leave = ++runs == 1 ? first_leave : second_leave;
         entered.Unlock();
         leave.Lock();
         left.Unlock();
@@ -215,10 +217,10 @@ TEST(HThread, RunsOnWithoutItsObjectOnceLetGo) {
     EXPECT_FALSE(runner.IsRunning());
     runner.Start(true);  // a second thread, which the end of the first leaves alone
     entered.Lock();
-    leave.Unlock();
+    first_leave.Unlock();
     left.Lock();
     EXPECT_TRUE(runner.IsRunning());
-    leave.Unlock();
+    second_leave.Unlock();
     runner.Wait();
     left.Lock();
 }
