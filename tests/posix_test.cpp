@@ -42,7 +42,8 @@ TEST(PosixSignals, CutNoPauseAndBreakAStoreInsteadOfBeingOverwritten) {
     PauseFor(5);
     EXPECT_GE(ReadTicks() - start, 5U);
     while (hits < 5000) {
-        word = 1;
+        word.store(1, std::memory_order_relaxed);  // a locked one would draw all the signals to itself
+        std::atomic_signal_fence(std::memory_order_seq_cst);
         const unsigned int before = hits;
         StoreIfStill(word, 1, 0);
         EXPECT_TRUE(hits == before || word == 2);
