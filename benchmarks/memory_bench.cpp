@@ -85,8 +85,8 @@ enum Order { kNewest, kAny };  // which block goes next
 // one.
 template <class Tracker>
 void Steps(benchmark::State& state, Tracker& tracker) {
-    static const char* const kFiles[] = {"/home/me/src/a.cpp", "/home/me/src/b.cpp", "/home/me/src/c.cpp",
-                                         "/home/me/src/d.cpp"};
+    static const char* const kFiles[] = {"/project/src/a.cpp", "/project/src/b.cpp", "/project/src/c.cpp",
+                                         "/project/src/d.cpp"};
     std::mt19937 random(1);
     std::vector<void*> blocks(static_cast<std::size_t>(state.range(0)));
     std::uintptr_t address = 0x5000000;
