@@ -1,17 +1,17 @@
 // Runs three threads of an algorithm under every order of their steps.
 //
-// A thread is a list of calls, and each access to something shared is a step. A step is made by running the
-// call again from its start, with the results of its earlier steps played back, and leaving it by an
-// exception before the step after the new one. So a state is plain data, and one met before isn't gone
+// A thread makes the calls of its script, and each access to something shared is a step. A step is made by
+// running the call again from its start, with the results of its earlier steps played back, and leaving it by
+// an exception before the step after the new one. So a state is plain data, and one met before isn't gone
 // through again.
 #ifndef ZANBASE_TESTS_EXPLORER_H
 #define ZANBASE_TESTS_EXPLORER_H
 
 #include <array>
-#include <cstddef>
 #include <functional>
 #include <string>
 #include <unordered_set>
+#include <utility>
 #include <vector>
 
 constexpr std::size_t kThreads = 3;
@@ -20,7 +20,7 @@ using Value = unsigned long long;
 struct State {
     std::array<Value, 24> words{};  // all that is shared, and what a model notes beside it
     struct Thread {
-        std::size_t call = 0;    // its place in the list
+        std::size_t call = 0;    // its place in the script
         std::vector<Value> log;  // results of the steps of this call
         bool dead = false;
     };
@@ -29,20 +29,34 @@ struct State {
 
 class Explorer {
 public:
-    std::array<std::vector<std::function<void()>>, kThreads> calls;
+    std::array<std::string, kThreads> scripts;  // a letter each call
+    std::function<void(char)> call;
     std::function<const char*(const State&, bool at_the_end)> check;  // what is wrong, or null
     std::function<bool(State&, std::size_t thread)> kill;  // what may end a thread, if set; false: not now
 
     // What is wrong in some order of steps; empty if nothing is.
     std::string Explore(const State& start) {
-        mFound.clear();
-        mSeen.clear();
-        Visit(start);
-        return mFound;
+        std::unordered_set<Value> seen;
+        std::vector<State> due{start};
+        for (mFound = nullptr; mFound == nullptr && !due.empty();) {
+            const State state = std::move(due.back());
+            due.pop_back();
+            if (!seen.insert(Digest(state)).second) continue;
+            const std::size_t others = due.size();
+            for (std::size_t thread = 0; thread < kThreads; ++thread) {
+                if (IsDone(state, thread) || state.threads[thread].dead) continue;
+                mChoices = 1;
+                for (mChoice = 0; mChoice < mChoices && Run(state, thread); ++mChoice) due.push_back(now);
+                State killed = state;
+                if (kill && kill(killed, thread)) due.push_back(killed);
+            }
+            if (mFound == nullptr) mFound = check(state, due.size() == others);
+        }
+        return mFound != nullptr ? mFound : "";
     }
 
     bool IsDone(const State& state, std::size_t thread) const {
-        return state.threads[thread].call == calls[thread].size();
+        return state.threads[thread].call == scripts[thread].size();
     }
 
     // For the running call. A step: `body` changes the state and gives the result.
@@ -50,8 +64,7 @@ public:
     Value Step(Body body) {
         std::vector<Value>& log = now.threads[self].log;
         if (mPlayed == log.size()) {
-            if (mStepped) throw Pause{};
-            mStepped = true;
+            if (std::exchange(mStepped, true)) throw Pause{};
             log.push_back(body(now));
         }
         return log[mPlayed++];
@@ -71,36 +84,15 @@ public:
 private:
     struct Pause {};
 
-    void Visit(const State& state) {
-        if (!mFound.empty() || !mSeen.insert(Digest(state)).second) return;
-        const char* what = check(state, false);
-        bool at_the_end = true;
-        for (std::size_t thread = 0; thread < kThreads && what == nullptr && mFound.empty(); ++thread) {
-            if (IsDone(state, thread) || state.threads[thread].dead) continue;
-            for (std::size_t choice = 0, choices = 1; choice < choices && Run(state, thread, choice);
-                 ++choice) {
-                at_the_end = false;
-                choices = mChoices;
-                Visit(State(now));
-            }
-            State killed = state;
-            if (kill && kill(killed, thread)) Visit(killed);
-        }
-        if (what == nullptr && at_the_end && mFound.empty()) what = check(state, true);
-        if (what != nullptr) mFound = what;
-    }
-
     // Makes the thread's next step from `state`. False if it can't.
-    bool Run(const State& state, std::size_t thread, std::size_t choice) {
+    bool Run(const State& state, std::size_t thread) {
         now = state;
         self = thread;
         mPlayed = 0;
         mStepped = false;
-        mChoice = choice;
-        mChoices = 1;
         State::Thread& mine = now.threads[thread];
         try {
-            calls[thread][mine.call]();
+            call(scripts[thread][mine.call]);
             ++mine.call;
             mine.log.clear();
         } catch (const Pause&) {
@@ -129,8 +121,7 @@ private:
 
     std::size_t mPlayed = 0, mChoice = 0, mChoices = 1;
     bool mStepped = false;
-    std::unordered_set<Value> mSeen;
-    std::string mFound;
+    const char* mFound = nullptr;
 };
 
 // The explorer at work, and steps on one of its words.

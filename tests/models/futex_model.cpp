@@ -1,5 +1,5 @@
 // Lock, semaphore and condition as they are shipped, on words, sleepers and restartable stores of the
-// explorer; one thread may be ended at any step.
+// explorer; once, at any step, a thread may be ended or the breaking of stores may fail.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -13,13 +13,13 @@
 
 namespace {
 
-// The word of what is tested is at place 0. Then: a lock beside a condition, whether a thread was ended, how
+// The word of what is tested is at place 0. Then: a lock beside a condition, whether the one mishap has been, how
 // many own the lock, and items to wait for. Then for each thread the word that it sleeps on, its debts (a
 // word, a condition, what it saw there) and the word that it is about to store to, all plus 1.
 enum Place : std::size_t {
     kWord,
     kLock,
-    kEnded,
+    kMishap,
     kOwners,
     kItems,
     kSleeps,
@@ -32,6 +32,7 @@ enum Place : std::size_t {
 enum class Fault { kNone, kUnbrokenStores, kForgottenDebts, kForgottenSignalDebts };
 
 Fault fault = Fault::kNone;
+constexpr int kSoon = 0;  // a deadline, which may pass at any time
 
 // Notes who has last changed a word from 0.
 Value Becomes(Value old, Value value) {
@@ -126,18 +127,24 @@ struct System {
         }) != 0;
     }
 
-    static void BreakStores() {
-        running->Step([](State& state) {
+    static bool BreakStores() {
+        return running->Step([](State& state) {
+            if (state.words[kMishap] == 0 && running->Choose(2) != 0) {
+                state.words[kMishap] = 1;
+                return Value{0};
+            }
             if (fault != Fault::kUnbrokenStores) std::fill_n(&state.words[kStores], kThreads, 0);
-            return Value{0};
-        });
+            return Value{1};
+        }) != 0;
     }
+
+    static void SleepShortly(Word& word, unsigned int expected) { SleepWhile(word, expected, &kSoon); }
 };
 
 // Ends a thread, which passes on what it owes as PassWakeUpOn does.
 bool Kill(State& state, std::size_t thread) {
-    if (state.words[kEnded] != 0) return false;
-    state.words[kEnded] = state.threads[thread].dead = true;
+    if (state.words[kMishap] != 0) return false;
+    state.words[kMishap] = state.threads[thread].dead = true;
     Value* const sleeps = &state.words[kSleeps];
     sleeps[thread] = 0;
     if (state.words[kDebt + thread] != 0) {
@@ -155,20 +162,15 @@ class FutexModel : public testing::Test {
 protected:
     FutexModel() {
         running = &mExplorer;
-        fault = Fault::kNone;
         mExplorer.kill = Kill;
     }
 
-    // Takes calls like "ab" for each thread, of those in `mCalls`. No order of steps goes wrong, but one does
-    // with each of the faults. In the end a thread may wait only where `is_free` says that there is nothing
-    // to be had, or for a lock at `lock` that a thread held when it was ended.
-    void Explore(Place lock, bool (*is_free)(const State&), std::array<const char*, kThreads> scripts,
+    // No order of steps goes wrong, but one does with each of the faults. In the end a thread may wait only
+    // where `is_free` says that there is nothing to be had, or for a lock at `lock` that a thread held when it
+    // was ended.
+    void Explore(Place lock, bool (*is_free)(const State&), std::array<std::string, kThreads> scripts,
                  std::initializer_list<Fault> seeded) {
-        for (std::size_t thread = 0; thread < kThreads; ++thread) {
-            mExplorer.calls[thread].clear();
-            for (const char* call = scripts[thread]; *call != 0; ++call)
-                mExplorer.calls[thread].push_back(mCalls[static_cast<std::size_t>(*call - 'a')]);
-        }
+        mExplorer.scripts = std::move(scripts);
         mExplorer.check = [=](const State& state, bool at_the_end) -> const char* {
             if (state.words[kOwners] > 1) return "two owners";
             if (!at_the_end || !is_free(state)) return nullptr;
@@ -186,31 +188,33 @@ protected:
     }
 
     Explorer mExplorer;
-    std::vector<std::function<void()>> mCalls;
 };
 
 TEST_F(FutexModel, LockIsWhole) {
-    mCalls = {[] {
-                  FutexLock<System>().Take(1);
-                  ++running->now.words[kOwners];
-              },
-              [] {
-                  Add(kOwners, -1);
-                  FutexLock<System>().Give();
-              }};
+    mExplorer.call = [](char call) {
+        FutexLock<System> lock;
+        if (call == 'R') {
+            Add(kOwners, -1);
+            return lock.Give();
+        }
+        lock.Take(1);
+        ++running->now.words[kOwners];
+    };
     const auto always = [](const State&) { return true; };
-    Explore(kWord, always, {"abab", "ab", "ab"}, {Fault::kUnbrokenStores, Fault::kForgottenDebts});
+    Explore(kWord, always, {"TRTR", "TR", "TR"}, {Fault::kUnbrokenStores, Fault::kForgottenDebts});
 }
 
 TEST_F(FutexModel, SemaphoreIsWhole) {
-    const int deadline = 0;
-    mCalls = {[] { FutexSemaphore<System>(0).Take(nullptr); }, [] { FutexSemaphore<System>(0).Give(); },
-              [&] { FutexSemaphore<System>(0).Take(&deadline); }};
+    mExplorer.call = [](char call) {
+        FutexSemaphore<System> semaphore(0);
+        if (call == 'G') return semaphore.Give();
+        semaphore.Take(call == 't' ? &kSoon : nullptr);
+    };
     const auto has_units = [](const State& state) {
         return (state.words[kWord] & FutexSemaphore<System>::kMost) != 0;
     };
-    Explore(kLock, has_units, {"ab", "a", "bb"}, {Fault::kForgottenDebts});
-    Explore(kLock, has_units, {"a", "c", "bb"}, {});
+    Explore(kLock, has_units, {"TG", "T", "GG"}, {Fault::kForgottenDebts});
+    Explore(kLock, has_units, {"T", "t", "GG"}, {});
 }
 
 struct SimpleLock {
@@ -225,20 +229,16 @@ struct SimpleLock {
 
 TEST_F(FutexModel, ConditionIsWhole) {
     // Wait for one and take it, add one, wake one, wake all.
-    mCalls = {[] {
-                  const SimpleLock lock;
-                  lock.Take();
-                  while (Get(kItems) == 0) FutexCondition<System>().Sleep(lock, nullptr);
-                  Add(kItems, -1);
-                  lock.Give();
-              },
-              [] {
-                  const SimpleLock lock;
-                  lock.Take();
-                  Add(kItems, 1);
-                  lock.Give();
-              },
-              [] { FutexCondition<System>().WakeOne(); }, [] { FutexCondition<System>().WakeAll(); }};
+    mExplorer.call = [](char call) {
+        FutexCondition<System> condition;
+        if (call == 'o') return condition.WakeOne();
+        if (call == 'a') return condition.WakeAll();
+        const SimpleLock lock;
+        lock.Take();
+        while (call == 'W' && Get(kItems) == 0) condition.Sleep(lock, nullptr);
+        Add(kItems, call == 'W' ? -1 : 1);
+        lock.Give();
+    };
     // The third thread wakes the others. Before it has changed the word that it read first it owes nothing.
     mExplorer.kill = [](State& state, std::size_t thread) {
         const std::vector<Value>& log = state.threads[2].log;
@@ -246,9 +246,9 @@ TEST_F(FutexModel, ConditionIsWhole) {
         return (thread != 2 || wakes) && Kill(state, thread);
     };
     const auto has_items = [](const State& state) { return state.words[kItems] != 0; };
-    Explore(kLock, has_items, {"a", "a", "bcbc"}, {Fault::kForgottenDebts});
-    Explore(kLock, has_items, {"a", "a", "bc"}, {Fault::kForgottenSignalDebts});
-    Explore(kLock, has_items, {"a", "a", "bbd"}, {Fault::kForgottenDebts});
+    Explore(kLock, has_items, {"W", "W", "+o+o"}, {Fault::kForgottenDebts});
+    Explore(kLock, has_items, {"W", "W", "+o"}, {Fault::kForgottenSignalDebts});
+    Explore(kLock, has_items, {"W", "W", "++a"}, {Fault::kForgottenDebts});
 }
 
 }  // namespace

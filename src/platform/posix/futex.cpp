@@ -60,8 +60,8 @@ void PassWakeUpOn() noexcept {
     const WakeDebts debts = toWakeDebts;
     if (debts.mpoWord != nullptr) {
         // It may have told an owner to wake sleepers, and not yet kept that owner from overwriting it. Others
-        // rely on what they read there.
-        BreakStores();
+        // rely on what they read there; where it fails, they do so for a short sleep only.
+        static_cast<void>(BreakStores());
         WakeSleepers(*debts.mpoWord, kEverySleeper);
     }
     if (debts.mpoCondition != nullptr && *debts.mpoCondition != debts.mnSeen)

@@ -7,7 +7,8 @@
 //   1 -> 0   given back                 2 -> 0   given back, one sleeper woken
 //
 // 1 -> 0 is a plain store where the system has restartable ones. A waiter breaks such stores after it has
-// written 2, so no owner that saw the 1 can overwrite the 2 any more.
+// written 2, so no owner that saw the 1 can overwrite the 2 any more. Where it can't break them, nobody might
+// wake it, so it looks again after a short sleep.
 //
 // mnOwner and mnDepth are written by the owner alone. Another thread that reads mnOwner can only see that the
 // owner isn't itself. An owner is known by a number that is never given to a second thread, so a lock whose
@@ -79,8 +80,11 @@ private:
     void AwaitFree() {
         const typename System::WakeDebt debt(mnState);
         while (mnState.exchange(2, std::memory_order_acquire) != 0) {
-            System::BreakStores();
-            System::SleepWhile(mnState, 2, nullptr);
+            if (System::BreakStores()) {
+                System::SleepWhile(mnState, 2, nullptr);
+            } else {
+                System::SleepShortly(mnState, 2);
+            }
         }
     }
 

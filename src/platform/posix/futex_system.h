@@ -21,7 +21,11 @@ struct FutexSystem {
     static bool StoreIfStill(Word& word, unsigned int expected, unsigned int desired) noexcept {
         return ::StoreIfStill(word, expected, desired);
     }
-    static void BreakStores() noexcept { ::BreakStores(); }
+    static bool BreakStores() noexcept { return ::BreakStores(); }
+    static void SleepShortly(Word& word, unsigned int expected) noexcept {
+        const timespec soon = DeadlineIn(1);
+        ::SleepWhile(word, expected, &soon);
+    }
 
     // Makes `attempt` a few times with growing pauses; true as soon as it succeeds. Lasts about as long as
     // going to sleep and being woken would, so a wait costs at most twice of what the better way had cost.

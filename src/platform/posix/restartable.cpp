@@ -3,6 +3,8 @@
 
 #ifdef ZANBASE_RESTARTABLE_STORES
 
+#include <cerrno>
+
 #include <linux/membarrier.h>
 
 std::atomic<std::ptrdiff_t> gnRestartableArea{0};
@@ -23,10 +25,12 @@ void AllowRestartableStores() noexcept {
     gbDecided.store(true, std::memory_order_release);
 }
 
-void BreakStores() noexcept {
-    // Can't fail: the process is registered, and a child of fork is with it.
-    if (gnRestartableArea.load(std::memory_order_relaxed) != 0)
-        Barrier(MEMBARRIER_CMD_PRIVATE_EXPEDITED_RSEQ);
+bool BreakStores() noexcept {
+    if (gnRestartableArea.load(std::memory_order_relaxed) == 0) return true;
+    const int callers_errno = errno;
+    const bool broken = Barrier(MEMBARRIER_CMD_PRIVATE_EXPEDITED_RSEQ);
+    errno = callers_errno;
+    return broken;
 }
 
 #endif

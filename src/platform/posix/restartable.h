@@ -37,8 +37,10 @@ extern std::atomic<std::ptrdiff_t> gnRestartableArea;
 // Decides whether there are restartable stores; to be called before a word is used with the other two.
 void AllowRestartableStores() noexcept;
 
-// When it returns, no thread is between the test and the store of a StoreIfStill() that it began before.
-void BreakStores() noexcept;
+// If it gives true, no thread is between the test and the store of a StoreIfStill() that it began before. The
+// process is registered for the barrier, and a child of fork with it, so it fails only where a filter for
+// system calls came later; then such a store may still be made, within moments.
+[[nodiscard]] bool BreakStores() noexcept;
 
 // Stores `desired`, with release order, if `word` is `expected`. May fail for no reason.
 inline bool StoreIfStill(FutexWord& word, unsigned int expected, unsigned int desired) noexcept {
@@ -77,7 +79,7 @@ failed:
 #else
 
 inline void AllowRestartableStores() noexcept {}
-inline void BreakStores() noexcept {}
+inline bool BreakStores() noexcept { return true; }
 inline bool StoreIfStill(FutexWord&, unsigned int, unsigned int) noexcept { return false; }
 
 #endif
