@@ -93,6 +93,8 @@ struct System {
         return false;
     }
 
+    static bool IsAlone() { return false; }
+
     static bool SleepWhile(Word&, unsigned int expected, Deadline deadline) {
         const std::size_t sleeps = kSleeps + running->self;
         const Value slept = running->Step([&](State& state) {

@@ -10,6 +10,9 @@
 // written 2, so no owner that saw the 1 can overwrite the 2 any more. Where it can't break them, nobody might
 // wake it, so it looks again after a short sleep.
 //
+// As long as the process has one thread, plain loads and stores do: nobody can wait, and whoever starts a second
+// thread makes all that came before visible to it.
+//
 // mnOwner and mnDepth are written by the owner alone. Another thread that reads mnOwner can only see that the
 // owner isn't itself. An owner is known by a number that is never given to a second thread, so a lock whose
 // owner was ended is not taken for its own by a thread that the system gave the same identifier.
@@ -56,7 +59,11 @@ public:
             return;
         }
         mnOwner.store(0, std::memory_order_relaxed);
-        if (!System::StoreIfStill(mnState, 1, 0)) GiveSlowly();
+        if (System::IsAlone()) {
+            mnState.store(0, std::memory_order_relaxed);
+        } else if (!System::StoreIfStill(mnState, 1, 0)) {
+            GiveSlowly();
+        }
     }
 
 private:
@@ -68,6 +75,11 @@ private:
 
     bool TakeFree() {
         unsigned int expected = 0;
+        if (System::IsAlone()) {
+            if (mnState.load(std::memory_order_relaxed) != 0) return false;
+            mnState.store(1, std::memory_order_relaxed);
+            return true;
+        }
         return mnState.compare_exchange_strong(expected, 1, std::memory_order_acquire,
                                                std::memory_order_relaxed);
     }

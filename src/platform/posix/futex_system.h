@@ -3,6 +3,8 @@
 #ifndef ZANBASE_PLATFORM_POSIX_FUTEX_SYSTEM_H
 #define ZANBASE_PLATFORM_POSIX_FUTEX_SYSTEM_H
 
+#include <sys/single_threaded.h>
+
 #include "platform/posix/futex.h"
 #include "platform/posix/restartable.h"
 
@@ -13,6 +15,9 @@ struct FutexSystem {
     using WakeDebt = ::WakeDebt;
     using SignalDebt = ::SignalDebt;
     static constexpr int kEverySleeper = ::kEverySleeper;
+
+    // Whether the process has never had a second thread, or the system knows that it has none now.
+    static bool IsAlone() noexcept { return __libc_single_threaded != 0; }
 
     static bool SleepWhile(Word& word, unsigned int expected, Deadline deadline) noexcept {
         return ::SleepWhile(word, expected, deadline);
