@@ -94,6 +94,7 @@ struct System {
     }
 
     static bool IsAlone() { return false; }
+    static void StoreAlone(Word&, unsigned int) {}
 
     static bool SleepWhile(Word&, unsigned int expected, Deadline deadline) {
         const std::size_t sleeps = kSleeps + running->self;

@@ -60,7 +60,7 @@ public:
         }
         mnOwner.store(0, std::memory_order_relaxed);
         if (System::IsAlone()) {
-            mnState.store(0, std::memory_order_relaxed);
+            System::StoreAlone(mnState, 0);
         } else if (!System::StoreIfStill(mnState, 1, 0)) {
             GiveSlowly();
         }
@@ -77,7 +77,7 @@ private:
         unsigned int expected = 0;
         if (System::IsAlone()) {
             if (mnState.load(std::memory_order_relaxed) != 0) return false;
-            mnState.store(1, std::memory_order_relaxed);
+            System::StoreAlone(mnState, 1);
             return true;
         }
         return mnState.compare_exchange_strong(expected, 1, std::memory_order_acquire,

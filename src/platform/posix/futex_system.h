@@ -18,6 +18,9 @@ struct FutexSystem {
 
     // Whether the process has never had a second thread, or the system knows that it has none now.
     static bool IsAlone() noexcept { return __libc_single_threaded != 0; }
+    static void StoreAlone(Word& word, unsigned int value) noexcept {
+        word.store(value, std::memory_order_relaxed);
+    }
 
     static bool SleepWhile(Word& word, unsigned int expected, Deadline deadline) noexcept {
         return ::SleepWhile(word, expected, deadline);
