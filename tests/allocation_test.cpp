@@ -4,7 +4,6 @@
 #include <gtest/gtest.h>
 
 #include <csignal>
-#include <cstdlib>
 #include <cstring>
 #include <new>
 
@@ -17,22 +16,18 @@ int failures = 0, attempts = 0, handled = 0;
 bool throws = false;
 
 bool Fails() {
-    ++attempts;
-    if (failures == 0) return false;
-    --failures;
-    if (throws) throw std::bad_alloc();
-    return true;
-}
-
-void FailNext(int times, bool by_exception = false) {
-    handled = attempts = 0;
-    failures = times;
-    throws = by_exception;
+    if (++attempts > failures) return false;
+    return throws ? throw std::bad_alloc() : true;
 }
 
 void Count() { ++handled; }
-void Throw() { throw std::bad_alloc(); }
 void CountAndLeave() { ++handled, HOutOfMemoryHandler(nullptr); }
+void Throw() { throw std::bad_alloc(); }
+
+void FailNext(int times, bool by_exception = false, void (*handler)() = Count) {
+    handled = attempts = 0, failures = times, throws = by_exception;
+    HOutOfMemoryHandler(handler);
+}
 
 }  // namespace
 
@@ -41,86 +36,58 @@ void* __real_malloc(std::size_t size);
 void* __real_calloc(std::size_t count, std::size_t size);
 void* __real_realloc(void* ptr, std::size_t size);
 void* __wrap_malloc(std::size_t size) { return Fails() ? nullptr : __real_malloc(size); }
-void* __wrap_calloc(std::size_t count, std::size_t size) {
-    return Fails() ? nullptr : __real_calloc(count, size);
-}
+void* __wrap_calloc(std::size_t n, std::size_t size) { return Fails() ? nullptr : __real_calloc(n, size); }
 void* __wrap_realloc(void* ptr, std::size_t size) { return Fails() ? nullptr : __real_realloc(ptr, size); }
 }
 
 namespace {
 
-const struct {
-    const char* name;
-    void* (*allocate)();
-    bool passes_bad_alloc;  // one out of the attempt itself
-} kAllocators[] = {{"HMalloc", [] { return HMalloc(0); }, false},
-                   {"HCalloc", [] { return HCalloc(4, 10); }, false},
-                   {"HRealloc", [] { return HRealloc(nullptr, 40); }, false},
-                   {"HString", [] { return static_cast<void*>(HString("text")); }, true},
-                   {"HString(null)", [] { return static_cast<void*>(HString(nullptr)); }, true}};
+// "attempts/calls of the handler", and whether a block came of them.
+std::string Outcome(void* (*allocate)(), int times, bool by_exception, void (*handler)()) {
+    FailNext(times, by_exception, handler);
+    std::string end = " block";
+    try {
+        std::free(allocate());
+    } catch (const std::bad_alloc&) {
+        end = " none";
+    }
+    return std::to_string(attempts) + "/" + std::to_string(handled) + end;
+}
 
 TEST(Allocators, CallTheHandlerOnceForEachFailedAttempt) {
-    for (const auto& [name, allocate, passes_bad_alloc] : kAllocators) {
-        SCOPED_TRACE(name);
-        for (void (*const handler)() :
-             {Count, CountAndLeave}) {  // who leaves is called once, and patience follows
-            HOutOfMemoryHandler(handler);
-            FailNext(3);
-            std::free(allocate());
-            EXPECT_EQ(attempts, 4);
-            EXPECT_EQ(handled, handler == Count ? 3 : 1);
-        }
-        HOutOfMemoryHandler(Count);
-        FailNext(1, true);
-        if (passes_bad_alloc) {
-            EXPECT_THROW(allocate(), std::bad_alloc);
-        } else {
-            std::free(allocate());
-        }
-        EXPECT_EQ(handled, passes_bad_alloc ? 0 : 1);
-        HOutOfMemoryHandler(Throw);
-        FailNext(1);
-        EXPECT_THROW(allocate(), std::bad_alloc);
-        EXPECT_EQ(attempts, 1);
+    void* (*const allocators[])() = {[] { return HMalloc(0); }, [] { return HCalloc(4, 10); },
+                                     [] { return HRealloc(nullptr, 40); },
+                                     [] { return static_cast<void*>(HString("text")); },
+                                     [] { return static_cast<void*>(HString(nullptr)); }};
+    for (const auto& each : allocators) {
+        SCOPED_TRACE(&each - allocators);
+        const bool copies = &each - allocators > 2;  // which lets an exception of the attempt itself pass
+        EXPECT_EQ(Outcome(each, 3, false, Count), "4/3 block");
+        EXPECT_EQ(Outcome(each, 3, false, CountAndLeave), "4/1 block");  // patience follows
+        EXPECT_EQ(Outcome(each, 1, true, Count), copies ? "1/0 none" : "2/1 block");
+        EXPECT_EQ(Outcome(each, 1, false, Throw), "1/0 none");
     }
 }
 
 TEST(Allocators, StopTheProcessWhenNobodyHandlesALastingShortage) {
-    const ChildResult child = RunInChild([] {
-        HOutOfMemoryHandler(nullptr);
-        FailNext(1000000);
-        return HMalloc(8) == nullptr ? 1 : 2;
-    });
+    const ChildResult child =
+        RunInChild([] { return FailNext(9999, false, nullptr), HMalloc(8) == nullptr; });
     EXPECT_EQ(child.signal, SIGABRT);
     EXPECT_EQ(child.err, "zanbase: memory exhausted and no handler installed\n");
 }
 
-TEST(HRealloc, KeepsTheOldBlockUntilAnAttemptSucceedsAndAsksOnceForNothing) {
-    HOutOfMemoryHandler(Count);
-    FailNext(0);
-    char* block = static_cast<char*>(HMalloc(4));
-    std::memcpy(block, "abc", 4);
+TEST(Allocators, GiveTheBlocksTheyPromise) {
     FailNext(2);
-    block = static_cast<char*>(HRealloc(block, 4000));
-    EXPECT_STREQ(block, "abc");
-    for (const bool by_exception : {false, true}) {
-        FailNext(2, by_exception);
-        EXPECT_EQ(HRealloc(block, 0), nullptr);
-        EXPECT_EQ(attempts, 1);
-        EXPECT_EQ(handled, 0);
-    }
-    FailNext(0);
-    std::free(block);
-}
-
-TEST(HString, HasABlockOfItsOwn) {
-    char source[] = "text";
-    char* const copy = HString(source);
-    source[0] = 'T';
+    char text[] = "text";
+    char* const copy = static_cast<char*>(HRealloc(HString(text), 4000));
+    text[0] = 'T';
     EXPECT_STREQ(copy, "text");
+    FailNext(1, true);
+    EXPECT_EQ(HRealloc(copy, 0), nullptr);
+    EXPECT_EQ(attempts * 10 + handled, 10);  // to free is tried once
     std::free(copy);
     char* const empty = HString(nullptr);
-    EXPECT_EQ(empty[0], '\0');
+    EXPECT_STREQ(empty, "");
     std::memset(empty, 'x', 16);  // sixteen bytes are there; the address sanitizer looks on
     std::free(empty);
 }
