@@ -6,45 +6,30 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <cstdio>
 #include <cstdlib>
 #include <functional>
-#include <string>
+
+#include "support/written_text.h"
 
 struct ChildResult {
-    int exit_code = -1;  // -1: ended by a signal
-    int signal = 0;      // 0: ended by itself
-    std::string out;     // what went to standard output
-    std::string err;     // what went to standard error
+    int exit_code, signal;  // -1 and the signal, if one ended it; else the code and 0
+    std::string out, err;   // what went to the standard streams
 };
 
 // Runs `body` in a fork of this process and ends it with `exit`, so that exit handlers and static destructors
 // run; the exit code is what `body` returns. To be called before this process has started a thread.
 inline ChildResult RunInChild(const std::function<int()>& body) {
-    std::FILE* const out = std::tmpfile();
-    std::FILE* const err = std::tmpfile();
+    std::FILE* const files[] = {std::tmpfile(), std::tmpfile()};
     std::fflush(nullptr);
     const pid_t child = fork();
     if (child == 0) {
-        dup2(fileno(out), STDOUT_FILENO);
-        dup2(fileno(err), STDERR_FILENO);
+        for (int i = 0; i < 2; ++i) dup2(fileno(files[i]), STDOUT_FILENO + i);
         std::exit(body());
     }
     int status = 0;
     waitpid(child, &status, 0);
-    ChildResult result;
-    if (WIFEXITED(status)) result.exit_code = WEXITSTATUS(status);
-    if (WIFSIGNALED(status)) result.signal = WTERMSIG(status);
-    const auto text_of = [](std::FILE* file) {
-        std::string text;
-        std::rewind(file);
-        for (int c = std::fgetc(file); c != EOF; c = std::fgetc(file)) text += static_cast<char>(c);
-        std::fclose(file);
-        return text;
-    };
-    result.out = text_of(out);
-    result.err = text_of(err);
-    return result;
+    return {WIFEXITED(status) ? WEXITSTATUS(status) : -1, WIFSIGNALED(status) ? WTERMSIG(status) : 0,
+            TakeText(files[0]), TakeText(files[1])};
 }
 
 #endif

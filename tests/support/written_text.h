@@ -3,20 +3,22 @@
 #define ZANBASE_TESTS_WRITTEN_TEXT_H
 
 #include <cstdio>
-#include <cstdlib>
 #include <string>
 
-// Calls `report` with a stream that writes into memory and returns all it wrote.
+// All that was written to `file`, which is closed.
+inline std::string TakeText(std::FILE* file) {
+    std::string text;
+    std::rewind(file);
+    for (int c = std::fgetc(file); c != EOF; c = std::fgetc(file)) text += static_cast<char>(c);
+    std::fclose(file);
+    return text;
+}
+
 template <class Report>
 std::string WrittenBy(Report report) {
-    char* text = nullptr;
-    std::size_t size = 0;
-    std::FILE* const stream = open_memstream(&text, &size);
-    report(stream);
-    std::fclose(stream);
-    const std::string result(text, size);
-    std::free(text);
-    return result;
+    std::FILE* const file = std::tmpfile();
+    report(file);
+    return TakeText(file);
 }
 
 #endif
