@@ -77,10 +77,12 @@ TEST(Allocators, StopTheProcessWhenNobodyHandlesALastingShortage) {
 }
 
 TEST(Allocators, GiveTheBlocksTheyPromise) {
-    FailNext(2);
+    FailNext(0);
     char text[] = "text";
-    char* const copy = static_cast<char*>(HRealloc(HString(text), 4000));
+    char* copy = HString(text);
     text[0] = 'T';
+    FailNext(2);
+    copy = static_cast<char*>(HRealloc(copy, 4000));
     EXPECT_STREQ(copy, "text");
     FailNext(1, true);
     EXPECT_EQ(HRealloc(copy, 0), nullptr);
@@ -88,7 +90,7 @@ TEST(Allocators, GiveTheBlocksTheyPromise) {
     std::free(copy);
     char* const empty = HString(nullptr);
     EXPECT_STREQ(empty, "");
-    std::memset(empty, 'x', 16);  // sixteen bytes are there; the address sanitizer looks on
+    EXPECT_STREQ(std::strcpy(empty, "fifteen letters"), "fifteen letters");  // the address sanitizer looks on
     std::free(empty);
 }
 
