@@ -47,18 +47,15 @@ public:
 
     /// Ends the worker and waits for that, testing once a millisecond by `USleep`; the pass it is in, if any,
     /// comes to its end first, and no other follows. An object that was never started goes at once.
-    ///
-    /// The subclass is gone by now, so a worker that is still in a pass uses what no longer exists. Destroy
-    /// an object only while its worker hibernates or was never started. A subclass can see to that itself, by
-    /// waiting in its own destructor until `IsProcessing` gives false, as in the example.
+    /// The subclass is gone by then: see above for when an object may be destroyed.
     ~HHibernateThread() override;
 
     /// Offers one pass. True if the worker is hibernating: it will make one pass more, and so many as there
     /// are true answers. False if it isn't: nothing has happened. Any thread, at any time.
     bool Signal() const;
 
-    /// False while the worker hibernates, else true, also before `Start`. A snapshot: a true may be out of
-    /// date at once, a false until somebody signals. Any thread, at any time.
+    /// False while the worker hibernates, else true, also before `Start`. A snapshot, which may be out of
+    /// date at once: a false as long as the worker owes a pass or somebody signals. Any thread, at any time.
     [[nodiscard]] bool IsProcessing() const;
 
 protected:

@@ -95,6 +95,7 @@ protected:
 /// so a thread takes it only when it has finished writing. The two may also be given back in the other order.
 class ZANBASE_API HReadPrefMutex : public HReadWriteMutex {
 public:
+    /// A free lock; see `HMutex` and `HSemaphore` for exhausted memory.
     HReadPrefMutex();
     ~HReadPrefMutex() override;
     void ReadLock() const override;
@@ -123,6 +124,7 @@ private:
 /// `HReadPrefMutex` allows that.
 class ZANBASE_API HWritePrefMutex : public HReadWriteMutex {
 public:
+    /// A free lock; see `HMutex` and `HSemaphore` for exhausted memory.
     HWritePrefMutex();
     ~HWritePrefMutex() override;
     void ReadLock() const override;
@@ -136,7 +138,8 @@ private:
     mutable unsigned int mnReaders = 0;  // as in HReadPrefMutex, all of them
     mutable unsigned int mnWriters = 0;
     mutable ReadCounts moReaderThreads;
-    mutable std::atomic<unsigned long long> mnWriterThread{0xFFFFFFFFFFFFFFFF};
+    mutable std::atomic<unsigned long long> mnWriterThread{
+        0xFFFFFFFFFFFFFFFF};  // but under moWriterMutex only
     HMutex moReaderMutex;
     HMutex moWriterMutex;
     HSemaphore moGate;

@@ -24,7 +24,7 @@ struct NativeSemaphore;
 class ZANBASE_API HSemaphore {
 public:
     /// A semaphore with `count` free units. More than 2147483647, the most it can hold, is a caller's error
-    /// and counts as that.
+    /// and counts as that. Throws `std::bad_alloc` if there is no memory for it.
     HSemaphore(unsigned int count = 1);
     ~HSemaphore();
 

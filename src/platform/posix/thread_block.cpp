@@ -109,6 +109,7 @@ bool LeftAtEnd(NativeThread* block, unsigned int& news) noexcept {
 // The child of a fork has one thread. All others are gone without a trace, so what leads to them is cleared.
 void StartOverInChild() noexcept {
     toSelf.mnNumber = 0;
+    pthread_setspecific(gnExitKey, nullptr);  // in case it forked while Leaving
     gpoFree = gpoUnjoined = nullptr;
     for (NativeThread* block = gpoNewest; block != nullptr; block = block->mpoOlder) {
         block->mnWaiters = 0;
