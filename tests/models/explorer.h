@@ -38,19 +38,24 @@ public:
     std::string Explore(const State& start) {
         std::unordered_set<Value> seen;
         std::vector<State> due{start};
+        const auto meet = [&](const State& state) {
+            if (seen.insert(Digest(state)).second) due.push_back(state);
+        };
         for (mFound = nullptr; mFound == nullptr && !due.empty();) {
             const State state = std::move(due.back());
             due.pop_back();
-            if (!seen.insert(Digest(state)).second) continue;
-            const std::size_t others = due.size();
+            bool at_the_end = true;
             for (std::size_t thread = 0; thread < kThreads; ++thread) {
                 if (IsDone(state, thread) || state.threads[thread].dead) continue;
                 mChoices = 1;
-                for (mChoice = 0; mChoice < mChoices && Run(state, thread); ++mChoice) due.push_back(now);
+                for (mChoice = 0; mChoice < mChoices && Run(state, thread); ++mChoice) {
+                    at_the_end = false;
+                    meet(now);
+                }
                 State killed = state;
-                if (kill && kill(killed, thread)) due.push_back(killed);
+                if (kill && kill(killed, thread)) meet(killed);
             }
-            if (mFound == nullptr) mFound = check(state, due.size() == others);
+            if (mFound == nullptr) mFound = check(state, at_the_end);
         }
         return mFound != nullptr ? mFound : "";
     }
@@ -124,12 +129,12 @@ private:
     const char* mFound = nullptr;
 };
 
-// The explorer at work, and steps on one of its words.
-inline Explorer* running = nullptr;
+// The only one, and steps on one of its words.
+inline Explorer explorer;
 
 template <class Rule>
 Value Change(std::size_t place, Rule rule) {  // the result is the old value
-    return running->Step([&](State& state) {
+    return explorer.Step([&](State& state) {
         const Value old = state.words[place];
         state.words[place] = rule(old);
         return old;

@@ -13,22 +13,12 @@
 
 namespace {
 
-// The word of what is tested is at place 0. Then: a lock beside a condition, whether the one mishap has been, how
-// many own the lock, and items to wait for. Then for each thread the word that it sleeps on, its debts (a
-// word, a condition, what it saw there) and the word that it is about to store to, all plus 1.
-enum Place : std::size_t {
-    kWord,
-    kLock,
-    kMishap,
-    kOwners,
-    kItems,
-    kSleeps,
-    kDebt = kSleeps + kThreads,
-    kSignalDebt = kDebt + kThreads,
-    kSeen = kSignalDebt + kThreads,
-    kStores = kSeen + kThreads,
-    kTaker = kStores + kThreads
-};
+// The word of what is tested; a lock beside a condition; whether the one mishap has been; how many own the
+// lock; items to wait for; who changed a word last from 0. Then for each thread the word that it sleeps on, its
+// debts (a word, a condition, what it saw there) and the word that it is about to store to, all plus 1.
+constexpr std::size_t kWord = 0, kLock = 1, kMishap = 2, kOwners = 3, kItems = 4, kTaker = 5, kSleeps = 6,
+                      kDebt = kSleeps + kThreads, kSignalDebt = kDebt + kThreads,
+                      kSeen = kSignalDebt + kThreads, kStores = kSeen + kThreads;
 enum class Fault { kNone, kUnbrokenStores, kForgottenDebts, kForgottenSignalDebts };
 
 Fault fault = Fault::kNone;
@@ -36,7 +26,7 @@ constexpr int kSoon = 0;  // a deadline, which may pass at any time
 
 // Notes who has last changed a word from 0.
 Value Becomes(Value old, Value value) {
-    if (old == 0 && value != 0) running->now.words[kTaker] = running->self;
+    if (old == 0 && value != 0) explorer.now.words[kTaker] = explorer.self;
     return value;
 }
 
@@ -67,16 +57,16 @@ struct Owner {  // says something to its own thread only, and no thread here tak
     void store(unsigned long long, std::memory_order) const {}
 };
 
-template <Place kPlace, Fault kForgotten>
+template <std::size_t kPlace, Fault kForgotten>
 struct Debt {
     explicit Debt(const Word&, unsigned int seen = 0) {
-        running->Step([&](State& state) {
-            state.words[kSeen + running->self] = seen;
-            return state.words[kPlace + running->self] = fault == kForgotten ? 0 : kWord + 1;
+        explorer.Step([&](State& state) {
+            state.words[kSeen + explorer.self] = seen;
+            return state.words[kPlace + explorer.self] = fault == kForgotten ? 0 : kWord + 1;
         });
     }
     ~Debt() noexcept(false) {  // a step that ends the run leaves scopes too, which is none of the algorithm's
-        if (std::uncaught_exceptions() == 0) Set(kPlace + running->self, 0);
+        if (std::uncaught_exceptions() == 0) Set(kPlace + explorer.self, 0);
     }
 };
 
@@ -97,8 +87,8 @@ struct System {
     static void StoreAlone(Word&, unsigned int) {}
 
     static bool SleepWhile(Word&, unsigned int expected, Deadline deadline) {
-        const std::size_t sleeps = kSleeps + running->self;
-        const Value slept = running->Step([&](State& state) {
+        const std::size_t sleeps = kSleeps + explorer.self;
+        const Value slept = explorer.Step([&](State& state) {
             return state.words[sleeps] = state.words[kWord] == expected ? kWord + 1 : 0;
         });
         if (slept == 0) return true;
@@ -109,30 +99,30 @@ struct System {
     }
 
     static int WakeSleepers(Word&, int most) {  // any sleeper may be the one
-        return static_cast<int>(running->Step([&](State& state) {
+        return static_cast<int>(explorer.Step([&](State& state) {
             std::vector<std::size_t> sleepers;
             for (std::size_t place = kSleeps; place < kSleeps + kThreads; ++place)
                 if (state.words[place] != 0) sleepers.push_back(place);
-            if (most == 1 && !sleepers.empty()) sleepers = {sleepers[running->Choose(sleepers.size())]};
+            if (most == 1 && !sleepers.empty()) sleepers = {sleepers[explorer.Choose(sleepers.size())]};
             for (const std::size_t place : sleepers) state.words[place] = 0;
             return sleepers.size();
         }));
     }
 
     static bool StoreIfStill(Word&, unsigned int expected, unsigned int desired) {
-        if (running->Step([&](State& state) {
-                return state.words[kStores + running->self] = state.words[kWord] == expected ? 1 : 0;
+        if (explorer.Step([&](State& state) {
+                return state.words[kStores + explorer.self] = state.words[kWord] == expected ? 1 : 0;
             }) == 0)
             return false;
-        return running->Step([&](State& state) {
-            if (state.words[kStores + running->self] != 0) state.words[kWord] = desired;
-            return std::exchange(state.words[kStores + running->self], 0);
+        return explorer.Step([&](State& state) {
+            if (state.words[kStores + explorer.self] != 0) state.words[kWord] = desired;
+            return std::exchange(state.words[kStores + explorer.self], 0);
         }) != 0;
     }
 
     static bool BreakStores() {
-        return running->Step([](State& state) {
-            if (state.words[kMishap] == 0 && running->Choose(2) != 0) {
+        return explorer.Step([](State& state) {
+            if (state.words[kMishap] == 0 && explorer.Choose(2) != 0) {
                 state.words[kMishap] = 1;
                 return Value{0};
             }
@@ -161,54 +151,46 @@ bool Kill(State& state, std::size_t thread) {
     return true;
 }
 
-class FutexModel : public testing::Test {
-protected:
-    FutexModel() {
-        running = &mExplorer;
-        mExplorer.kill = Kill;
+// No order of steps goes wrong, but one does with each of the faults. In the end a thread may wait only
+// where `is_free` says that there is nothing to be had, or for a lock at `lock` that a thread held when it
+// was ended.
+void Explore(std::size_t lock, bool (*is_free)(const State&), std::array<std::string, kThreads> scripts,
+             std::initializer_list<Fault> seeded) {
+    explorer.scripts = std::move(scripts);
+    explorer.check = [=](const State& state, bool at_the_end) -> const char* {
+        if (state.words[kOwners] > 1) return "two owners";
+        if (!at_the_end || !is_free(state)) return nullptr;
+        if (state.words[lock] != 0 && state.threads[state.words[kTaker]].dead) return nullptr;
+        for (std::size_t thread = 0; thread < kThreads; ++thread)
+            if (!state.threads[thread].dead && !explorer.IsDone(state, thread)) return "asleep";
+        return nullptr;
+    };
+    fault = Fault::kNone;
+    EXPECT_EQ(explorer.Explore({}), "");
+    for (const Fault each : seeded) {
+        fault = each;
+        EXPECT_EQ(explorer.Explore({}), "asleep");
     }
+}
 
-    // No order of steps goes wrong, but one does with each of the faults. In the end a thread may wait only
-    // where `is_free` says that there is nothing to be had, or for a lock at `lock` that a thread held when it
-    // was ended.
-    void Explore(Place lock, bool (*is_free)(const State&), std::array<std::string, kThreads> scripts,
-                 std::initializer_list<Fault> seeded) {
-        mExplorer.scripts = std::move(scripts);
-        mExplorer.check = [=](const State& state, bool at_the_end) -> const char* {
-            if (state.words[kOwners] > 1) return "two owners";
-            if (!at_the_end || !is_free(state)) return nullptr;
-            if (state.words[lock] != 0 && state.threads[state.words[kTaker]].dead) return nullptr;
-            for (std::size_t thread = 0; thread < kThreads; ++thread)
-                if (!state.threads[thread].dead && !mExplorer.IsDone(state, thread)) return "asleep";
-            return nullptr;
-        };
-        fault = Fault::kNone;
-        EXPECT_EQ(mExplorer.Explore({}), "");
-        for (const Fault each : seeded) {
-            fault = each;
-            EXPECT_EQ(mExplorer.Explore({}), "asleep");
-        }
-    }
-
-    Explorer mExplorer;
-};
-
-TEST_F(FutexModel, LockIsWhole) {
-    mExplorer.call = [](char call) {
+TEST(FutexModel, LockIsWhole) {
+    explorer.kill = Kill;
+    explorer.call = [](char call) {
         FutexLock<System> lock;
         if (call == 'R') {
             Add(kOwners, -1);
             return lock.Give();
         }
         lock.Take(1);
-        ++running->now.words[kOwners];
+        ++explorer.now.words[kOwners];
     };
     const auto always = [](const State&) { return true; };
     Explore(kWord, always, {"TRTR", "TR", "TR"}, {Fault::kUnbrokenStores, Fault::kForgottenDebts});
 }
 
-TEST_F(FutexModel, SemaphoreIsWhole) {
-    mExplorer.call = [](char call) {
+TEST(FutexModel, SemaphoreIsWhole) {
+    explorer.kill = Kill;
+    explorer.call = [](char call) {
         FutexSemaphore<System> semaphore(0);
         if (call == 'G') return semaphore.Give();
         semaphore.Take(call == 't' ? &kSoon : nullptr);
@@ -230,9 +212,9 @@ struct SimpleLock {
     void Give() const { Set(kLock, 0); }
 };
 
-TEST_F(FutexModel, ConditionIsWhole) {
+TEST(FutexModel, ConditionIsWhole) {
     // Wait for one and take it, add one, wake one, wake all.
-    mExplorer.call = [](char call) {
+    explorer.call = [](char call) {
         FutexCondition<System> condition;
         if (call == 'o') return condition.WakeOne();
         if (call == 'a') return condition.WakeAll();
@@ -243,7 +225,7 @@ TEST_F(FutexModel, ConditionIsWhole) {
         lock.Give();
     };
     // The third thread wakes the others. Before it has changed the word that it read first it owes nothing.
-    mExplorer.kill = [](State& state, std::size_t thread) {
+    explorer.kill = [](State& state, std::size_t thread) {
         const std::vector<Value>& log = state.threads[2].log;
         const bool wakes = log.size() > 2 && state.words[kWord] != log[0];
         return (thread != 2 || wakes) && Kill(state, thread);

@@ -12,20 +12,9 @@ using Downgrade = ReadWriteSteps::Downgrade;
 
 // The fields; then what the model notes of each thread: what it holds, and whether as a writer it has let
 // readers in.
-enum Place : std::size_t {
-    kReaders,
-    kWriters,
-    kWriter,
-    kReaderMutex,
-    kWriterMutex,
-    kResource,
-    kGate,
-    kEntries,
-    kCounts = kEntries + kThreads,
-    kReads = kCounts + kThreads,
-    kWrites = kReads + kThreads,
-    kOpened = kWrites + kThreads
-};
+constexpr std::size_t kReaders = 0, kWriters = 1, kWriter = 2, kReaderMutex = 3, kWriterMutex = 4,
+                      kResource = 5, kGate = 6, kEntries = 7, kCounts = kEntries + kThreads,
+                      kReads = kCounts + kThreads, kWrites = kReads + kThreads, kOpened = kWrites + kThreads;
 enum class Fault { kNone, kWriterLooksOutside, kReaderLooksAtDepth };
 
 Fault fault = Fault::kNone;
@@ -40,7 +29,7 @@ struct Mutex {
         if (IsForgotten()) return;
         Change(place, [](Value owner) {
             if (owner != 0) Explorer::Block();
-            return running->self + 1;
+            return explorer.self + 1;
         });
     }
     void Unlock() const {
@@ -52,7 +41,7 @@ struct Semaphore {
     std::size_t place;
     void Lock() const {
         Change(place, [this](Value units) {
-            if (place == kGate && running->now.words[kReaderMutex] == running->self + 1)
+            if (place == kGate && explorer.now.words[kReaderMutex] == explorer.self + 1)
                 Explorer::Fail("at the gate with the reader mutex");
             if (units == 0) Explorer::Block();
             return units - 1;
@@ -103,38 +92,22 @@ struct Lock {
     Semaphore moResource{kResource}, moGate{kGate};
 };
 
-struct Kind {
-    void (*read_lock)(Lock&, Value);
-    void (*read_unlock)(Lock&, Value);
-    void (*write_unlock)(Lock&, Value);
-    std::vector<std::string> scripts;  // what one thread may do
-};
-const Kind kReadPref{ReadWriteSteps::ReadLockAtOnce<Lock>,
-                     ReadWriteSteps::ReadUnlock<Downgrade::kAllowed, Lock>,
-                     ReadWriteSteps::WriteUnlock<Downgrade::kAllowed, Lock>,
-                     {"rR", "rrRR", "wW", "wwWW", "wrWR", "wrRW"}};
-const Kind kWritePref{ReadWriteSteps::ReadLockInTurn<Lock>,
-                      ReadWriteSteps::ReadUnlock<Downgrade::kBarred, Lock>,
-                      ReadWriteSteps::WriteUnlock<Downgrade::kBarred, Lock>,
-                      {"rR", "rrRR", "wW", "wwWW", "rRwW"}};
-
 // A lock counts as held from the return of its call to the start of its unlock. A writer lets readers in from
 // the start of its own read lock.
-void Make(const Kind& kind, char letter) {
+template <Downgrade kDowngrade>
+void Make(char letter) {
+    constexpr auto kReadLock = kDowngrade == Downgrade::kAllowed ? ReadWriteSteps::ReadLockAtOnce<Lock>
+                                                                 : ReadWriteSteps::ReadLockInTurn<Lock>;
     Lock lock;
-    const std::size_t self = running->self;
+    const std::size_t self = explorer.self;
     call = letter;
-    if (letter == 'r') {
-        if (Get(kWrites + self) != 0) Set(kOpened + self, 1);
-        kind.read_lock(lock, self);
-        ++running->now.words[kReads + self];
-    } else if (letter == 'w') {
-        ReadWriteSteps::WriteLock(lock, self);
-        ++running->now.words[kWrites + self];
-    } else {
-        Add((letter == 'R' ? kReads : kWrites) + self, -1);
-        (letter == 'R' ? kind.read_unlock : kind.write_unlock)(lock, self);
-    }
+    if (letter == 'R' || letter == 'W') Add((letter == 'R' ? kReads : kWrites) + self, -1);
+    if (letter == 'r' && Get(kWrites + self) != 0) Set(kOpened + self, 1);
+    if (letter == 'r') kReadLock(lock, self);
+    if (letter == 'w') ReadWriteSteps::WriteLock(lock, self);
+    if (letter == 'R') ReadWriteSteps::ReadUnlock<kDowngrade>(lock, self);
+    if (letter == 'W') ReadWriteSteps::WriteUnlock<kDowngrade>(lock, self);
+    if (letter == 'r' || letter == 'w') ++explorer.now.words[(letter == 'r' ? kReads : kWrites) + self];
 }
 
 State Free() {
@@ -146,7 +119,7 @@ State Free() {
 
 const char* Wrong(const State& state, bool at_the_end) {
     for (std::size_t writer = 0; writer < kThreads; ++writer) {
-        if (at_the_end && !running->IsDone(state, writer)) return "a deadlock";
+        if (at_the_end && !explorer.IsDone(state, writer)) return "a deadlock";
         for (std::size_t other = 0; other < kThreads; ++other) {
             if (writer == other || state.words[kWrites + writer] == 0) continue;
             if (state.words[kWrites + other] != 0) return "two writers";
@@ -159,18 +132,16 @@ const char* Wrong(const State& state, bool at_the_end) {
     return at_the_end && state.words != free.words ? "not free in the end" : nullptr;
 }
 
-// What is wrong with `kind` in some order of the steps of some three scripts.
-std::string Explore(const Kind& kind, Fault seeded) {
+// What is wrong in some order of the steps of some three of the scripts.
+std::string Explore(void (*make)(char), const std::vector<std::string>& scripts, Fault seeded) {
     fault = seeded;
-    for (const std::string& a : kind.scripts) {
-        for (const std::string& b : kind.scripts) {
-            for (const std::string& c : kind.scripts) {
+    explorer.call = make;
+    explorer.check = Wrong;
+    for (const std::string& a : scripts) {
+        for (const std::string& b : scripts) {
+            for (const std::string& c : scripts) {
                 if (a > b || b > c) continue;  // the threads are alike
-                Explorer explorer;
-                running = &explorer;
-                explorer.check = Wrong;
                 explorer.scripts = {a, b, c};
-                explorer.call = [&](char letter) { Make(kind, letter); };
                 const std::string found = explorer.Explore(Free());
                 if (!found.empty()) return found + ": " + a + " " + b + " " + c;
             }
@@ -179,14 +150,13 @@ std::string Explore(const Kind& kind, Fault seeded) {
     return "";
 }
 
-TEST(ReadWriteModel, IsWholeInEveryOrderOfSteps) {
-    EXPECT_EQ(Explore(kReadPref, Fault::kNone), "");
-    EXPECT_EQ(Explore(kWritePref, Fault::kNone), "");
-}
-
-TEST(ReadWriteModel, FindsSeededFaults) {
-    EXPECT_EQ(Explore(kReadPref, Fault::kWriterLooksOutside), "given back twice: rR rR wrRW");
-    EXPECT_EQ(Explore(kReadPref, Fault::kReaderLooksAtDepth), "a deadlock: rR rR wW");
+TEST(ReadWriteModel, IsWholeInEveryOrderOfStepsAndFindsFaults) {
+    constexpr auto kReadPref = Make<Downgrade::kAllowed>, kWritePref = Make<Downgrade::kBarred>;
+    const std::vector<std::string> scripts{"rR", "rrRR", "wW", "wwWW", "wrWR", "wrRW"};
+    EXPECT_EQ(Explore(kReadPref, scripts, Fault::kNone), "");
+    EXPECT_EQ(Explore(kWritePref, {"rR", "rrRR", "wW", "wwWW", "rRwW"}, Fault::kNone), "");
+    EXPECT_EQ(Explore(kReadPref, scripts, Fault::kWriterLooksOutside), "given back twice: rR rR wrRW");
+    EXPECT_EQ(Explore(kReadPref, scripts, Fault::kReaderLooksAtDepth), "a deadlock: rR rR wW");
 }
 
 }  // namespace
