@@ -84,7 +84,7 @@ public:
     ///   - A thread inside the C library may hold a lock there, that of `malloc` or of a stream, which would
     ///     stop every other thread. So it is let out first, which takes microseconds as a rule; one that is
     ///     never found outside for ten seconds, as it fills memory without pause, is ended all the same. A
-    ///     wait inside the library counts as outside after two milliseconds. So a lock of the library can
+    ///     wait inside the library counts as outside after ten milliseconds. So a lock of the library can
     ///     stay held if the thread waits for room in a pipe that it writes to by `printf`, or runs in a
     ///     callback that the library makes under a lock, such as that of `dl_iterate_phdr`.
     ///   - Other threads that wait for a `std::condition_variable` together with it may miss their wake-ups

@@ -98,11 +98,9 @@ bool AskToDie(NativeThread* block) noexcept {
 
 void ChooseEndSignal() noexcept {
     if (gnEndSignal.load(std::memory_order_relaxed) != 0) return;
+    FindLibraryCode();
     const BlockLock lock;
-    if (gnEndSignal == 0) {
-        FindLibraryCode();
-        EndSignal();
-    }
+    EndSignal();
 }
 
 void AdmitEndSignal() noexcept {

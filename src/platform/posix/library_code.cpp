@@ -1,17 +1,15 @@
-// A thread may hold a lock of the C library while it executes the library's code. It can stay there for long
-// in a system call only; so of those places these are taken for safe:
+// A thread may hold a lock of the C library while it executes the library's code, or code that the kernel
+// lends to it. It can stay there for long in a system call only; of those places these are taken for safe:
 //
-//   in sched_yield                       nothing in the library calls that with a lock held, and a thread may
-//                                        do nothing else
-//   in a wait of ours                    it came through the library's bare system call
-//   behind a system call cut short by    the library doesn't make such calls under its own locks, and must
-//   the signal                           go on as if the wait were over
-//   at the same system call, with the    it waits there: for input, for a mutex of the program. The library's
-//   same stack, for the second time      own locks are held for less than the pause between two tries
+// - In sched_yield: the library doesn't call that under a lock, and a thread may do nothing else.
+// - In a wait of ours: it came through the library's bare system call.
+// - Behind a system call that the signal has cut short: the library makes no such call under its own locks,
+//   and the thread must not go on as if the wait were over.
+// - At the same system call with the same stack for a while: it waits for input, or for a mutex of the
+//   program. The library's own locks are free again sooner, unless the machine is very busy.
 //
-// What remains: a thread that waits for output to a stream (to a full pipe, say) dies with the stream locked,
-// and so does one that executes the program's code under a lock of the library, as a callback of
-// dl_iterate_phdr.
+// What remains: a thread that waits for room in a stream (a full pipe, say) dies with the stream locked, and
+// so does one that executes the program's code under a lock of the library, as a callback of dl_iterate_phdr.
 #include "platform/posix/library_code.h"
 
 #include <algorithm>
@@ -35,14 +33,19 @@ struct CodeRange {
     std::uintptr_t end;
 };
 
-CodeRange gaLibraryCode[3];  // C library, loader, and the allocator if it came from elsewhere; else empty
+struct LibraryCode {
+    CodeRange ranges[4];  // those not found stay empty
+    std::size_t count;
+};
+
+LibraryCode goLibraryCode{};  // complete before the first thread is made
 
 // A thread that is never found outside the library, as one that fills memory in a loop, is given up after
 // this time, and with it what it holds.
 constexpr unsigned int kPatienceMs = 10000;
 
 // What stands at one system call for so long waits there.
-constexpr unsigned int kWaitMs = 2;
+constexpr unsigned int kWaitMs = 10;
 
 bool Contains(const dl_phdr_info* module, std::uintptr_t address) noexcept {
     return std::any_of(module->dlpi_phdr, module->dlpi_phdr + module->dlpi_phnum, [=](const auto& segment) {
@@ -51,28 +54,29 @@ bool Contains(const dl_phdr_info* module, std::uintptr_t address) noexcept {
     });
 }
 
-// Notes the code of a module in which one of the marks lies. The program itself, the module without a name,
-// is left out, also if it brings an allocator: its own code isn't library code.
-int NoteLibraryCode(dl_phdr_info* module, std::size_t, void* next) {
-    const std::uintptr_t marks[] = {reinterpret_cast<std::uintptr_t>(&gnu_get_libc_version),
-                                    static_cast<std::uintptr_t>(getauxval(AT_BASE)),
-                                    reinterpret_cast<std::uintptr_t>(dlsym(RTLD_DEFAULT, "malloc"))};
-    if (module->dlpi_name[0] == '\0' ||
-        !std::any_of(std::begin(marks), std::end(marks), [=](auto mark) { return Contains(module, mark); }))
-        return 0;
-    auto*& range = *static_cast<CodeRange**>(next);
-    for (int i = 0; i < module->dlpi_phnum && range != std::end(gaLibraryCode); ++i) {
+struct Search {
+    std::uintptr_t marks[4];  // addresses within the modules wanted
+    LibraryCode found;
+};
+
+// Notes the code of a module in which a mark lies. The program itself, the module without a name, is left
+// out, also if it brings an allocator: its own code isn't library code.
+int NoteLibraryCode(dl_phdr_info* module, std::size_t, void* argument) {
+    auto& [marks, found] = *static_cast<Search*>(argument);
+    const auto lies_here = [=](std::uintptr_t mark) { return Contains(module, mark); };
+    if (module->dlpi_name[0] == '\0' || std::none_of(std::begin(marks), std::end(marks), lies_here)) return 0;
+    for (int i = 0; i < module->dlpi_phnum; ++i) {
         const auto& segment = module->dlpi_phdr[i];
         if (segment.p_type != PT_LOAD || (segment.p_flags & PF_X) == 0) continue;
-        range->begin = module->dlpi_addr + segment.p_vaddr;
-        range->end = range->begin + segment.p_memsz;
-        ++range;
+        if (found.count == std::size(found.ranges)) break;
+        const std::uintptr_t begin = module->dlpi_addr + segment.p_vaddr;
+        found.ranges[found.count++] = {begin, begin + segment.p_memsz};
     }
     return 0;
 }
 
 bool InLibraryCode(std::uintptr_t code) noexcept {
-    return std::any_of(std::begin(gaLibraryCode), std::end(gaLibraryCode),
+    return std::any_of(std::begin(goLibraryCode.ranges), std::end(goLibraryCode.ranges),
                        [=](const CodeRange& range) { return range.begin <= code && code < range.end; });
 }
 
@@ -109,9 +113,18 @@ bool IsCutShort(const ucontext_t&) noexcept { return false; }
 
 }  // namespace
 
+// The search takes locks of the loader, so it isn't made under the block lock: whoever holds those may want
+// that.
 void FindLibraryCode() noexcept {
-    CodeRange* next = gaLibraryCode;
-    if (kKnowsPlaces) dl_iterate_phdr(NoteLibraryCode, &next);
+    Search search{
+        {reinterpret_cast<std::uintptr_t>(&gnu_get_libc_version),
+         getauxval(AT_BASE),          // the loader
+         getauxval(AT_SYSINFO_EHDR),  // what the kernel lends to the library
+         reinterpret_cast<std::uintptr_t>(dlsym(RTLD_DEFAULT, "malloc"))},  // may come from elsewhere
+        {}};
+    if (kKnowsPlaces) dl_iterate_phdr(NoteLibraryCode, &search);
+    const BlockLock lock;
+    if (goLibraryCode.count == 0) goLibraryCode = search.found;
 }
 
 bool MayHoldLibraryLock(NativeThread* block, const void* context) noexcept {

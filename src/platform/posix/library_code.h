@@ -4,8 +4,8 @@
 
 struct NativeThread;
 
-// Finds where the code of the C library, the loader and the allocator lies; to be called once, before the
-// other.
+// Finds where the code of the C library, the loader and the allocator lies; to be called before the first
+// thread is made, not under the block lock.
 void FindLibraryCode() noexcept;
 
 // Called by a signal handler on the thread of `block` with the handler's third argument: true if the thread
