@@ -16,9 +16,11 @@ HHibernateThread::~HHibernateThread() {
 }
 
 bool HHibernateThread::Signal() const {
-    const HMutexLock lock(&moStateMutex);
-    if (mbHibernating) moWakeUp.Unlock();
-    return mbHibernating;
+    HMutexLock lock(&moStateMutex);
+    const bool accepted = mbHibernating;
+    lock.Release();  // first, or the worker wakes up only to wait for it
+    if (accepted) moWakeUp.Unlock();
+    return accepted;
 }
 
 bool HHibernateThread::IsProcessing() const { return !mbHibernating; }

@@ -1,0 +1,82 @@
+// From a signal to the pass that it makes and back, beside a worker of the same manner that stands on a
+// condition variable.
+#include "zanbase/hibernate_thread.h"
+
+#include <benchmark/benchmark.h>
+
+#include <condition_variable>
+#include <mutex>
+#include <thread>
+
+#include "ratios.h"
+
+namespace {
+
+// Both answer a pass by a unit of this.
+const HSemaphore answers(0);
+
+class Hibernating : public HHibernateThread {
+public:
+    Hibernating() { Start(true); }
+    ~Hibernating() override {
+        while (IsProcessing()) std::this_thread::yield();
+    }
+
+private:
+    void Process() override { answers.Unlock(); }
+};
+
+class OnCondition {
+public:
+    OnCondition() : mThread([this] { Run(); }) {}
+    ~OnCondition() {
+        mEnds = true;
+        while (!Signal()) std::this_thread::yield();
+        mThread.join();
+    }
+
+    bool Signal() {
+        {
+            const std::lock_guard<std::mutex> lock(mMutex);
+            if (!mSleeps) return false;
+            ++mUnits;
+        }
+        mWakeUp.notify_one();
+        return true;
+    }
+
+private:
+    void Run() {
+        while (!mEnds) {
+            answers.Unlock();
+            std::unique_lock<std::mutex> lock(mMutex);
+            mSleeps = true;
+            mWakeUp.wait(lock, [this] { return mUnits > 0; });
+            --mUnits;
+            mSleeps = false;
+        }
+    }
+
+    std::mutex mMutex;
+    std::condition_variable mWakeUp;
+    int mUnits = 1;        // guarded by mMutex
+    bool mSleeps = false;  // guarded by mMutex
+    std::atomic<bool> mEnds{false};
+    std::thread mThread;
+};
+
+template <class Worker>
+void SignalToPass(benchmark::State& state) {
+    Worker worker;
+    for (int unasked = 0; unasked < 2; ++unasked) answers.Lock();
+    for (auto _ : state) {
+        while (!worker.Signal()) std::this_thread::yield();
+        answers.Lock();
+    }
+}
+BENCHMARK_TEMPLATE(SignalToPass, Hibernating)->UseRealTime();
+BENCHMARK_TEMPLATE(SignalToPass, OnCondition)->UseRealTime();
+
+const bool rows = AddRatio("SignalToPass<Hibernating>/real_time", "SignalToPass<OnCondition>/real_time", 1.1);
+
+}  // namespace
