@@ -7,8 +7,6 @@
 #include <functional>
 #include <stdexcept>
 #include <thread>
-#include <utility>
-#include <vector>
 
 #include "support/blocked_thread.h"
 #include "support/faults.h"
@@ -17,38 +15,30 @@
 
 namespace {
 
-// What stays of a worker when it is gone.
-struct Record {
-    std::atomic<int> passes{0};  // begun
-    std::atomic<unsigned long long> number{0};
-    std::atomic<pthread_t> thread{};
-};
-
-class Worker : public HHibernateThread {
-public:
-    Worker(
-        Record& record, std::function<void(int)> pass = [](int) {})
-        : mrRecord(record), moPass(std::move(pass)) {}
+struct Worker : HHibernateThread {
+    Worker(std::function<void()> pass = [] {}) : moPass(std::move(pass)) {}
 
     // Returns when the worker has begun this many passes, ended the last one, and sleeps.
     void AwaitSleepAfter(int passes) const {
-        while (mrRecord.passes != passes || IsProcessing()) std::this_thread::yield();
-        AwaitSleepOf(mrRecord.number);
-        EXPECT_EQ(mrRecord.passes, passes);
+        while (mnPasses != passes || IsProcessing()) std::this_thread::yield();
+        AwaitSleepOf(mnNumber);
+        EXPECT_EQ(mnPasses, passes);
     }
 
-private:
     void Process() override {
-        mrRecord.number = GetCurrentThreadId();
-        mrRecord.thread = pthread_self();
-        moPass(++mrRecord.passes);
+        mnNumber = GetCurrentThreadId();
+        moThread = pthread_self();
+        ++mnPasses;
+        moPass();
     }
 
-    Record& mrRecord;
-    std::function<void(int)> moPass;
+    std::function<void()> moPass;
+    std::atomic<int> mnPasses{0};  // begun
+    std::atomic<unsigned long long> mnNumber{0};
+    std::atomic<pthread_t> moThread{};
 };
 
-HSemaphore parked(0), leave(0);
+const HSemaphore parked(0), leave(0);
 
 // Holds a thread, asleep or not, in a signal handler until `leave` is given.
 void Park(pthread_t thread) {
@@ -60,69 +50,42 @@ void Park(pthread_t thread) {
     parked.Lock();
 }
 
-TEST(HHibernateThread, MakesTwoPassesUnasked) {
-    Record record;
-    Worker worker(record);
-    EXPECT_TRUE(worker.IsProcessing());
-    EXPECT_FALSE(worker.Signal());
-    EXPECT_TRUE(worker.Start(true));
-    worker.AwaitSleepAfter(2);
-    EXPECT_FALSE(worker.IsProcessing());
-}
-
-TEST(HHibernateThread, CountsTheSignalsItAccepts) {
-    Record record;
-    Worker worker(record);
-    worker.Start(true);
-    worker.AwaitSleepAfter(2);
-    Park(record.thread);
-    for (int i = 0; i < 3; ++i) EXPECT_TRUE(worker.Signal());
-    leave.Unlock();
-    worker.AwaitSleepAfter(5);
-    std::atomic<int> accepted{0};
-    std::vector<std::thread> senders;
-    for (int i = 0; i < 3; ++i) {
-        senders.emplace_back([&] {
-            for (int round = 0; round < 1000; ++round)
-                if (worker.Signal()) ++accepted;
-        });
-    }
-    for (std::thread& sender : senders) sender.join();
-    worker.AwaitSleepAfter(5 + accepted);
-}
-
-TEST(HHibernateThread, DropsSignalsDuringAPass) {
-    Record record;
-    HSemaphore entered(0), go_on(0);
-    Worker worker(record, [&](int) {
+TEST(HHibernateThread, CountsSignalsOnlyWhileItHibernates) {
+    const HSemaphore entered(0), go_on(0);
+    Worker worker([&] {
         entered.Unlock();
         go_on.Lock();
     });
-    worker.Start(true);
-    for (int pass = 0; pass < 2; ++pass) {
-        entered.Lock();
-        EXPECT_TRUE(worker.IsProcessing());
-        EXPECT_FALSE(worker.Signal());
-        go_on.Unlock();
+    EXPECT_TRUE(worker.IsProcessing());
+    EXPECT_FALSE(worker.Signal());
+    EXPECT_TRUE(worker.Start(true));
+    for (const int passes : {2, 3}) {
+        for (int pass = 0; pass < passes; ++pass) {
+            entered.Lock();
+            EXPECT_TRUE(worker.IsProcessing());
+            EXPECT_FALSE(worker.Signal());
+            go_on.Unlock();
+        }
+        worker.AwaitSleepAfter(passes == 2 ? 2 : 5);
+        if (passes == 3) break;
+        Park(worker.moThread);
+        for (int i = 0; i < 3; ++i) EXPECT_TRUE(worker.Signal());
+        leave.Unlock();
     }
-    worker.AwaitSleepAfter(2);
 }
 
 TEST(HHibernateThread, SurvivesWhatGoesWrongInAPass) {
     const ChildResult child = RunInChild([] {
-        Record record;
-        Worker worker(record, [](int pass) {
-            if (pass == 1) throw std::runtime_error("bad luck");
-            if (pass == 2) throw 7;
-            if (pass == 3) WriteToNull();
-            if (pass == 4) UseUpStack();
+        Worker worker([&] {
+            if (worker.mnPasses == 1) throw std::runtime_error("bad luck");
+            if (worker.mnPasses == 2) throw 7;
+            worker.mnPasses == 3 ? WriteToNull() : UseUpStack();
         });
         worker.Start(true);
-        for (int passes = 2; passes < 6; ++passes) {
+        for (int passes = 2; passes <= 4; ++passes) {
             worker.AwaitSleepAfter(passes);
-            if (!worker.Signal()) return 1;
+            if (passes < 4 && !worker.Signal()) return 1;
         }
-        worker.AwaitSleepAfter(6);
         return 0;
     });
     EXPECT_EQ(child.exit_code, 0) << child.err;
@@ -131,31 +94,22 @@ TEST(HHibernateThread, SurvivesWhatGoesWrongInAPass) {
               "HHibernateThread::Run() Uncaught exception: bad luck\n" + unknown + unknown + unknown);
 }
 
-int polls = 0;
-
 TEST(HHibernateThread, EndsWithItsObjectByPolling) {
+    static int polls = 0, passes = 0;
     InstallUSleepHook([](int microseconds) {
         EXPECT_EQ(microseconds, 1000);
         if (++polls == 3) leave.Unlock();
     });
-    Record record;
-    { const Worker never_started(record); }
+    { const Worker never_started; }
     EXPECT_EQ(polls, 0);
     {
-        Worker worker(record);
+        Worker worker([] { ++passes; });
         worker.Start(true);
         worker.AwaitSleepAfter(2);
-        Park(record.thread);
+        Park(worker.moThread);
     }
     EXPECT_GE(polls, 3);
-    EXPECT_EQ(record.passes, 2);
-    {
-        Worker killed(record);
-        killed.Start(true);
-        killed.AwaitSleepAfter(4);
-        killed.Kill();
-    }
-    EXPECT_EQ(record.passes, 4);
+    EXPECT_EQ(passes, 2);
 }
 
 }  // namespace

@@ -1,18 +1,16 @@
-// Start, end, restart, kill and faults of threads, and what a thread leaves behind.
+// Start, end, restart, kill and faults of threads, and whose a fault is.
 #include "zanbase/thread.h"
 
 #include <gtest/gtest.h>
+#include <pthread.h>
+#include <signal.h>
+#include <sys/resource.h>
 
-#include <cerrno>
-#include <filesystem>
-#include <iterator>
 #include <stdexcept>
 #include <thread>
 #include <vector>
 
-#include <pthread.h>
-#include <sys/resource.h>
-
+#include "platform/guard.h"
 #include "support/blocked_thread.h"
 #include "support/faults.h"
 #include "support/run_in_child.h"
@@ -20,55 +18,38 @@
 #include "zanbase/mutex.h"
 #include "zanbase/semaphore.h"
 
-extern "C" {
-// The list of exit routines of a thread that was killed is lost; the header says so.
-const char* __lsan_default_suppressions() { return "leak:__cxa_thread_atexit_impl"; }
-__attribute__((weak)) void __tsan_acquire(void*);  // there under the thread sanitizer
-bool pthread_create_fails = false;
-int __real_pthread_create(pthread_t*, const pthread_attr_t*, void* (*)(void*), void*);
-int __wrap_pthread_create(pthread_t* thread, const pthread_attr_t* attributes, void* (*run)(void*),
-                          void* argument) {
-    return pthread_create_fails ? EAGAIN : __real_pthread_create(thread, attributes, run, argument);
-}
-}
-
-namespace {
-
-void AwaitIdle(const HThread& thread) {
-    while (thread.IsRunning()) std::this_thread::yield();
-}
-
-TEST(HThread, IsIdleUntilStarted) {
-    Runner runner([] {});
-    runner.Stop();
-    runner.Wait();
-    runner.Kill();
-    runner.DestroyThread();
-    EXPECT_FALSE(runner.IsRunning());
-}
+// A killed thread's list of exit routines is lost; the header says so.
+extern "C" const char* __lsan_default_suppressions() { return "leak:__cxa_thread_atexit_impl"; }
+extern "C" __attribute__((weak)) void __tsan_init();  // there under the thread sanitizer
 
 TEST(HThread, RunsOnceAStartWhateverTheArgument) {
+    const unsigned long long parent = HThread::GetCurrentThreadId();
     int runs = 0;
-    HSemaphore entered(0), leave(0);
+    const HSemaphore entered(0), leave(0);
     Runner runner([&] {
-        ++runs;
         entered.Unlock();
         leave.Lock();
         runner.Wait();  // on itself it returns
+        runs += HThread::GetCurrentThreadId() != parent ? 1 : 0;
     });
+    const auto is_idle = [&] {
+        runner.Wait();
+        runner.Kill();
+        runner.DestroyThread();
+        return !runner.IsRunning();
+    };
     for (const bool argument : {true, false, true}) {
-        runs = 0;
-        EXPECT_TRUE(runner.Start(argument));
-        EXPECT_FALSE(runner.Start(argument));
+        EXPECT_TRUE(is_idle() && runner.Start(argument) && !runner.Start(argument));
         entered.Lock();
         EXPECT_FALSE(Runner(runner).IsRunning());
         EXPECT_TRUE((runner = static_cast<const HThread&>(Runner(nullptr))).IsRunning());
+        const auto in_fork = [&] { _exit(is_idle() && HThread::GetCurrentThreadId() != parent ? 0 : 1); };
+        EXPECT_EQ(RunInChild([&] { return in_fork(), 1; }).exit_code, 0);
         EXPECT_FALSE(runner.Start(!argument));
         leave.Unlock();
         runner.Wait();
-        EXPECT_FALSE(runner.IsRunning());
-        EXPECT_EQ(runs, 1);
     }
+    EXPECT_EQ(runs, 3);
 }
 
 TEST(HThread, TellsWhyItCouldNotStart) {
@@ -76,11 +57,14 @@ TEST(HThread, TellsWhyItCouldNotStart) {
         Runner runner([] { std::printf("ran"); });
         std::printf("HThread::Start(%p) Error: Resource temporarily unavailable\n|",
                     static_cast<void*>(&runner));
-        pthread_create_fails = true;
+        pthread_attr_t usual, immense;
+        pthread_getattr_default_np(&usual);
+        pthread_getattr_default_np(&immense);
+        pthread_attr_setstacksize(&immense, 1UL << 60U);
+        pthread_setattr_default_np(&immense);
         const bool started = runner.Start(true) || runner.IsRunning();
-        pthread_create_fails = false;
-        runner.Start(true);
-        runner.Wait();
+        pthread_setattr_default_np(&usual);
+        runner.RunToEnd();
         return started ? 1 : 0;
     });
     const std::string line = child.out.substr(0, child.out.find('|'));
@@ -88,12 +72,12 @@ TEST(HThread, TellsWhyItCouldNotStart) {
     EXPECT_EQ(child.exit_code, 0);
 }
 
-Runner* current = nullptr;
-
 TEST(HThread, EndsWithTheLineDueAndCanBeStartedAgain) {
+    static Runner* current = nullptr;
     struct End {
         void (*run)();
         std::string line;
+        int signal = 0;
     };
     const std::string unknown = "HThread::_Run_() Unknown exception.\n";
     const End ends[] = {
@@ -106,196 +90,149 @@ TEST(HThread, EndsWithTheLineDueAndCanBeStartedAgain) {
         {UseUpStack, unknown},
         {[] { pthread_exit(nullptr); }, ""},
         {[] { current->Kill(); }, ""},
+        {[] { std::abort(); }, "", SIGABRT},
     };
     for (const End& end : ends) {
         const ChildResult child = RunInChild([&] {
             Runner runner(end.run);
             current = &runner;
-            for (int round = 0; round < 3; ++round) {
-                runner.Start(true);
-                runner.Wait();
-                if (runner.IsRunning()) return 1;
-            }
-            Runner last([] {});  // its start joins what killed itself
-            last.Start(true);
-            last.Wait();
-            return 0;
+            for (int round = 0; round < 3; ++round) runner.RunToEnd();
+            Runner([] {}).RunToEnd();  // joins what killed itself
+            return runner.IsRunning() ? 1 : 0;
         });
-        EXPECT_EQ(child.exit_code, 0) << &end - ends << child.err;
+        EXPECT_EQ(child.signal, end.signal) << &end - ends;
+        EXPECT_EQ(child.exit_code, end.signal == 0 ? 0 : -1) << &end - ends << child.err;
         EXPECT_EQ(child.out, end.line + end.line + end.line) << &end - ends;
     }
 }
 
-TEST(HThread, LetsAbortEndTheProcess) {
-    const auto body = [] {
-        Runner runner([] { std::abort(); });
-        runner.Start(true);
-        runner.Wait();
-        return 0;
-    };
-    EXPECT_EQ(RunInChild(body).signal, SIGABRT);
-}
-
-// Sets a flag when it is destroyed, a good while after it has begun.
+// Counts when it is destroyed, a good while after it has begun.
 struct Trace {
-    std::atomic<bool>& gone;
+    std::atomic<int>& count;
     ~Trace() {
         for (int i = 0; i < 100; ++i) std::this_thread::yield();
-        gone = true;
+        ++count;
     }
 };
 
-TEST(HThread, IsWaitedForWithItsThreadLocals) {
-    static std::atomic<bool> gone{false};
-    HSemaphore leave(0);
-    Runner runner([&] {
-        thread_local const Trace trace{gone};
-        leave.Lock();
-        static_cast<void>(&trace);
-    });
-    runner.Start(true);
-    std::atomic<int> in_time{0};
-    std::vector<std::thread> waiters;
-    for (int i = 0; i < 3; ++i) {
-        std::atomic<unsigned long long> number{0};
-        waiters.emplace_back([&] {
-            number = HThread::GetCurrentThreadId();
-            runner.Wait();
-            if (gone) ++in_time;
-        });
-        while (number == 0) std::this_thread::yield();
-        AwaitSleepOf(number);
-    }
-    leave.Unlock();
-    for (std::thread& waiter : waiters) waiter.join();
-    EXPECT_EQ(in_time, 3);
-}
-
-TEST(HThread, RunsNothingOfAKilledThread) {
-    static std::atomic<bool> frame_gone{false}, local_gone{false}, key_gone{false};
+TEST(HThread, IsWaitedForWithItsExitRoutinesAndRunsNoneWhenKilled) {
+    static std::atomic<int> gone{0};
     pthread_key_t key{};
-    pthread_key_create(&key, [](void*) { key_gone = true; });
+    pthread_key_create(&key, [](void*) { ++gone; });
     const HMutex mutex;
-    HSemaphore entered(0), never(0);
+    const HSemaphore entered(0), leave(0);
     Runner runner([&] {
-        const Trace trace{frame_gone};
-        thread_local const Trace local{local_gone};
-        pthread_setspecific(key, &local_gone);
+        EXPECT_EQ(pthread_getspecific(key), nullptr);  // though a killed thread had the same stack
+        const Trace frame{gone};
+        thread_local const Trace local{gone};
+        pthread_setspecific(key, &local);
         const HMutexLock lock(&mutex);
         entered.Unlock();
-        never.Lock();
-        static_cast<void>(&local);
+        leave.Lock();
     });
-    runner.Start(true);
-    entered.Lock();
-    runner.Kill();
-    EXPECT_FALSE(runner.IsRunning());
-    EXPECT_FALSE(mutex.TryLock());
-    // A new thread on the same stack sees nothing of it.
-    void* seen = nullptr;
-    Runner next([&] { seen = pthread_getspecific(key); });
-    next.Start(true);
-    next.Wait();
-    EXPECT_EQ(seen, nullptr);
-    EXPECT_FALSE(frame_gone);
-    // The thread sanitizer has to see a thread end in good order.
-    EXPECT_TRUE(__tsan_acquire != nullptr || !(local_gone || key_gone));
+    for (const bool kills : {false, true}) {
+        gone = 0;
+        runner.Start(true);
+        entered.Lock();
+        // The thread sanitizer has to see a thread end in good order.
+        const int due = !kills ? 3 : __tsan_init != nullptr ? 2 : 0;
+        std::vector<std::thread> waiters;
+        for (int i = 0; i < 3; ++i) {
+            std::atomic<unsigned long long> number{0};
+            waiters.emplace_back([&] {
+                number = HThread::GetCurrentThreadId();
+                runner.Wait();
+                EXPECT_EQ(gone, due);
+            });
+            while (number == 0) std::this_thread::yield();
+            AwaitSleepOf(number);
+        }
+        kills ? runner.Kill() : leave.Unlock();
+        for (std::thread& waiter : waiters) waiter.join();
+        EXPECT_FALSE(runner.IsRunning());
+        EXPECT_EQ(mutex.TryLock(), !kills);
+        if (!kills) mutex.Unlock();
+    }
 }
 
 TEST(HThread, RunsOnWithoutItsObjectOnceLetGo) {
-    HSemaphore entered(0), first_leave(0), second_leave(0), left(0);
+    const HSemaphore left(0), leave[2] = {0, 0};
     std::atomic<int> runs{0};
     Runner runner([&] {
-        HSemaphore& leave = ++runs == 1 ? first_leave : second_leave;
-        entered.Unlock();
-        leave.Lock();
+        leave[runs++].Lock();
         left.Unlock();
     });
-    runner.Start(true);
-    entered.Lock();
-    runner.DestroyThread();
-    EXPECT_FALSE(runner.IsRunning());
-    runner.Start(true);  // a second thread, which the end of the first leaves alone
-    entered.Lock();
-    first_leave.Unlock();
-    left.Lock();
-    EXPECT_TRUE(runner.IsRunning());
-    second_leave.Unlock();
-    runner.Wait();
-    left.Lock();
-}
-
-long CountThreads() { return std::distance(std::filesystem::directory_iterator("/proc/self/task"), {}); }
-
-TEST(HThread, LeavesNoThreadBehind) {
-    Runner runner([] {});
-    runner.Start(true);  // a sanitizer starts a thread of its own at the first one
-    runner.Wait();
-    const long before = CountThreads();
-    for (int round = 0; round < 10000; ++round) {
-        runner.Start(true);
-        if (round % 3 == 0) runner.Wait();
-        if (round % 3 == 1) runner.Kill();
-        AwaitIdle(runner);
+    for (int threads = 1; threads <= 2; ++threads) {
+        runner.DestroyThread();
+        EXPECT_TRUE(!runner.IsRunning() && runner.Start(true));
+        while (runs < threads) std::this_thread::yield();
     }
-    while (CountThreads() > before) std::this_thread::yield();
+    leave[0].Unlock();
+    left.Lock();
+    EXPECT_TRUE(runner.IsRunning());  // the second thread: the end of the first has left it alone
+    leave[1].Unlock();
+    runner.Wait();
 }
-
-// The nice value of a thread stands for its priority.
-int NiceOf(unsigned long long number) { return getpriority(PRIO_PROCESS, static_cast<id_t>(number)); }
 
 TEST(HThread, TakesItsPriorityWheneverItIsSet) {
     const bool may_raise = setpriority(PRIO_PROCESS, 0, -20) == 0 && setpriority(PRIO_PROCESS, 0, 0) == 0;
-    const int nices[] = {19, 10, 5, 0, -5, -10, -20, 0, 0};
-    std::atomic<unsigned long long> number{0};
-    HSemaphore leave(0);
+    std::atomic<id_t> number{0};
+    const HSemaphore leave(0);
     Runner runner([&] {
-        number = HThread::GetCurrentThreadId();
+        number = static_cast<id_t>(HThread::GetCurrentThreadId());
         leave.Lock();
     });
-    const auto has_nice = [&](int nice) {
-        while (number == 0 || NiceOf(number) != nice) std::this_thread::yield();
-    };
-    for (unsigned int value = std::size(nices); value-- > 0;) {
-        if (nices[value] < 0 && !may_raise) continue;
-        const auto priority = static_cast<HThreadPriority>(value);
-        runner.SetPriority(priority);
-        number = 0;
-        runner.Start(true);
-        has_nice(nices[value]);
-        setpriority(PRIO_PROCESS, static_cast<id_t>(number), 11);
-        runner.SetPriority(priority);  // the one it has: nothing happens
-        EXPECT_EQ(NiceOf(number), 11);
-        runner.SetPriority(HThreadPriorityIdle);
-        EXPECT_EQ(NiceOf(number), priority == HThreadPriorityIdle ? 11 : 19);
-        leave.Unlock();
-        runner.Wait();
+    unsigned int value = 0;
+    for (const int nice : {19, 10, 5, 0, -5, -10, -20, 0, 0}) {
+        const auto priority = static_cast<HThreadPriority>(value++);
+        for (const bool early : {true, false}) {
+            runner.SetPriority(early ? priority : HThreadPriorityNormal);
+            number = 0;
+            runner.Start(true);
+            runner.SetPriority(priority);
+            const int due = may_raise || nice > 0 ? nice : 0;
+            while (number == 0 || getpriority(PRIO_PROCESS, number) != due) std::this_thread::yield();
+            setpriority(PRIO_PROCESS, number, 19);
+            runner.SetPriority(priority);  // the one it has: nothing happens
+            EXPECT_EQ(getpriority(PRIO_PROCESS, number), 19);
+            leave.Unlock();
+            runner.Wait();
+        }
     }
 }
 
-TEST(HThread, IsGoneInTheChildOfAFork) {
-    HSemaphore leave(0);
-    Runner runner([&] { leave.Lock(); });
-    runner.Start(true);
-    const ChildResult child = RunInChild([&] {
-        runner.Wait();
-        runner.Kill();
-        _exit(runner.IsRunning() || HThread::GetCurrentThreadId() != static_cast<unsigned>(getpid()) ? 1 : 0);
-        return 1;
-    });
-    EXPECT_EQ(child.exit_code, 0);
-    EXPECT_TRUE(runner.IsRunning());
-    leave.Unlock();
-    runner.Wait();
+void Fault(void*) { WriteToNull(); }
+void Send(void*) { raise(SIGSEGV); }
+[[noreturn]] void Exit5(int) { _exit(5); }
+
+// A fault without a frame, and a signal that was merely sent, frame or not.
+TEST(PosixGuard, LeavesToOthersWhatIsNotItsOwn) {
+    struct Case {
+        void (*handler)(int);  // the program's, there before the library's
+        bool is_sent;
+        int exit_code;
+        int signal;
+    };
+    const Case cases[] = {{SIG_DFL, false, -1, SIGSEGV}, {SIG_DFL, true, -1, SIGSEGV},
+                          {SIG_IGN, false, -1, SIGSEGV}, {SIG_IGN, true, 0, 0},
+                          {Exit5, false, 5, 0},          {Exit5, true, 5, 0}};
+    for (const Case& each : cases) {
+        const ChildResult child = RunInChild([&] {
+            signal(SIGSEGV, each.handler);
+            if (!RunGuarded(Fault, nullptr)) return 1;
+            each.is_sent ? void(RunGuarded(Send, nullptr)) : Fault(nullptr);
+            return 0;
+        });
+        EXPECT_EQ(child.exit_code, each.exit_code) << &each - cases;
+        EXPECT_EQ(child.signal, each.signal) << &each - cases;
+    }
 }
 
-TEST(HThread, HasANumberOfItsOwn) {
-    const unsigned long long mine = HThread::GetCurrentThreadId();
-    unsigned long long other = 0;
-    std::thread([&] { other = HThread::GetCurrentThreadId(); }).join();
-    EXPECT_EQ(HThread::GetCurrentThreadId(), mine);
-    EXPECT_NE(other, mine);
-    EXPECT_LT(mine | other, 1ULL << 32U);
+TEST(PosixGuard, ServesUnderALaterHandlerThatHandsOn) {
+    static struct sigaction ours, later;
+    EXPECT_TRUE(RunGuarded(Fault, nullptr));
+    later.sa_sigaction = [](int number, siginfo_t* info, void* at) { ours.sa_sigaction(number, info, at); };
+    later.sa_flags = SA_SIGINFO;
+    sigaction(SIGSEGV, &later, &ours);
+    for (int round = 0; round < 2; ++round) EXPECT_TRUE(RunGuarded(Fault, nullptr));
 }
-
-}  // namespace

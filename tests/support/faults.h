@@ -2,23 +2,23 @@
 #ifndef ZANBASE_TESTS_FAULTS_H
 #define ZANBASE_TESTS_FAULTS_H
 
-#define ZANBASE_AS_WRITTEN __attribute__((noinline, no_sanitize("undefined", "address", "thread")))
+#define ZANBASE_AS_WRITTEN \
+    __attribute__((noinline, no_sanitize("undefined", "address", "thread"))) inline void
 
-ZANBASE_AS_WRITTEN inline void WriteToNull() {
+ZANBASE_AS_WRITTEN WriteToNull() {
     volatile int* volatile nowhere = nullptr;
     *nowhere = 1;
 }
 
-ZANBASE_AS_WRITTEN inline void DivideByZero() {
-    volatile int zero = 0;
-    volatile int number = 7;
+ZANBASE_AS_WRITTEN DivideByZero() {
+    volatile int number = 7, zero = 0;
     number = number / zero;
 }
 
-ZANBASE_AS_WRITTEN inline void RunIllegalInstruction() { __builtin_trap(); }
+ZANBASE_AS_WRITTEN RunIllegalInstruction() { __builtin_trap(); }
 
 // In steps of less than the page that guards a stack's end, and with no call, which might fault in its stead.
-ZANBASE_AS_WRITTEN inline void UseUpStack() {
+ZANBASE_AS_WRITTEN UseUpStack() {
     for (;;) *static_cast<volatile char*>(__builtin_alloca(1024)) = 0;
 }
 

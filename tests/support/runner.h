@@ -9,12 +9,16 @@
 
 class Runner : public HThread {
 public:
-    Runner(std::function<void()> run, HThreadPriority priority = HThreadPriorityNormal)
-        : HThread(priority), moRun(std::move(run)) {}
+    Runner(std::function<void()> run) : moRun(std::move(run)) {}
 
     using HThread::DestroyThread;
     using HThread::Yield;
     using HThread::operator=;
+
+    void RunToEnd() {
+        Start(true);
+        Wait();
+    }
 
 private:
     void Run() override { moRun(); }

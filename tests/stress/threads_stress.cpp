@@ -1,0 +1,151 @@
+// Kills threads wherever they may stand, starts, kills and awaits one from all sides, and signals a worker: for
+// some seconds, or as many times longer as the argument says. A broken promise ends it with a message, a lock
+// of the C library that stays held with a hang.
+#include <unistd.h>
+
+#include <cstdio>
+#include <cstdlib>
+#include <fstream>
+#include <mutex>
+#include <random>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "support/runner.h"
+#include "zanbase/hibernate_thread.h"
+
+// Who is killed frees nothing and joins nobody.
+extern "C" const char* __asan_default_options() { return "detect_leaks=0"; }
+extern "C" const char* __tsan_default_options() { return "report_thread_leaks=0"; }
+extern "C" __attribute__((weak)) void __asan_init(), __tsan_init();  // there under the sanitizers
+
+namespace {
+
+int rounds = 20;
+int pipe_ends[2];
+std::FILE* const waste = std::fopen("/dev/null", "w");
+
+void Require(bool holds, const char* what) {
+    if (holds) return;
+    std::fprintf(stderr, "broken: %s\n", what);
+    std::abort();
+}
+
+void Allocate() {
+    std::vector<std::string> texts;
+    for (unsigned int size = 1; size < 2000; size += 100) texts.emplace_back(size, 'x');
+}
+
+// Objects outlive their threads, whatever becomes of the thread that started those.
+const HSemaphore never(0);
+Runner endless([] { never.Lock(); });
+Runner allocating(Allocate);
+
+void ReadPipe() { Require(read(pipe_ends[0], pipe_ends, 1) != 0, "the pipe stays open"); }
+
+// What a thread does again and again until it is killed.
+void (*const kDeeds[])() = {
+    [] {},
+    std::this_thread::yield,
+    [] { sleep(1000); },
+    ReadPipe,
+    [] { endless.Wait(); },
+    Allocate,
+    [] { std::fprintf(waste, "%f %s\n", 1.0 / 3, std::string(30, 'x').c_str()); },
+    [] { std::thread(Allocate).join(); },
+    [] { allocating.Start(true) ? allocating.Wait() : allocating.Kill(); },
+};
+
+void KillInEveryDeed() {
+    std::atomic<int> steps{0};
+    for (const auto deed : kDeeds) {
+        if (deed == ReadPipe && __tsan_init != nullptr) continue;  // which holds signals back meanwhile
+        Runner runner([&] {
+            const HMutex mutex;
+            for (const HMutexLock lock(&mutex);; ++steps) deed();
+        });
+        for (int round = 0; round < rounds; ++round) {
+            runner.Start(true);
+            for (int pause = round % 10; pause > 0; --pause) std::this_thread::yield();
+            runner.Kill();
+            Require(!runner.IsRunning(), "idle after a kill");
+            std::thread(Allocate).join();
+        }
+    }
+}
+
+// Calls body(random) many times on each of some threads.
+template <class Body>
+void FromAllSides(int times, Body body) {
+    std::vector<std::thread> threads;
+    for (unsigned int seed = 1; seed <= 4; ++seed) {
+        threads.emplace_back([=] {
+            std::minstd_rand random(seed);
+            for (int time = 0; time < times * rounds; ++time) body(random);
+        });
+    }
+    for (std::thread& thread : threads) thread.join();
+}
+
+void OperateFromAllSides() {
+    std::mutex mutex;  // keeps a start and a kill apart
+    FromAllSides(40, [&](auto& random) {
+        if (random() % 4 == 0) allocating.Wait();
+        const std::lock_guard<std::mutex> lock(mutex);
+        random() % 3 == 0 ? allocating.Kill() : void(allocating.Start(true));
+        allocating.SetPriority(static_cast<HThreadPriority>(random() % 8));
+    });
+    allocating.Wait();
+    Require(!allocating.IsRunning(), "idle after a wait");
+}
+
+struct Counter : HHibernateThread {
+    std::atomic<int> passes{0}, due{2};
+    void Process() override { ++passes; }
+};
+
+void SignalFromAllSides() {
+    Counter counter;
+    counter.Start(true);
+    FromAllSides(1000, [&](auto&) { counter.due += counter.Signal() ? 1 : 0; });
+    while (counter.passes < counter.due || counter.IsProcessing()) std::this_thread::yield();
+    Require(counter.passes == counter.due, "a pass for each signal accepted");
+}
+
+// The number behind a name in what the system tells of the process.
+long Count(const std::string& wanted) {
+    std::ifstream status("/proc/self/status");
+    for (std::string name; name != wanted;) status >> name;
+    long count = 0;
+    status >> count;
+    return count;
+}
+
+void LeaveNothingBehind() {
+    long threads = 0, kilobytes = 0;
+    Runner unawaited([] {});
+    for (int round = 0; round < 11000; ++round) {
+        if (round == 1000) threads = Count("Threads:"), kilobytes = Count("VmRSS:");
+        unawaited.Start(true);
+        while (unawaited.IsRunning()) std::this_thread::yield();
+    }
+    while (Count("Threads:") > threads) std::this_thread::yield();
+    const bool keeps_back = __asan_init != nullptr || __tsan_init != nullptr;
+    Require(keeps_back || Count("VmRSS:") < kilobytes + 400, "level memory");
+}
+
+}  // namespace
+
+int main(int count, char** arguments) {
+    if (count > 1) rounds *= std::atoi(arguments[1]);
+    if (waste == nullptr || pipe(pipe_ends) != 0) return 1;
+    LeaveNothingBehind();
+    SignalFromAllSides();
+    OperateFromAllSides();
+    endless.Start(true);
+    KillInEveryDeed();
+    allocating.Wait();
+    endless.Kill();
+    return 0;
+}
