@@ -1,215 +1,221 @@
-// Re-entrancy, times, the orders of the scoped holders, and waiters that are ended; exclusion is the stress
-// program's, units and limits are the platform's (platform_test.cpp).
+// The locks one at a time: limits, units, levels, who gets in beside whom, and the scoped holders. What they
+// pass on is the platform's, see platform_test.cpp; locks_stress.cpp has them under many threads.
 #include <gtest/gtest.h>
 
 #include <array>
 #include <atomic>
 #include <cmath>
-#include <functional>
-#include <new>
+#include <deque>
+#include <sstream>
 #include <thread>
 
 #include "locks/milliseconds.h"
 #include "support/blocked_thread.h"
 #include "support/runner.h"
 #include "zanbase/condition_variable.h"
-#include "zanbase/semaphore.h"
-
-namespace {
-thread_local bool malloc_fails = false;
-}
-
-extern "C" {
-void* __real_malloc(std::size_t size);
-void* __wrap_malloc(std::size_t size) { return malloc_fails ? nullptr : __real_malloc(size); }
-}
+#include "zanbase/read_write_mutex.h"
 
 namespace {
 
-// Whether another thread could take `mutex` right now.
-bool FreeForOthers(const HMutex& mutex) {
-    bool taken = false;
-    std::thread([&] {
-        taken = mutex.TryLock();
-        if (taken) mutex.Unlock();
-    }).join();
-    return taken;
+TEST(MillisecondsIn, CutsAndNeverLeavesTheRange) {
+    const std::pair<double, unsigned int> cases[] = {
+        {0.0009, 0},          {1.9999, 1999}, {4294967.0, 4294967000}, {4294967.5, kForever},
+        {HUGE_VAL, kForever}, {-0.5, 0},      {-HUGE_VAL, 0},          {std::nan(""), 0}};
+    for (const auto& [seconds, result] : cases) EXPECT_EQ(MillisecondsIn(seconds), result) << seconds;
 }
 
-// The units that nobody holds.
+// The units that nobody holds, all taken and given back.
 int FreeUnits(const HSemaphore& semaphore) {
-    int units = 0;
-    while (semaphore.TryLock(0.0)) ++units;
-    for (int unit = 0; unit < units; ++unit) semaphore.Unlock();
+    if (!semaphore.TryLock(0.0)) return 0;
+    const int units = 1 + FreeUnits(semaphore);
+    semaphore.Unlock();
     return units;
 }
 
-TEST(HMutexLock, HoldsOneLevelUntilReleased) {
-    const HMutex first, second;
-    const HMutexLock none;
-    EXPECT_EQ(none.GetMutex(), nullptr);
-    HMutexLock lock = &first;
-    HMutexLock copy = lock;
-    EXPECT_TRUE(first.TryLock());
-    first.Unlock();
-    lock.Release();
-    lock.Release();
-    EXPECT_EQ(lock.GetMutex(), nullptr);
-    EXPECT_EQ(copy.GetMutex(), &first);
-    EXPECT_FALSE(FreeForOthers(first));
-    copy.Reset(&second);
-    EXPECT_TRUE(FreeForOthers(first));
-    EXPECT_FALSE(FreeForOthers(second));
-    copy = none;
-    EXPECT_EQ(copy.GetMutex(), nullptr);
-    EXPECT_TRUE(FreeForOthers(second));
+// The levels that this thread has, all given back and taken again.
+int LevelsOf(const HMutex& mutex) {
+    bool is_free = false;
+    std::thread([&] { is_free = mutex.TryLock() && (mutex.Unlock(), true); }).join();
+    if (is_free) return 0;
+    mutex.Unlock();
+    const int levels = 1 + LevelsOf(mutex);
+    mutex.Lock();
+    return levels;
 }
 
-// A thread that waits for the mutex gets in while its only level is let go and taken again.
-TEST(HMutexLock, LetsAWaiterInBetweenOnSelfAssignmentAndReset) {
-    for (const bool by_reset : {false, true}) {
+// A wait lets go of one level for its length, and so does assigning a holder to itself for a moment.
+TEST(HMutexLock, LetsAWaiterInByGivingBackItsOnlyLevel) {
+    for (const bool by_condition : {false, true}) {
         const HMutex mutex;
-        bool entered = false;  // guarded by mutex
-        HMutexLock lock(&mutex);
-        std::thread waiter([&] {
+        const HCondVar condition;
+        HMutexLock lock, &same = lock;
+        lock.Reset(&mutex);
+        HMutexLock deeper = lock;
+        std::atomic<bool> entered{false};
+        std::thread other([&] {
             const HMutexLock mine(&mutex);
             entered = true;
+            condition.Signal();
         });
-        HMutexLock& same = lock;
-        while (!entered) by_reset ? lock.Reset(&mutex) : static_cast<void>(lock = same);
+        EXPECT_FALSE(condition.TryWait(mutex, 0.01));
+        EXPECT_FALSE(entered);
+        deeper.Release();
+        while (!entered && !by_condition) lock = same;
+        while (!entered) EXPECT_TRUE(condition.TryWait(mutex, 1e9));
+        EXPECT_FALSE(condition.TryWait(mutex, 0.0));
+        EXPECT_TRUE(LevelsOf(mutex) == 1 && lock.GetMutex() == &mutex && deeper.GetMutex() == nullptr);
         lock.Release();
-        waiter.join();
+        other.join();
     }
 }
 
-TEST(HCondVar, ThrowsIfItsBlockCannotBeHad) {
-    bool thrown = false;
-    malloc_fails = true;
-    try {
-        const HCondVar condition;
-    } catch (const std::bad_alloc&) {
-        thrown = true;
-    }
-    malloc_fails = false;
-    EXPECT_TRUE(thrown);
-}
-
-TEST(HCondVar, GivesBackOneLevelForTheLengthOfAWait) {
-    const HMutex mutex;
-    const HCondVar condition;
-    HMutexLock lock(&mutex);
-    HMutexLock deeper = lock;
-    std::atomic<bool> entered{false};
-    std::thread other([&] {
-        const HMutexLock mine(&mutex);
-        entered = true;
-        condition.Signal();
-    });
-    EXPECT_FALSE(condition.TryWait(mutex, 0.01));
-    EXPECT_FALSE(entered);
-    deeper.Release();
-    while (!entered) EXPECT_TRUE(condition.TryWait(mutex, 1e9));
-    EXPECT_FALSE(condition.TryWait(mutex, 0.0));
-    EXPECT_FALSE(FreeForOthers(mutex));
-    lock.Release();
-    other.join();
-}
-
-TEST(MillisecondsIn, CutsAndNeverLeavesTheRange) {
-    const struct {
-        double seconds;
-        unsigned int milliseconds;
-    } cases[] = {{0.0009, 0},          {1.9999, 1999}, {4294967.0, 4294967000}, {4294967.5, kForever},
-                 {HUGE_VAL, kForever}, {-0.5, 0},      {-HUGE_VAL, 0},          {std::nan(""), 0}};
-    for (const auto& each : cases) EXPECT_EQ(MillisecondsIn(each.seconds), each.milliseconds) << each.seconds;
-}
-
-TEST(HSemaphoreLock, HoldsOneUnitAndGivesItBackBeforeItTakes) {
-    EXPECT_EQ(FreeUnits(HSemaphore()), 1);
-    HSemaphore first(1), second(1);
-    first.Unlock();  // by one who has taken none
-    HSemaphoreLock none(nullptr);
-    none.Release();
-    {
-        HSemaphoreLock lock = &first;
-        HSemaphoreLock copy = lock;
-        EXPECT_EQ(FreeUnits(first), 0);
-        HSemaphoreLock& same = lock;
-        lock = same;  // would wait for itself if it took first
-        lock.Reset(&first);
-        lock.Release();
-        lock.Release();
-        EXPECT_EQ(FreeUnits(first), 1);
-        lock = copy;
-        EXPECT_EQ(FreeUnits(first), 0);
-        copy.Reset(&second);
-        EXPECT_EQ(FreeUnits(second), 0);
-        lock = none;
-        EXPECT_EQ(FreeUnits(first), 2);
-    }
-    EXPECT_EQ(FreeUnits(first), 2);
-    EXPECT_EQ(FreeUnits(second), 1);
-}
-
-using Action = std::function<void()>;
-
-class Waiter {
-public:
-    explicit Waiter(const Action& waits)
-        : mRunner([&] {
-              mNumber = HThread::GetCurrentThreadId();
-              waits();
-          }) {
-        mRunner.Start(true);
-        while (mNumber == 0) std::this_thread::yield();
-        AwaitSleepOf(mNumber);
-    }
-    ~Waiter() { mRunner.Wait(); }
-    void Kill() { mRunner.Kill(); }
-
-private:
-    std::atomic<unsigned long long> mNumber{0};
-    Runner mRunner;
+struct Units {
+    void Take(double limit) { EXPECT_TRUE(moSemaphore.TryLock(limit)); }
+    void Give() { moSemaphore.Unlock(); }
+    HSemaphore moSemaphore{0};
 };
 
-// Three wait; the first is ended, asleep or, if `beside`, while one of them is served. What was meant for it may
-// be gone with it, but two more servings must do for the other two.
-void ExpectOthersServed(const Action& waits, const Action& serve, bool beside = false) {
-    std::array<Waiter, 3> waiters{Waiter(waits), Waiter(waits), Waiter(waits)};
-    std::thread server([&] {
-        if (beside) serve();
-    });
-    waiters[0].Kill();
-    server.join();
-    for (int other = 1; other < 3; ++other) serve();
+struct Items {
+    void Take(double limit) {
+        const HMutexLock lock(&moMutex);
+        while (mnItems == 0) EXPECT_TRUE(moCondition.TryWait(moMutex, limit));
+        --mnItems;
+    }
+    void Give() {
+        const HMutexLock lock(&moMutex);
+        ++mnItems;
+        moCondition.Signal();
+    }
+    HMutex moMutex;
+    HCondVar moCondition;
+    int mnItems = 0;  // guarded by moMutex
+};
+
+// Three wait; the first is ended, asleep or waking up for a gift. That may be gone with it, but two more must do
+// for the other two.
+template <class Source>
+void ExpectOthersServed(bool gives_before) {
+    for (int round = 0; round < 200; ++round) {
+        Source source;
+        const double limit = round % 4 < 2 ? 1e6 : 1e300;
+        std::deque<Runner> waiters;
+        for (int waiter = 0; waiter < 3; ++waiter) {
+            std::atomic<unsigned long long> number{0};
+            waiters.emplace_back([&] { number = HThread::GetCurrentThreadId(), source.Take(limit); });
+            waiters.back().Start(true);
+            while (number == 0) std::this_thread::yield();
+            AwaitSleepOf(number);
+        }
+        if (gives_before && round % 2 == 0) source.Give();
+        waiters[0].Kill();
+        for (int other = 1; other < 3; ++other) source.Give();
+        for (Runner& waiter : waiters) waiter.Wait();
+    }
 }
 
-// Killed while it is served, a waiter of the condition could hold the mutex, which would stay held.
-TEST(KilledWaiter, LeavesSemaphoreConditionAndMutexToTheOthers) {
-    for (int round = 0; round < 100; ++round) {
-        const double limit = round % 3 == 0 ? 1e6 : 1e300;
-        HSemaphore semaphore(0);
-        const Action take = [&] { EXPECT_TRUE(semaphore.TryLock(limit)); };
-        ExpectOthersServed(
-            take, [&] { semaphore.Unlock(); }, round % 2 == 0);
-        const HMutex mutex;
-        const HCondVar condition;
-        int items = 0;  // guarded by mutex
-        const Action take_item = [&] {
-            const HMutexLock lock(&mutex);
-            while (items == 0) EXPECT_TRUE(condition.TryWait(mutex, limit));
-            --items;
-        };
-        const Action add_item = [&] {
-            const HMutexLock lock(&mutex);
-            ++items;
-            condition.Signal();
-        };
-        ExpectOthersServed(take_item, add_item);
-        HMutexLock lock(&mutex);
-        const Action take_mutex = [&] { const HMutexLock mine(&mutex); };
-        ExpectOthersServed(take_mutex, [&] { lock.Release(); });
+TEST(KilledWaiters, TakeNothingFromTheOthers) {
+    ExpectOthersServed<Units>(true);
+    ExpectOthersServed<Items>(false);  // a thread that is ended with the mutex would keep it
+}
+
+std::string calls;  // of all that follow
+
+struct NotingMutex : HReadWriteMutex {
+    void ReadLock() const override { calls += "r", ++mnHeld; }
+    void ReadUnlock() const override { calls += "R", --mnHeld; }
+    void WriteLock() const override { calls += "w", ++mnHeld; }
+    void WriteUnlock() const override { calls += "W", --mnHeld; }
+    mutable int mnHeld = 0;
+};
+
+// A holder has one of what it holds, which is given back before another is taken.
+template <class Holder, class Lock, class Held, class... Units>
+void ExpectRules(Held held, Units... units) {
+    Lock first{units...}, second{units...};
+    Holder none(nullptr);
+    none.Release();
+    {
+        Holder lock = &first, copy = lock, &same = lock;
+        lock = same;
+        EXPECT_EQ(held(first), 2);
+        lock.Release();
+        lock.Release();
+        EXPECT_EQ(held(first), 1);
+        lock = copy;
+        EXPECT_EQ(held(first), 2);
+        copy.Reset(&second);
+        EXPECT_TRUE(held(first) == 1 && held(second) == 1);
+        copy = none;
+        EXPECT_EQ(held(second), 0);
     }
+    EXPECT_EQ(held(first), 0);
+}
+
+TEST(Holders, GiveBackBeforeTheyTake) {
+    const auto noted = [](const NotingMutex& mutex) { return mutex.mnHeld; };
+    ExpectRules<HReaderLock, NotingMutex>(noted);
+    ExpectRules<HWriterLock, NotingMutex>(noted);
+    EXPECT_EQ(calls, "rrRrRrRrRRwwWwWwWwWW");
+    const auto taken = [](const HSemaphore& semaphore) { return 2 - FreeUnits(semaphore); };
+    EXPECT_EQ(FreeUnits(HSemaphore()), 1);
+    ExpectRules<HSemaphoreLock, HSemaphore>(taken, 2U);
+    ExpectRules<HMutexLock, HMutex>(LevelsOf);
+}
+
+// A thread that makes the calls it is told.
+struct Visitor {
+    explicit Visitor(const HReadWriteMutex& mutex) : moThread([&] { Run(mutex); }) {}
+    ~Visitor() { Begin('.'), moThread.join(); }
+    void Begin(char call) {
+        mnCall = call;
+        moTurn.Unlock();
+        while (mnCall == call) std::this_thread::yield();
+    }
+    void Run(const HReadWriteMutex& mutex) {
+        mnNumber = HThread::GetCurrentThreadId();
+        for (char call = 0; call != '.'; mnCall = 0) {
+            moTurn.Lock();
+            call = mnCall.exchange('!');
+            if (call == 'r') mutex.ReadLock();
+            if (call == 'R') mutex.ReadUnlock();
+            if (call == 'w') mutex.WriteLock();
+            if (call == 'W') mutex.WriteUnlock();
+        }
+    }
+    const HSemaphore moTurn{0};
+    std::atomic<char> mnCall{0};  // as told, then '!' while it is made, then 0
+    std::atomic<unsigned long long> mnNumber{0};
+    std::thread moThread;
+};
+
+// Plays scenes with the threads a, b and c. "ar": a calls ReadLock, which returns. "bw!": b calls WriteLock
+// and is stuck. "b!": b is still stuck. "b.": b's call returns. After each scene the mutex must be free.
+template <class Mutex>
+void Play(std::initializer_list<const char*> scenes) {
+    for (const std::string scene : scenes) {
+        const Mutex mutex;
+        std::array<Visitor, 3> visitors{Visitor{mutex}, Visitor{mutex}, Visitor{mutex}};
+        std::istringstream steps(scene + " aw aW bw bW");
+        for (std::string step; steps >> step;) {
+            Visitor& visitor = visitors[static_cast<std::size_t>(step[0] - 'a')];
+            if (step[1] != '!' && step[1] != '.') visitor.Begin(step[1]);
+            while (step.back() != '!' && visitor.mnCall != 0) std::this_thread::yield();
+            AwaitSleepOf(visitor.mnNumber);
+            ASSERT_EQ(visitor.mnCall != 0, step.back() == '!') << step << " of " << scene;
+        }
+    }
+}
+
+TEST(ReadWriteMutexes, KeepOthersOutAndDifferInWhoGoesFirst) {
+    const auto scenes = {"ar ar bw! ar b! aR b! aR b! aR b. bW",  // the third nests behind a waiting writer
+                         "aw aw br! aW b! aW b. bR", "aw aw bw! aW b! aW b. bW", "ar br aR cw! bR c. cW"};
+    Play<HReadPrefMutex>(scenes);
+    Play<HWritePrefMutex>(scenes);
+    Play<HReadPrefMutex>({"ar bw! cr aR b! cR b. bW"});
+    Play<HWritePrefMutex>({"ar bw! cr! aR b. c! bW c. cR"});
+    // The writer reads too, and goes on as a reader or as a writer, beside the readers that it has let in.
+    Play<HReadPrefMutex>({"aw ar aW bw! cr cR b! aR b. bW", "aw ar cr aW bw! aR b! cR b. bW",
+                          "aw ar aR bw! aW b. cr! bW c. cR"});
 }
 
 }  // namespace
