@@ -2,8 +2,8 @@
 #include "zanbase/hibernate_thread.h"
 
 #include <gtest/gtest.h>
+#include <signal.h>
 
-#include <csignal>
 #include <functional>
 #include <stdexcept>
 #include <thread>
@@ -13,10 +13,10 @@
 #include "support/run_in_child.h"
 #include "zanbase/sleep.h"
 
-namespace {
+const HSemaphore parked(0), leave(0);
 
 struct Worker : HHibernateThread {
-    Worker(std::function<void()> pass = [] {}) : moPass(std::move(pass)) {}
+    Worker(std::function<void(int)> pass) : moPass(std::move(pass)) {}
 
     // Returns when the worker has begun this many passes, ended the last one, and sleeps.
     void AwaitSleepAfter(int passes) const {
@@ -25,61 +25,46 @@ struct Worker : HHibernateThread {
         EXPECT_EQ(mnPasses, passes);
     }
 
-    void Process() override {
-        mnNumber = GetCurrentThreadId();
-        moThread = pthread_self();
-        ++mnPasses;
-        moPass();
+    // Holds the worker, asleep or not, in a signal handler until `leave` is given.
+    void Park() const {
+        signal(SIGUSR1, [](int) { parked.Unlock(), leave.Lock(); });
+        tgkill(getpid(), static_cast<pid_t>(mnNumber), SIGUSR1);
+        parked.Lock();
     }
 
-    std::function<void()> moPass;
+    void Process() override {
+        mnNumber = GetCurrentThreadId();
+        moPass(++mnPasses);
+    }
+
+    std::function<void(int)> moPass;
     std::atomic<int> mnPasses{0};  // begun
     std::atomic<unsigned long long> mnNumber{0};
-    std::atomic<pthread_t> moThread{};
 };
-
-const HSemaphore parked(0), leave(0);
-
-// Holds a thread, asleep or not, in a signal handler until `leave` is given.
-void Park(pthread_t thread) {
-    std::signal(SIGUSR1, [](int) {
-        parked.Unlock();
-        leave.Lock();
-    });
-    pthread_kill(thread, SIGUSR1);
-    parked.Lock();
-}
 
 TEST(HHibernateThread, CountsSignalsOnlyWhileItHibernates) {
     const HSemaphore entered(0), go_on(0);
-    Worker worker([&] {
-        entered.Unlock();
-        go_on.Lock();
-    });
-    EXPECT_TRUE(worker.IsProcessing());
-    EXPECT_FALSE(worker.Signal());
-    EXPECT_TRUE(worker.Start(true));
-    for (const int passes : {2, 3}) {
-        for (int pass = 0; pass < passes; ++pass) {
-            entered.Lock();
-            EXPECT_TRUE(worker.IsProcessing());
-            EXPECT_FALSE(worker.Signal());
-            go_on.Unlock();
-        }
-        worker.AwaitSleepAfter(passes == 2 ? 2 : 5);
-        if (passes == 3) break;
-        Park(worker.moThread);
+    Worker worker([&](int) { entered.Unlock(), go_on.Lock(); });
+    EXPECT_TRUE(worker.IsProcessing() && !worker.Signal() && worker.Start(true));
+    for (int pass = 1; pass <= 5; ++pass) {
+        entered.Lock();
+        EXPECT_TRUE(worker.IsProcessing() && !worker.Signal());
+        go_on.Unlock();
+        if (pass != 2) continue;
+        worker.AwaitSleepAfter(2);
+        worker.Park();
         for (int i = 0; i < 3; ++i) EXPECT_TRUE(worker.Signal());
         leave.Unlock();
     }
+    worker.AwaitSleepAfter(5);
 }
 
 TEST(HHibernateThread, SurvivesWhatGoesWrongInAPass) {
     const ChildResult child = RunInChild([] {
-        Worker worker([&] {
-            if (worker.mnPasses == 1) throw std::runtime_error("bad luck");
-            if (worker.mnPasses == 2) throw 7;
-            worker.mnPasses == 3 ? WriteToNull() : UseUpStack();
+        Worker worker([](int pass) {
+            if (pass == 1) throw std::runtime_error("bad luck");
+            if (pass == 2) throw 7;
+            pass == 3 ? WriteToNull() : UseUpStack();
         });
         worker.Start(true);
         for (int passes = 2; passes <= 4; ++passes) {
@@ -100,16 +85,14 @@ TEST(HHibernateThread, EndsWithItsObjectByPolling) {
         EXPECT_EQ(microseconds, 1000);
         if (++polls == 3) leave.Unlock();
     });
-    { const Worker never_started; }
-    EXPECT_EQ(polls, 0);
-    {
-        Worker worker([] { ++passes; });
+    for (const bool starts : {false, true}) {
+        Worker worker([](int pass) { passes = pass; });
+        EXPECT_EQ(polls, 0);
+        if (!starts) continue;
         worker.Start(true);
         worker.AwaitSleepAfter(2);
-        Park(worker.moThread);
+        worker.Park();
     }
     EXPECT_GE(polls, 3);
     EXPECT_EQ(passes, 2);
 }
-
-}  // namespace

@@ -1,11 +1,11 @@
 // Kills threads wherever they may stand, starts, kills and awaits one from all sides, and signals a worker: for
 // some seconds, or as many times longer as the argument says. A broken promise ends it with a message, a lock
 // of the C library that stays held with a hang.
+#include <sys/resource.h>
 #include <unistd.h>
 
 #include <cstdio>
 #include <cstdlib>
-#include <fstream>
 #include <mutex>
 #include <random>
 #include <string>
@@ -75,64 +75,46 @@ void KillInEveryDeed() {
     }
 }
 
-// Calls body(random) many times on each of some threads.
-template <class Body>
-void FromAllSides(int times, Body body) {
-    std::vector<std::thread> threads;
-    for (unsigned int seed = 1; seed <= 4; ++seed) {
-        threads.emplace_back([=] {
-            std::minstd_rand random(seed);
-            for (int time = 0; time < times * rounds; ++time) body(random);
-        });
-    }
-    for (std::thread& thread : threads) thread.join();
-}
-
-void OperateFromAllSides() {
-    std::mutex mutex;  // keeps a start and a kill apart
-    FromAllSides(40, [&](auto& random) {
-        if (random() % 4 == 0) allocating.Wait();
-        const std::lock_guard<std::mutex> lock(mutex);
-        random() % 3 == 0 ? allocating.Kill() : void(allocating.Start(true));
-        allocating.SetPriority(static_cast<HThreadPriority>(random() % 8));
-    });
-    allocating.Wait();
-    Require(!allocating.IsRunning(), "idle after a wait");
-}
-
 struct Counter : HHibernateThread {
     std::atomic<int> passes{0}, due{2};
     void Process() override { ++passes; }
 };
 
-void SignalFromAllSides() {
+void OperateFromAllSides() {
     Counter counter;
     counter.Start(true);
-    FromAllSides(1000, [&](auto&) { counter.due += counter.Signal() ? 1 : 0; });
+    std::mutex mutex;  // keeps a start and a kill apart
+    std::vector<std::thread> operators;
+    for (unsigned int seed = 1; seed <= 4; ++seed) {
+        operators.emplace_back([&, seed] {
+            std::minstd_rand random(seed);
+            for (int round = 0; round < 50 * rounds; ++round) {
+                counter.due += counter.Signal() ? 1 : 0;
+                if (random() % 4 == 0) allocating.Wait();
+                const std::lock_guard<std::mutex> lock(mutex);
+                random() % 3 == 0 ? allocating.Kill() : void(allocating.Start(true));
+                allocating.SetPriority(static_cast<HThreadPriority>(random() % 8));
+            }
+        });
+    }
+    for (std::thread& each : operators) each.join();
+    allocating.Wait();
+    Require(!allocating.IsRunning(), "idle after a wait");
     while (counter.passes < counter.due || counter.IsProcessing()) std::this_thread::yield();
     Require(counter.passes == counter.due, "a pass for each signal accepted");
 }
 
-// The number behind a name in what the system tells of the process.
-long Count(const std::string& wanted) {
-    std::ifstream status("/proc/self/status");
-    for (std::string name; name != wanted;) status >> name;
-    long count = 0;
-    status >> count;
-    return count;
-}
-
 void LeaveNothingBehind() {
-    long threads = 0, kilobytes = 0;
+    rusage before{}, after{};
     Runner unawaited([] {});
     for (int round = 0; round < 11000; ++round) {
-        if (round == 1000) threads = Count("Threads:"), kilobytes = Count("VmRSS:");
         unawaited.Start(true);
         while (unawaited.IsRunning()) std::this_thread::yield();
+        if (round == 1000) getrusage(RUSAGE_SELF, &before);
     }
-    while (Count("Threads:") > threads) std::this_thread::yield();
+    getrusage(RUSAGE_SELF, &after);
     const bool keeps_back = __asan_init != nullptr || __tsan_init != nullptr;
-    Require(keeps_back || Count("VmRSS:") < kilobytes + 400, "level memory");
+    Require(keeps_back || after.ru_maxrss < before.ru_maxrss + 400, "level memory");
 }
 
 }  // namespace
@@ -141,7 +123,6 @@ int main(int count, char** arguments) {
     if (count > 1) rounds *= std::atoi(arguments[1]);
     if (waste == nullptr || pipe(pipe_ends) != 0) return 1;
     LeaveNothingBehind();
-    SignalFromAllSides();
     OperateFromAllSides();
     endless.Start(true);
     KillInEveryDeed();

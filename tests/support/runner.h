@@ -12,8 +12,6 @@ public:
     Runner(std::function<void()> run) : moRun(std::move(run)) {}
 
     using HThread::DestroyThread;
-    using HThread::Yield;
-    using HThread::operator=;
 
     void RunToEnd() {
         Start(true);

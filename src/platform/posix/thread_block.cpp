@@ -1,6 +1,7 @@
 // The life of control blocks: making, waiting, ending and reuse.
 #include "platform/posix/thread_block.h"
 
+#include <climits>
 #include <cstdlib>
 #include <new>
 
@@ -125,7 +126,7 @@ void StartOverInChild() noexcept {
 
 __attribute__((constructor)) void Prepare() {
     OpenLock(&goLock);
-    pthread_key_create(&gnExitKey, OnThreadExit);
+    if (pthread_key_create(&gnExitKey, OnThreadExit) != 0) gnExitKey = PTHREAD_KEYS_MAX;  // which none has
     pthread_atfork(BlockLock::Take, BlockLock::Give, StartOverInChild);
 }
 
