@@ -57,6 +57,7 @@ void (*const kDeeds[])() = {
     [] { allocating.Start(true) ? allocating.Wait() : allocating.Kill(); },
 };
 
+// A thousand kills in a row.
 void KillInEveryDeed() {
     std::atomic<int> steps{0};
     for (const auto deed : kDeeds) {
@@ -65,7 +66,7 @@ void KillInEveryDeed() {
             const HMutex mutex;
             for (const HMutexLock lock(&mutex);; ++steps) deed();
         });
-        for (int round = 0; round < rounds; ++round) {
+        for (int round = 0; round < 6 * rounds; ++round) {
             runner.Start(true);
             for (int pause = round % 10; pause > 0; --pause) std::this_thread::yield();
             runner.Kill();
