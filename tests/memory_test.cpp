@@ -12,7 +12,7 @@
 namespace {
 
 // In one array, so that the order of the pointers is known. The first and the third are the same text.
-const char kFiles[][60] = {"/home/me/src/core/table", "/home/me/src/io/reader", "/home/me/src/core/table",
+const char kFiles[][60] = {"/project/src/core/table", "/project/src/io/reader", "/project/src/core/table",
                            "d/123456789/123456789/123456789/123456789/1234567",
                            "a_file_name_that_is_longer_than_all_of_the_column"};
 char memory[600];  // the blocks
