@@ -17,7 +17,7 @@ std::string calls;
 
 extern "C" WallClock __wrap__Z13ReadWallClockv() { return now; }
 extern "C" unsigned int __wrap__Z9ReadTicksv() { return ticks; }
-extern "C" void __wrap__Z8PauseForj(unsigned ms) { ticks += ++pauses % 2, calls += std::to_string(ms) + ";"; }
+extern "C" void __wrap__Z8SleepForj(unsigned ms) { ticks += ++pauses % 2, calls += std::to_string(ms) + ";"; }
 
 class CopyableTimer : public HTimer {};
 

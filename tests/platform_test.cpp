@@ -22,7 +22,7 @@ TEST(PlatformClock, GivesTheWallTimeAndTicksAndPausesInMilliseconds) {
                 read <= std::chrono::system_clock::now().time_since_epoch());
     const auto before = std::chrono::steady_clock::now();
     const unsigned int start = ReadTicks();
-    for (const unsigned int ms : {0U, 1U, 29U}) PauseFor(ms);
+    for (const unsigned int ms : {0U, 1U, 29U}) SleepFor(ms);
     const unsigned int ticks = ReadTicks() - start;
     EXPECT_TRUE(ticks >= 30 && std::chrono::steady_clock::now() - before > (ticks - 1) * one) << ticks;
 }
@@ -32,57 +32,57 @@ TEST(PlatformProcessors, AreKnownAndAtLeastAsManyAsCores) {
 }
 
 TEST(PlatformLock, IsFreeAtLevelZeroOnly) {
-    NativeLock lock;
-    OpenLock(&lock);
-    TakeLock(&lock);
-    EXPECT_TRUE(TryTakeLock(&lock));
+    HNativeLock lock;
+    InitLock(&lock);
+    AcquireLock(&lock);
+    EXPECT_TRUE(TryAcquireLock(&lock));
     for (const bool free_after : {false, true}) {
-        GiveLock(&lock);
+        ReleaseLock(&lock);
         std::thread([&] {
-            EXPECT_EQ(TryTakeLock(&lock), free_after);
-            if (free_after) GiveLock(&lock);
+            EXPECT_EQ(TryAcquireLock(&lock), free_after);
+            if (free_after) ReleaseLock(&lock);
         }).join();
     }
-    CloseLock(&lock);
+    DestroyLock(&lock);
 }
 
 TEST(PlatformCondition, SleepsUntilAWakeUpOrTheLimit) {
-    NativeLock lock;
-    OpenLock(&lock);
-    NativeCondition condition;
-    OpenCondition(&condition);
-    for (const auto wake : {WakeOne, WakeAll}) {
+    HNativeLock lock;
+    InitLock(&lock);
+    HNativeCondition condition;
+    InitCondition(&condition);
+    for (const auto wake : {SignalCondition, BroadcastCondition}) {
         wake(&condition);  // for nobody, and not kept
-        TakeLock(&lock);
-        EXPECT_FALSE(SleepOn(&condition, &lock, 0));
-        EXPECT_FALSE(SleepOn(&condition, &lock, 5));
+        AcquireLock(&lock);
+        EXPECT_FALSE(WaitOnCondition(&condition, &lock, 0));
+        EXPECT_FALSE(WaitOnCondition(&condition, &lock, 5));
         bool woken = false;  // guarded by lock
         std::thread waker([&] {
-            TakeLock(&lock);
+            AcquireLock(&lock);
             woken = true;
-            GiveLock(&lock);
+            ReleaseLock(&lock);
             wake(&condition);
         });
-        while (!woken) EXPECT_TRUE(SleepOn(&condition, &lock, kForever));
-        GiveLock(&lock);
+        while (!woken) EXPECT_TRUE(WaitOnCondition(&condition, &lock, kForever));
+        ReleaseLock(&lock);
         waker.join();
     }
-    CloseLock(&lock);
+    DestroyLock(&lock);
 }
 
 TEST(PlatformSemaphore, CountsUnitsUpToItsMost) {
-    NativeSemaphore* semaphore = NewSemaphore(0);
-    for (const unsigned int limit_ms : {0U, 5U}) EXPECT_FALSE(TakeUnit(semaphore, limit_ms));
+    HNativeSemaphore* semaphore = NewSemaphore(0);
+    for (const unsigned int limit_ms : {0U, 5U}) EXPECT_FALSE(AcquireUnit(semaphore, limit_ms));
     for (const unsigned int limit_ms : {kForever, kForever - 1}) {
-        std::thread giver([&] { GiveUnit(semaphore); });
-        EXPECT_TRUE(TakeUnit(semaphore, limit_ms));
+        std::thread giver([&] { ReleaseUnit(semaphore); });
+        EXPECT_TRUE(AcquireUnit(semaphore, limit_ms));
         giver.join();
     }
-    EndSemaphore(semaphore);
-    semaphore = NewSemaphore(kMostUnits);
-    GiveUnit(semaphore);
-    EXPECT_TRUE(TakeUnit(semaphore, 0));
-    EndSemaphore(semaphore);
+    DeleteSemaphore(semaphore);
+    semaphore = NewSemaphore(kMaxUnits);
+    ReleaseUnit(semaphore);
+    EXPECT_TRUE(AcquireUnit(semaphore, 0));
+    DeleteSemaphore(semaphore);
 }
 
 TEST(PlatformThread, HasItsSlotFromBeforeItsBodyToItsEnd) {
@@ -90,16 +90,16 @@ TEST(PlatformThread, HasItsSlotFromBeforeItsBodyToItsEnd) {
     static std::atomic<int> steps{0};
     const auto one_step = [](void*) { steps += slot.load() != nullptr ? 1 : 0; };
     const auto endless = [](void*) {
-        for (;; ++steps) GiveWay();
+        for (;; ++steps) YieldThread();
     };
     for (int round = 1; round <= 100; ++round) {
         steps = 0;
         ASSERT_EQ(StartThread(slot, one_step, nullptr), 0) << SystemErrorText(0);
-        AwaitThread(slot);
+        JoinThread(slot);
         EXPECT_EQ(steps, 1);
         StartThread(slot, endless, nullptr);
-        while (steps < round % 3) GiveWay();
-        EndThread(slot);
+        while (steps < round % 3) YieldThread();
+        KillThread(slot);
         EXPECT_EQ(slot.load(), nullptr);
     }
 }

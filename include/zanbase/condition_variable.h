@@ -6,7 +6,7 @@
 #include "zanbase/export.h"
 #include "zanbase/mutex.h"
 
-struct NativeCondition;
+struct HNativeCondition;
 
 /// A condition variable that is waited for with a `HMutex`.
 ///
@@ -49,7 +49,7 @@ private:
     HCondVar(const HCondVar&) {}
     HCondVar& operator=(const HCondVar&) { return *this; }
 
-    NativeCondition* mpoCondition = nullptr;  // owned; set by the constructor and never changed
+    HNativeCondition* mpoCondition = nullptr;  // owned; set by the constructor and never changed
 };
 
 #endif

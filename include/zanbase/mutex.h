@@ -7,7 +7,7 @@
 
 #include "zanbase/export.h"
 
-struct NativeLock;
+struct HNativeLock;
 
 /// A re-entrant mutex: the thread that owns it may take it again without blocking, and it becomes free once
 /// that thread has given it back as often as it took it.
@@ -41,7 +41,7 @@ private:
 
     friend class HCondVar;
 
-    NativeLock* mpoCriticalSection = nullptr;  // owned; set by the constructor and never changed
+    HNativeLock* mpoCriticalSection = nullptr;  // owned; set by the constructor and never changed
 };
 
 /// Holds one level of ownership of a `HMutex` for a scope, or nothing.

@@ -104,7 +104,7 @@ public:
     void WriteUnlock() const override;
 
 private:
-    friend struct ReadWriteSteps;
+    friend struct HReadWriteSteps;
 
     mutable unsigned int mnReaders = 0;  // read locks of all threads, nested too; guarded by moReaderMutex
     mutable unsigned int mnWriters = 0;  // depth of the write lock; guarded by moWriterMutex
@@ -133,7 +133,7 @@ public:
     void WriteUnlock() const override;
 
 private:
-    friend struct ReadWriteSteps;
+    friend struct HReadWriteSteps;
 
     mutable unsigned int mnReaders = 0;  // as in HReadPrefMutex, all of them
     mutable unsigned int mnWriters = 0;

@@ -7,7 +7,7 @@
 
 #include "zanbase/export.h"
 
-struct NativeSemaphore;
+struct HNativeSemaphore;
 
 /// A counting semaphore: `Lock` takes a unit and waits while there is none, `Unlock` gives one.
 ///
@@ -43,7 +43,7 @@ private:
     HSemaphore(const HSemaphore&) {}
     HSemaphore& operator=(const HSemaphore&) { return *this; }
 
-    NativeSemaphore* mpoHandle = nullptr;  // owned; set by the constructor and never changed
+    HNativeSemaphore* mpoHandle = nullptr;  // owned; set by the constructor and never changed
 };
 
 /// Holds one unit of a `HSemaphore` for a scope, or nothing.

@@ -7,7 +7,7 @@
 
 #include "zanbase/export.h"
 
-struct NativeThread;
+struct HNativeThread;
 
 /// How much of a busy processor a thread gets, from least to most. Normal is what the process itself has; a
 /// value beyond the last counts as normal. On Linux the values stand for a nice value of the thread, 39, 10
@@ -124,7 +124,7 @@ protected:
     static void _Run_(HThread* thread);
 
 private:
-    std::atomic<NativeThread*> mpoThread{
+    std::atomic<HNativeThread*> mpoThread{
         nullptr};  // null while idle; the thread itself empties it at its end
     std::atomic<HThreadPriority> mnPriority;
 };

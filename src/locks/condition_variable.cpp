@@ -7,22 +7,22 @@
 #include "locks/milliseconds.h"
 #include "platform/condition.h"
 
-HCondVar::HCondVar() : mpoCondition(static_cast<NativeCondition*>(std::malloc(sizeof(NativeCondition)))) {
+HCondVar::HCondVar() : mpoCondition(static_cast<HNativeCondition*>(std::malloc(sizeof(HNativeCondition)))) {
     if (mpoCondition == nullptr) throw std::bad_alloc();
-    OpenCondition(mpoCondition);
+    InitCondition(mpoCondition);
 }
 
 HCondVar::~HCondVar() { std::free(mpoCondition); }
 
-void HCondVar::Signal() const { WakeOne(mpoCondition); }
+void HCondVar::Signal() const { SignalCondition(mpoCondition); }
 
-void HCondVar::Broadcast() const { WakeAll(mpoCondition); }
+void HCondVar::Broadcast() const { BroadcastCondition(mpoCondition); }
 
 void HCondVar::Wait(const HMutex& mutex) const {
     // Without a limit there is nothing to tell but that it woke up.
-    static_cast<void>(SleepOn(mpoCondition, mutex.mpoCriticalSection, kForever));
+    static_cast<void>(WaitOnCondition(mpoCondition, mutex.mpoCriticalSection, kForever));
 }
 
 bool HCondVar::TryWait(const HMutex& mutex, double seconds) const {
-    return SleepOn(mpoCondition, mutex.mpoCriticalSection, MillisecondsIn(seconds));
+    return WaitOnCondition(mpoCondition, mutex.mpoCriticalSection, MillisecondsIn(seconds));
 }

@@ -2,7 +2,7 @@
 #ifndef ZANBASE_LOCKS_MILLISECONDS_H
 #define ZANBASE_LOCKS_MILLISECONDS_H
 
-#include "platform/condition.h"  // kForever
+#include "platform/wait_limit.h"
 
 // Whole milliseconds, cut and not rounded: 1.9999 gives 1999 and 0.0009 gives 0. What the platform's count
 // can't hold is settled before the conversion, which would be undefined for it: negative times and what is

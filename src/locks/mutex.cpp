@@ -6,20 +6,20 @@
 #include "platform/lock.h"
 #include "zanbase/allocation.h"
 
-HMutex::HMutex() : mpoCriticalSection(static_cast<NativeLock*>(HMalloc(sizeof(NativeLock)))) {
-    OpenLock(mpoCriticalSection);
+HMutex::HMutex() : mpoCriticalSection(static_cast<HNativeLock*>(HMalloc(sizeof(HNativeLock)))) {
+    InitLock(mpoCriticalSection);
 }
 
 HMutex::~HMutex() {
-    CloseLock(mpoCriticalSection);
+    DestroyLock(mpoCriticalSection);
     std::free(mpoCriticalSection);
 }
 
-void HMutex::Lock() const { TakeLock(mpoCriticalSection); }
+void HMutex::Lock() const { AcquireLock(mpoCriticalSection); }
 
-bool HMutex::TryLock() const { return TryTakeLock(mpoCriticalSection); }
+bool HMutex::TryLock() const { return TryAcquireLock(mpoCriticalSection); }
 
-void HMutex::Unlock() const { GiveLock(mpoCriticalSection); }
+void HMutex::Unlock() const { ReleaseLock(mpoCriticalSection); }
 
 HMutexLock::HMutexLock(const HMutex* mutex) : mpoMutex(mutex) {
     if (mpoMutex != nullptr) mpoMutex->Lock();

@@ -6,7 +6,7 @@
 
 namespace {
 
-using Downgrade = ReadWriteSteps::Downgrade;
+using Downgrade = HReadWriteSteps::Downgrade;
 
 unsigned long long Self() { return HThread::GetCurrentThreadId(); }
 
@@ -16,17 +16,17 @@ HReadWriteMutex::~HReadWriteMutex() = default;
 
 HReadPrefMutex::HReadPrefMutex() = default;
 HReadPrefMutex::~HReadPrefMutex() = default;
-void HReadPrefMutex::ReadLock() const { ReadWriteSteps::ReadLockAtOnce(*this, Self()); }
-void HReadPrefMutex::ReadUnlock() const { ReadWriteSteps::ReadUnlock<Downgrade::kAllowed>(*this, Self()); }
-void HReadPrefMutex::WriteLock() const { ReadWriteSteps::WriteLock(*this, Self()); }
-void HReadPrefMutex::WriteUnlock() const { ReadWriteSteps::WriteUnlock<Downgrade::kAllowed>(*this, Self()); }
+void HReadPrefMutex::ReadLock() const { HReadWriteSteps::ReadLockAtOnce(*this, Self()); }
+void HReadPrefMutex::ReadUnlock() const { HReadWriteSteps::ReadUnlock<Downgrade::kAllowed>(*this, Self()); }
+void HReadPrefMutex::WriteLock() const { HReadWriteSteps::WriteLock(*this, Self()); }
+void HReadPrefMutex::WriteUnlock() const { HReadWriteSteps::WriteUnlock<Downgrade::kAllowed>(*this, Self()); }
 
 HWritePrefMutex::HWritePrefMutex() = default;
 HWritePrefMutex::~HWritePrefMutex() = default;
-void HWritePrefMutex::ReadLock() const { ReadWriteSteps::ReadLockInTurn(*this, Self()); }
-void HWritePrefMutex::ReadUnlock() const { ReadWriteSteps::ReadUnlock<Downgrade::kBarred>(*this, Self()); }
-void HWritePrefMutex::WriteLock() const { ReadWriteSteps::WriteLock(*this, Self()); }
-void HWritePrefMutex::WriteUnlock() const { ReadWriteSteps::WriteUnlock<Downgrade::kBarred>(*this, Self()); }
+void HWritePrefMutex::ReadLock() const { HReadWriteSteps::ReadLockInTurn(*this, Self()); }
+void HWritePrefMutex::ReadUnlock() const { HReadWriteSteps::ReadUnlock<Downgrade::kBarred>(*this, Self()); }
+void HWritePrefMutex::WriteLock() const { HReadWriteSteps::WriteLock(*this, Self()); }
+void HWritePrefMutex::WriteUnlock() const { HReadWriteSteps::WriteUnlock<Downgrade::kBarred>(*this, Self()); }
 
 HReaderLock::HReaderLock(const HReadWriteMutex* mutex) : mpoMutex(mutex) {
     if (mpoMutex != nullptr) mpoMutex->ReadLock();

@@ -24,7 +24,7 @@
 
 #include <atomic>
 
-struct ReadWriteSteps {
+struct HReadWriteSteps {
     using Thread = unsigned long long;
     static constexpr Thread kNobody = 0xFFFFFFFFFFFFFFFF;  // no thread has this identifier
 
@@ -35,7 +35,7 @@ struct ReadWriteSteps {
     template <class Lock>
     static void ReadLockAtOnce(Lock& lock, Thread self) {
         lock.moReaderMutex.Lock();
-        if (!Nests(lock, self)) {
+        if (!TryNestedReadLock(lock, self)) {
             if (lock.mnReaders == 0 && WriterOf(lock) != self) {
                 lock.moReaderMutex.Unlock();
                 lock.moGate.Lock();
@@ -53,7 +53,7 @@ struct ReadWriteSteps {
     template <class Lock>
     static void ReadLockInTurn(Lock& lock, Thread self) {
         lock.moReaderMutex.Lock();
-        const bool nests = Nests(lock, self);
+        const bool nests = TryNestedReadLock(lock, self);
         lock.moReaderMutex.Unlock();
         if (nests) return;
         lock.moGate.Lock();
@@ -108,7 +108,7 @@ private:
 
     // True, and one more counted, if the thread reads already.
     template <class Lock>
-    static bool Nests(Lock& lock, Thread self) {
+    static bool TryNestedReadLock(Lock& lock, Thread self) {
         const auto entry = lock.moReaderThreads.find(self);
         if (entry == lock.moReaderThreads.end()) return false;
         ++lock.mnReaders;

@@ -7,15 +7,15 @@
 
 HSemaphore::HSemaphore(unsigned int count) : mpoHandle(NewSemaphore(count)) {}
 
-HSemaphore::~HSemaphore() { EndSemaphore(mpoHandle); }
+HSemaphore::~HSemaphore() { DeleteSemaphore(mpoHandle); }
 
 void HSemaphore::Lock() const {
-    static_cast<void>(TakeUnit(mpoHandle, kForever));  // without a limit it returns with a unit only
+    static_cast<void>(AcquireUnit(mpoHandle, kForever));  // without a limit it returns with a unit only
 }
 
-bool HSemaphore::TryLock(double seconds) const { return TakeUnit(mpoHandle, MillisecondsIn(seconds)); }
+bool HSemaphore::TryLock(double seconds) const { return AcquireUnit(mpoHandle, MillisecondsIn(seconds)); }
 
-void HSemaphore::Unlock() const { GiveUnit(mpoHandle); }
+void HSemaphore::Unlock() const { ReleaseUnit(mpoHandle); }
 
 HSemaphoreLock::HSemaphoreLock(HSemaphore* semaphore) : mpoSemaphore(semaphore) {
     if (mpoSemaphore != nullptr) mpoSemaphore->Lock();

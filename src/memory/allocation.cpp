@@ -32,7 +32,7 @@ public:
             std::fputs("zanbase: memory exhausted and no handler installed\n", stderr);
             std::abort();
         }
-        PauseFor(mnPauseMs);
+        SleepFor(mnPauseMs);
         mnPauseMs *= 2;
     }
 

@@ -15,6 +15,6 @@ WallClock ReadWallClock() noexcept;
 unsigned int ReadTicks() noexcept;
 
 // Returns after `ms` milliseconds or a little later, never earlier; 0 lets another ready thread run first.
-void PauseFor(unsigned int ms) noexcept;
+void SleepFor(unsigned int ms) noexcept;
 
 #endif

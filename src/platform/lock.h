@@ -4,25 +4,25 @@
 
 // Storage for one lock. It holds no pointer to itself and needs no alignment beyond this. The back end alone
 // knows what lies inside.
-struct NativeLock {
+struct HNativeLock {
     alignas(8) unsigned char storage[64];
 };
 
 // Makes the lock ready and free. Can't fail.
-void OpenLock(NativeLock* lock) noexcept;
+void InitLock(HNativeLock* lock) noexcept;
 
 // Ends a lock that nobody owns.
-void CloseLock(NativeLock* lock) noexcept;
+void DestroyLock(HNativeLock* lock) noexcept;
 
 // Waits until the calling thread owns the lock; a thread that owns it already passes at once and owes one
-// more GiveLock. A lock whose owner was ended by EndThread stays held for ever. A waiter that was ended may
+// more ReleaseLock. A lock whose owner was ended by KillThread stays held for ever. A waiter that was ended may
 // hold up later waiters on some systems; where it doesn't, the back end says so.
-void TakeLock(NativeLock* lock) noexcept;
+void AcquireLock(HNativeLock* lock) noexcept;
 
 // The same without waiting; false if another thread owns the lock.
-bool TryTakeLock(NativeLock* lock) noexcept;
+bool TryAcquireLock(HNativeLock* lock) noexcept;
 
 // Gives back one level of the calling thread's ownership; at level zero the lock is free.
-void GiveLock(NativeLock* lock) noexcept;
+void ReleaseLock(HNativeLock* lock) noexcept;
 
 #endif

@@ -10,11 +10,11 @@
 #include <atomic>
 #include <string>
 
-struct NativeThread;
-using ThreadSlot = std::atomic<NativeThread*>;
+struct HNativeThread;
+using ThreadSlot = std::atomic<HNativeThread*>;
 
-// Starts a thread at the process's own importance that calls body(argument); nothing but what
-// PassThreadExitOn throws may leave the body. 0, or the system's number for what went wrong, with the slot
+// Starts a thread at the process's own priority, level 3, that calls body(argument); nothing but what
+// RethrowThreadExit throws may leave the body. 0, or the system's number for what went wrong, with the slot
 // left empty.
 int StartThread(ThreadSlot& slot, void (*body)(void*), void* argument) noexcept;
 
@@ -23,28 +23,28 @@ std::string SystemErrorText(int error);
 
 // Waits until the thread in the slot has ended, with the destructors of its thread-local objects. Returns at
 // once if the slot is empty or leads to the calling thread.
-void AwaitThread(ThreadSlot& slot) noexcept;
+void JoinThread(ThreadSlot& slot) noexcept;
 
 // Ends the thread in the slot where it stands, or, if it has not yet entered its body, before it does: no
 // destructor, handler or exit routine of it runs, and what it holds stays held. Returns when no instruction
 // of it can run any more, with the slot empty; does not return on the thread in the slot itself.
-void EndThread(ThreadSlot& slot) noexcept;
+void KillThread(ThreadSlot& slot) noexcept;
 
 // Empties the slot; the thread runs on and can't be reached any more. Who waits for it already still does.
-void ForgetThread(ThreadSlot& slot) noexcept;
+void DetachThread(ThreadSlot& slot) noexcept;
 
-// Gives the thread in the slot an importance: -15, -2, -1, 0 (the process's own), 1, 2 or 15. Nothing tells
-// whether the system refused.
-void SetThreadImportance(ThreadSlot& slot, int importance) noexcept;
+// Sets the priority of the thread in the slot: a level from 0 (idle) to 6 (time-critical); 3 is the priority of
+// the process itself. Does nothing if the slot is empty. A refusal of the system is not reported.
+void SetNativePriority(ThreadSlot& slot, int level) noexcept;
 
 // To be called first in every `catch (...)` that may stand around the code of a body: where the system ends a
 // thread by an exception of its own, this passes it on, so that the thread can end.
-void PassThreadExitOn();
+void RethrowThreadExit();
 
 // A number that no other living thread of the system has.
-unsigned int CurrentThreadNumber() noexcept;
+unsigned int CurrentThreadId() noexcept;
 
 // Lets another ready thread run first.
-void GiveWay() noexcept;
+void YieldThread() noexcept;
 
 #endif

@@ -18,7 +18,7 @@ inline void RunReported(const char* where, void (*body)(void*), void* argument) 
         std::printf("%s Uncaught exception: %s\n", where, exception.what());
         return;
     } catch (...) {
-        PassThreadExitOn();
+        RethrowThreadExit();
     }
     std::printf("%s Unknown exception.\n", where);
 }

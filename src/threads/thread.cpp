@@ -10,10 +10,9 @@ static_assert(sizeof(ThreadSlot) == sizeof(void*));
 
 namespace {
 
-// The platform's importance for each priority.
-int ImportanceOf(HThreadPriority priority) {
-    constexpr int kImportances[] = {-15, -2, -1, 0, 1, 2, 15};
-    return priority <= HThreadPriorityTimeCritical ? kImportances[priority] : 0;
+// The platform's level for a priority; values beyond the last count as normal.
+int LevelOf(HThreadPriority priority) {
+    return static_cast<int>(priority <= HThreadPriorityTimeCritical ? priority : HThreadPriorityNormal);
 }
 
 }  // namespace
@@ -35,7 +34,7 @@ bool HThread::Start(bool) {
         return false;
     }
     const HThreadPriority priority = mnPriority;
-    if (priority != HThreadPriorityNormal) SetThreadImportance(mpoThread, ImportanceOf(priority));
+    if (priority != HThreadPriorityNormal) SetNativePriority(mpoThread, LevelOf(priority));
     return IsRunning();
 }
 
@@ -43,19 +42,19 @@ void HThread::Stop() {}
 
 bool HThread::IsRunning() const { return mpoThread.load(std::memory_order_acquire) != nullptr; }
 
-void HThread::Wait() { AwaitThread(mpoThread); }
+void HThread::Wait() { JoinThread(mpoThread); }
 
-void HThread::Kill() { EndThread(mpoThread); }
+void HThread::Kill() { KillThread(mpoThread); }
 
 void HThread::SetPriority(HThreadPriority priority) {
-    if (mnPriority.exchange(priority) != priority) SetThreadImportance(mpoThread, ImportanceOf(priority));
+    if (mnPriority.exchange(priority) != priority) SetNativePriority(mpoThread, LevelOf(priority));
 }
 
-unsigned long long HThread::GetCurrentThreadId() { return CurrentThreadNumber(); }
+unsigned long long HThread::GetCurrentThreadId() { return CurrentThreadId(); }
 
-void(HThread::Yield)() { GiveWay(); }
+void(HThread::Yield)() { YieldThread(); }
 
-void HThread::DestroyThread() { ForgetThread(mpoThread); }
+void HThread::DestroyThread() { DetachThread(mpoThread); }
 
 // The platform empties mpoThread when this returns, if it still leads to this thread, and that is the last
 // access to the object. It isn't done here, by DestroyThread, because the object may own another thread by

@@ -15,7 +15,7 @@ void SleepByTicks(int microseconds) {
     const unsigned int ticks_to_wait = std::max(amount / 10000, 1U);
     const unsigned int start = ReadTicks();
     do {
-        PauseFor(amount / 1000);
+        SleepFor(amount / 1000);
     } while (ReadTicks() - start < ticks_to_wait);
 }
 

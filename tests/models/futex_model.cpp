@@ -7,9 +7,9 @@
 #include <utility>
 
 #include "models/explorer.h"
-#include "platform/posix/futex_condition.h"
-#include "platform/posix/futex_lock.h"
-#include "platform/posix/futex_semaphore.h"
+#include "platform/linux/futex_condition.h"
+#include "platform/linux/futex_lock.h"
+#include "platform/linux/futex_semaphore.h"
 
 namespace {
 
@@ -74,8 +74,8 @@ struct System {
     using Word = ::Word;
     using Owner = ::Owner;
     using Deadline = const int*;
-    using WakeDebt = Debt<kDebt, Fault::kForgottenDebts>;
-    using SignalDebt = Debt<kSignalDebt, Fault::kForgottenSignalDebts>;
+    using PendingWakeup = Debt<kDebt, Fault::kForgottenDebts>;
+    using PendingSignal = Debt<kSignalDebt, Fault::kForgottenSignalDebts>;
     static constexpr int kEverySleeper = kThreads;
 
     template <class Attempt>
@@ -134,7 +134,7 @@ struct System {
     static void SleepShortly(Word& word, unsigned int expected) { SleepWhile(word, expected, &kSoon); }
 };
 
-// Ends a thread, which passes on what it owes as PassWakeUpOn does.
+// Ends a thread, which passes on what it owes as ForwardPendingWakeups does.
 bool Kill(State& state, std::size_t thread) {
     if (state.words[kMishap] != 0) return false;
     state.words[kMishap] = state.threads[thread].dead = true;
@@ -216,8 +216,8 @@ TEST(FutexModel, ConditionIsWhole) {
     // Wait for one and take it, add one, wake one, wake all.
     explorer.call = [](char call) {
         FutexCondition<System> condition;
-        if (call == 'o') return condition.WakeOne();
-        if (call == 'a') return condition.WakeAll();
+        if (call == 'o') return condition.Signal();
+        if (call == 'a') return condition.Broadcast();
         const SimpleLock lock;
         lock.Take();
         while (call == 'W' && Get(kItems) == 0) condition.Sleep(lock, nullptr);

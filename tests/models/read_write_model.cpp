@@ -8,7 +8,7 @@
 
 namespace {
 
-using Downgrade = ReadWriteSteps::Downgrade;
+using Downgrade = HReadWriteSteps::Downgrade;
 
 // The fields; then what the model notes of each thread: what it holds, and whether as a writer it has let
 // readers in.
@@ -62,7 +62,7 @@ struct Number {
 struct Writer {
     Value load(std::memory_order) const {
         if (fault != Fault::kReaderLooksAtDepth || call != 'R') return Get(kWriter);
-        return Get(kWriters) == 0 ? ReadWriteSteps::kNobody : 0;
+        return Get(kWriters) == 0 ? HReadWriteSteps::kNobody : 0;
     }
     void store(Value value, std::memory_order) const { Set(kWriter, value); }
 };
@@ -96,23 +96,23 @@ struct Lock {
 // the start of its own read lock.
 template <Downgrade kDowngrade>
 void Make(char letter) {
-    constexpr auto kReadLock = kDowngrade == Downgrade::kAllowed ? ReadWriteSteps::ReadLockAtOnce<Lock>
-                                                                 : ReadWriteSteps::ReadLockInTurn<Lock>;
+    constexpr auto kReadLock = kDowngrade == Downgrade::kAllowed ? HReadWriteSteps::ReadLockAtOnce<Lock>
+                                                                 : HReadWriteSteps::ReadLockInTurn<Lock>;
     Lock lock;
     const std::size_t self = explorer.self;
     call = letter;
     if (letter == 'R' || letter == 'W') Add((letter == 'R' ? kReads : kWrites) + self, -1);
     if (letter == 'r' && Get(kWrites + self) != 0) Set(kOpened + self, 1);
     if (letter == 'r') kReadLock(lock, self);
-    if (letter == 'w') ReadWriteSteps::WriteLock(lock, self);
-    if (letter == 'R') ReadWriteSteps::ReadUnlock<kDowngrade>(lock, self);
-    if (letter == 'W') ReadWriteSteps::WriteUnlock<kDowngrade>(lock, self);
+    if (letter == 'w') HReadWriteSteps::WriteLock(lock, self);
+    if (letter == 'R') HReadWriteSteps::ReadUnlock<kDowngrade>(lock, self);
+    if (letter == 'W') HReadWriteSteps::WriteUnlock<kDowngrade>(lock, self);
     if (letter == 'r' || letter == 'w') ++explorer.now.words[(letter == 'r' ? kReads : kWrites) + self];
 }
 
 State Free() {
     State state;
-    state.words[kWriter] = ReadWriteSteps::kNobody;
+    state.words[kWriter] = HReadWriteSteps::kNobody;
     state.words[kResource] = state.words[kGate] = 1;
     return state;
 }

@@ -1,12 +1,12 @@
 // Sleeping on a word until a wake-up or an absolute time.
-#include "platform/posix/futex.h"
+#include "platform/linux/futex.h"
 
 #include <cerrno>
 #include <tuple>
 
-#include "platform/posix/restartable.h"
+#include "platform/linux/restartable.h"
 
-ZANBASE_FAST_THREAD_LOCAL WakeDebts toWakeDebts = {nullptr, nullptr, 0};
+ZANBASE_FAST_THREAD_LOCAL PendingWakeups toPendingWakeups = {nullptr, nullptr, 0};
 
 namespace {
 
@@ -56,8 +56,8 @@ timespec DeadlineIn(unsigned int ms) noexcept {
     return deadline;
 }
 
-void PassWakeUpOn() noexcept {
-    const WakeDebts debts = toWakeDebts;
+void ForwardPendingWakeups() noexcept {
+    const PendingWakeups debts = toPendingWakeups;
     if (debts.mpoWord != nullptr) {
         // It may have told an owner to wake sleepers, and not yet kept that owner from overwriting it. Others
         // rely on what they read there; where it fails, they do so for a short sleep only.

@@ -11,27 +11,18 @@
 #include <signal.h>
 #include <sys/resource.h>
 
-#include "platform/posix/kill.h"
-#include "platform/posix/thread_block.h"
+#include "platform/linux/thread_block.h"
+#include "platform/linux/thread_kill.h"
 
 namespace {
 
-// What each importance adds to the nice value of the process.
-int NiceOf(int importance) noexcept {
-    struct Step {
-        int importance;
-        int nice;
-    };
-    constexpr Step kSteps[] = {{-15, 39}, {-2, 10}, {-1, 5}, {1, -5}, {2, -10}, {15, -39}};
-    const auto* const step = std::find_if(std::begin(kSteps), std::end(kSteps),
-                                          [=](const Step& each) { return each.importance == importance; });
-    return step != std::end(kSteps) ? step->nice : 0;
-}
+// What each priority level adds to the nice value of the process.
+constexpr int kNiceOffsets[] = {39, 10, 5, 0, -5, -10, -39};
 
 // Only what raises the nice value is allowed to everybody.
-void ApplyImportance(const NativeThread* block) noexcept {
+void ApplyPriority(const HNativeThread* block) noexcept {
     const int own = getpriority(PRIO_PROCESS, static_cast<id_t>(getpid()));  // that of the first thread
-    const int nice = std::clamp(own + NiceOf(block->mnImportance), -20, 19);
+    const int nice = std::clamp(own + kNiceOffsets[block->mnPriority], -20, 19);
     setpriority(PRIO_PROCESS, block->mnNumber, nice);
 }
 
@@ -39,7 +30,7 @@ void ApplyImportance(const NativeThread* block) noexcept {
 // that is there already, as the sanitizers bring, stays.
 class HandlerStack {
 public:
-    explicit HandlerStack(NativeThread* block) noexcept {
+    explicit HandlerStack(HNativeThread* block) noexcept {
         stack_t mine{};
         mine.ss_sp = block->mpoHandlerStack;
         mine.ss_size = kHandlerStackBytes;
@@ -60,34 +51,34 @@ private:
     bool mbMine;
 };
 
-void FirstStep(NativeThread* block) noexcept {
-    AdmitEndSignal();
+void FirstStep(HNativeThread* block) noexcept {
+    UnblockEndSignal();
     bool is_awaited = false;
     {
         const BlockLock lock;
         toSelf.mpoBlock = block;
         block->moThread = pthread_self();
-        block->mnNumber = CurrentThreadNumber();
+        block->mnNumber = CurrentThreadId();
         block->mState = ThreadState::Live;
-        if (block->mbImportanceDue) ApplyImportance(block);
+        if (block->mbPriorityPending) ApplyPriority(block);
         is_awaited = block->mbEndRequested;
     }
-    if (is_awaited) Announce(block);
+    if (is_awaited) NotifyWaiters(block);
 }
 
 // Closes the block when the body has returned, or is being left because the thread asked for its own end.
 class LastStep {
 public:
-    explicit LastStep(NativeThread* block) noexcept : mpoBlock(block) {}
-    ~LastStep() { LeaveBlock(mpoBlock); }
+    explicit LastStep(HNativeThread* block) noexcept : mpoBlock(block) {}
+    ~LastStep() { CloseBlock(mpoBlock); }
     LastStep(const LastStep&) = delete;
     LastStep& operator=(const LastStep&) = delete;
 
 private:
-    NativeThread* mpoBlock;
+    HNativeThread* mpoBlock;
 };
 
-void RunBody(NativeThread* block) {
+void RunBody(HNativeThread* block) {
     const LastStep last(block);
     const HandlerStack stack(block);
     FirstStep(block);
@@ -95,7 +86,7 @@ void RunBody(NativeThread* block) {
 }
 
 void* Enter(void* block) {
-    RunUntilDeath(RunBody, static_cast<NativeThread*>(block));
+    RunUntilDeath(RunBody, static_cast<HNativeThread*>(block));
     return nullptr;
 }
 
@@ -103,16 +94,16 @@ void* Enter(void* block) {
 
 int StartThread(ThreadSlot& slot, void (*body)(void*), void* argument) noexcept {
     const Shield shield;
-    TakeFaultSignals();
+    InstallFaultHandlers();
     ChooseEndSignal();
     JoinTheUnjoined();
-    NativeThread* const block = OpenBlock(slot);
+    HNativeThread* const block = OpenBlock(slot);
     if (block == nullptr) return ENOMEM;
     block->mpfnBody = body;
     block->mpoArgument = argument;
     pthread_t thread{};  // not looked at: the thread may be over and its block in other use by now
     const int error = pthread_create(&thread, nullptr, Enter, block);
-    if (error != 0) DropBlock(block);
+    if (error != 0) AbandonBlock(block);
     return error;
 }
 
@@ -121,31 +112,31 @@ std::string SystemErrorText(int error) {
     return strerror_r(error, text, sizeof text);
 }
 
-void AwaitThread(ThreadSlot& slot) noexcept {
-    NativeThread* const block = JoinWaiters(slot);
-    if (block != nullptr && block != toSelf.mpoBlock) SeeThreadOut(block);
+void JoinThread(ThreadSlot& slot) noexcept {
+    HNativeThread* const block = AddWaiter(slot);
+    if (block != nullptr && block != toSelf.mpoBlock) WaitForThreadEnd(block);
 }
 
-void ForgetThread(ThreadSlot& slot) noexcept {
+void DetachThread(ThreadSlot& slot) noexcept {
     const BlockLock lock;
-    if (NativeThread* const block = slot.exchange(nullptr, std::memory_order_acq_rel))
+    if (HNativeThread* const block = slot.exchange(nullptr, std::memory_order_acq_rel))
         block->mpoSlot = nullptr;
 }
 
-void SetThreadImportance(ThreadSlot& slot, int importance) noexcept {
+void SetNativePriority(ThreadSlot& slot, int level) noexcept {
     const BlockLock lock;
-    NativeThread* const block = slot.load(std::memory_order_relaxed);
+    HNativeThread* const block = slot.load(std::memory_order_relaxed);
     if (block == nullptr) return;
-    block->mnImportance = importance;
+    block->mnPriority = level;
     if (block->mState == ThreadState::Live) {
-        ApplyImportance(block);
+        ApplyPriority(block);
     } else {
-        block->mbImportanceDue = true;
+        block->mbPriorityPending = true;
     }
 }
 
 // The exception of pthread_exit has no object, which a sanitizer takes for a reference to nothing.
-__attribute__((no_sanitize("undefined"))) void PassThreadExitOn() {
+__attribute__((no_sanitize("undefined"))) void RethrowThreadExit() {
     try {
         throw;
     } catch (abi::__forced_unwind&) {
@@ -154,11 +145,11 @@ __attribute__((no_sanitize("undefined"))) void PassThreadExitOn() {
     }
 }
 
-unsigned int CurrentThreadNumber() noexcept {
+unsigned int CurrentThreadId() noexcept {
     // The system call costs thirty times as much as the copy, which the child of a fork drops.
     if (__builtin_expect(toSelf.mnNumber == 0, 0))
         toSelf.mnNumber = static_cast<unsigned int>(syscall(SYS_gettid));
     return toSelf.mnNumber;
 }
 
-void GiveWay() noexcept { sched_yield(); }
+void YieldThread() noexcept { sched_yield(); }

@@ -15,8 +15,8 @@
 //
 // A thread may be ended at any instruction. Before its change of mnUnits it has no unit and has given none;
 // the wake-up that it may have swallowed, or not yet sent, is passed on (see futex.h).
-#ifndef ZANBASE_PLATFORM_POSIX_FUTEX_SEMAPHORE_H
-#define ZANBASE_PLATFORM_POSIX_FUTEX_SEMAPHORE_H
+#ifndef ZANBASE_PLATFORM_LINUX_FUTEX_SEMAPHORE_H
+#define ZANBASE_PLATFORM_LINUX_FUTEX_SEMAPHORE_H
 
 #include <atomic>
 
@@ -38,7 +38,7 @@ public:
     // giver on the same processor would come later for it.
     bool Take(typename System::Deadline deadline) {
         if (TryTake()) return true;
-        const typename System::WakeDebt debt(mnUnits);
+        const typename System::PendingWakeup debt(mnUnits);
         unsigned int seen = mnUnits.load(std::memory_order_relaxed);
         for (;;) {
             if ((seen & kMost) != 0) {
@@ -53,7 +53,7 @@ public:
     }
 
     void Give() {
-        const typename System::WakeDebt debt(mnUnits);
+        const typename System::PendingWakeup debt(mnUnits);
         unsigned int seen = mnUnits.load(std::memory_order_relaxed);
         do {
             if ((seen & kMost) == kMost) return;

@@ -9,18 +9,11 @@
 // It needs a C library that registers its threads for such sequences and a kernel that has the barrier for
 // them. Elsewhere, and under the thread sanitizer, which can't see into the sequence, StoreIfStill() always
 // fails and its callers go their ordinary way.
-#ifndef ZANBASE_PLATFORM_POSIX_RESTARTABLE_H
-#define ZANBASE_PLATFORM_POSIX_RESTARTABLE_H
+#ifndef ZANBASE_PLATFORM_LINUX_RESTARTABLE_H
+#define ZANBASE_PLATFORM_LINUX_RESTARTABLE_H
 
-#include "platform/posix/futex.h"
-
-#if defined(__SANITIZE_THREAD__)
-#define ZANBASE_THREAD_SANITIZER 1
-#elif defined(__has_feature)
-#if __has_feature(thread_sanitizer)
-#define ZANBASE_THREAD_SANITIZER 1
-#endif
-#endif
+#include "platform/linux/build.h"
+#include "platform/linux/futex.h"
 
 #if defined(__x86_64__) && defined(__LP64__) && !defined(ZANBASE_THREAD_SANITIZER) && __has_include(<sys/rseq.h>)
 

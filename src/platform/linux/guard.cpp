@@ -8,8 +8,8 @@
 #include <signal.h>
 #include <ucontext.h>
 
-#include "platform/posix/self.h"
-#include "platform/posix/thread_block.h"
+#include "platform/linux/thread_block.h"
+#include "platform/linux/thread_self.h"
 
 // Lives in RunGuarded's frame; the thread's frames form a stack.
 struct FaultFrame {
@@ -75,7 +75,7 @@ void OnFault(int signal, siginfo_t* info, void* context) {
     const bool sent = info->si_code <= 0;
     FaultFrame* const frame = toSelf.mpoFrame;
     if (sent || frame == nullptr || toSelf.mnShields != 0) return PassOn(signal, info, context, sent);
-    toWakeDebts = {};  // the code that noted them is left
+    toPendingWakeups = {};  // the code that noted them is left
     // The mask of the fault and not that of a handler, which may be the one that handed the fault on to this.
     pthread_sigmask(SIG_SETMASK, &static_cast<const ucontext_t*>(context)->uc_sigmask, nullptr);
     siglongjmp(frame->moPlace, 1);
@@ -83,7 +83,7 @@ void OnFault(int signal, siginfo_t* info, void* context) {
 
 }  // namespace
 
-void TakeFaultSignals() noexcept {
+void InstallFaultHandlers() noexcept {
     if (gbInstalled.load(std::memory_order_acquire)) return;
     const BlockLock lock;
     if (gbInstalled.load(std::memory_order_relaxed)) return;
@@ -98,7 +98,7 @@ void TakeFaultSignals() noexcept {
 }
 
 bool RunGuarded(void (*body)(void*), void* argument) {
-    TakeFaultSignals();
+    InstallFaultHandlers();
     FaultFrame frame;
     if (sigsetjmp(frame.moPlace, 0) != 0) return true;
     body(argument);

@@ -6,7 +6,7 @@
 
 #include <sched.h>
 
-#include "platform/posix/futex.h"
+#include "platform/linux/futex.h"
 
 namespace {
 
@@ -32,7 +32,7 @@ unsigned int ReadTicks() noexcept {
         static_cast<unsigned long long>(now.tv_nsec / kNanosecondsPerMillisecond));
 }
 
-void PauseFor(unsigned int ms) noexcept {
+void SleepFor(unsigned int ms) noexcept {
     if (ms == 0) {
         sched_yield();
         return;

@@ -1,5 +1,5 @@
 // Whether there are restartable stores, and the barrier that breaks them.
-#include "platform/posix/restartable.h"
+#include "platform/linux/restartable.h"
 
 #ifdef ZANBASE_RESTARTABLE_STORES
 

@@ -5,7 +5,7 @@
 // of the C library that it holds would stay held, malloc's for instance, and stop every other thread sooner
 // or later. So a thread that the signal finds inside the library's code is let go on, and is asked again a
 // moment later; see MayHoldLibraryLock.
-#include "platform/posix/kill.h"
+#include "platform/linux/thread_kill.h"
 
 #include <cerrno>
 #include <climits>
@@ -15,8 +15,8 @@
 #include <signal.h>
 
 #include "platform/clock.h"
-#include "platform/posix/library_code.h"
-#include "platform/posix/thread_block.h"
+#include "platform/linux/thread_block.h"
+#include "platform/linux/thread_kill_safety.h"
 
 namespace {
 
@@ -35,15 +35,15 @@ void DropThreadKeys() noexcept {
 }
 
 void OnEndSignal(int, siginfo_t*, void* context) {
-    NativeThread* const block = toSelf.mpoBlock;
+    HNativeThread* const block = toSelf.mpoBlock;
     if (block == nullptr || !block->mbEndRequested.load(std::memory_order_relaxed)) return;  // not from us
     if (toSelf.mnShields != 0) {
         toSelf.mbEndPending = true;
         return;
     }
     const int error = errno;
-    if (!MayHoldLibraryLock(block, context)) Die();
-    Announce(block);
+    if (!MayHoldLibraryLock(block, context)) ExitKilledThread();
+    NotifyWaiters(block);
     errno = error;
 }
 
@@ -74,11 +74,11 @@ int EndSignal() noexcept {
 
 // Asks a thread to die and waits until it has died or put that off. False if nothing is left to ask for, or
 // no signal to ask with.
-bool AskToDie(NativeThread* block) noexcept {
+bool AskToDie(HNativeThread* block) noexcept {
     unsigned int news = 0;
     {
         const BlockLock lock;
-        news = block->mnNews.load(std::memory_order_relaxed);
+        news = block->mnGeneration.load(std::memory_order_relaxed);
         if (!block->mbEndRequested) block->mnAskedAt = ReadTicks();
         block->mbEndRequested = true;
         if (block->mState == ThreadState::Live) {
@@ -90,7 +90,7 @@ bool AskToDie(NativeThread* block) noexcept {
             return false;
         }
     }
-    SleepUntilNews(block, news);
+    WaitForNewGeneration(block, news);
     return true;
 }
 
@@ -103,28 +103,28 @@ void ChooseEndSignal() noexcept {
     EndSignal();
 }
 
-void AdmitEndSignal() noexcept {
+void UnblockEndSignal() noexcept {
     sigset_t signals;
     sigemptyset(&signals);
     sigaddset(&signals, gnEndSignal);
     pthread_sigmask(SIG_UNBLOCK, &signals, nullptr);
 }
 
-void EndThread(ThreadSlot& slot) noexcept {
-    NativeThread* const block = JoinWaiters(slot);
+void KillThread(ThreadSlot& slot) noexcept {
+    HNativeThread* const block = AddWaiter(slot);
     if (block == nullptr) return;
-    if (block == toSelf.mpoBlock) Die();
+    if (block == toSelf.mpoBlock) ExitKilledThread();
     // Time for the thread to get on: asked again at once it might never leave its signal handler.
     constexpr timespec kPause{0, 50000};
     while (AskToDie(block)) nanosleep(&kPause, nullptr);
-    SeeThreadOut(block);
+    WaitForThreadEnd(block);
 }
 
-void Die() noexcept {
+void ExitKilledThread() noexcept {
     Shield::Raise();  // for ever
-    PassWakeUpOn();
+    ForwardPendingWakeups();
     DropThreadKeys();
-    DieInBlock(toSelf.mpoBlock);
+    MarkBlockDead(toSelf.mpoBlock);
 #ifdef ZANBASE_THREAD_SANITIZER
     siglongjmp(toWayOut, 1);
 #else
@@ -132,7 +132,7 @@ void Die() noexcept {
 #endif
 }
 
-void RunUntilDeath(void (*body)(NativeThread*), NativeThread* block) {
+void RunUntilDeath(void (*body)(HNativeThread*), HNativeThread* block) {
 #ifdef ZANBASE_THREAD_SANITIZER
     if (sigsetjmp(toWayOut, 1) != 0) return;
 #endif

@@ -1,18 +1,18 @@
-// The lock inside a NativeLock, and the numbers by which locks know their owners.
-#ifndef ZANBASE_PLATFORM_POSIX_SYSTEM_LOCK_H
-#define ZANBASE_PLATFORM_POSIX_SYSTEM_LOCK_H
+// The lock inside a HNativeLock, and the numbers by which locks know their owners.
+#ifndef ZANBASE_PLATFORM_LINUX_SYSTEM_LOCK_H
+#define ZANBASE_PLATFORM_LINUX_SYSTEM_LOCK_H
 
 #include <new>
 
+#include "platform/linux/futex_lock.h"
+#include "platform/linux/futex_system.h"
 #include "platform/lock.h"
-#include "platform/posix/futex_lock.h"
-#include "platform/posix/futex_system.h"
 
 using SystemLock = FutexLock<FutexSystem>;
-static_assert(sizeof(SystemLock) <= sizeof(NativeLock::storage) &&
-              alignof(SystemLock) <= alignof(NativeLock));
+static_assert(sizeof(SystemLock) <= sizeof(HNativeLock::storage) &&
+              alignof(SystemLock) <= alignof(HNativeLock));
 
-inline SystemLock& In(NativeLock* lock) noexcept {
+inline SystemLock& In(HNativeLock* lock) noexcept {
     return *std::launder(reinterpret_cast<SystemLock*>(lock->storage));
 }
 

@@ -10,7 +10,7 @@
 //
 // What remains: a thread that waits for room in a stream (a full pipe, say) dies with the stream locked, and
 // so does one that executes the program's code under a lock of the library, as a callback of dl_iterate_phdr.
-#include "platform/posix/library_code.h"
+#include "platform/linux/thread_kill_safety.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -24,7 +24,7 @@
 #include <ucontext.h>
 
 #include "platform/clock.h"
-#include "platform/posix/thread_block.h"
+#include "platform/linux/thread_block.h"
 
 namespace {
 
@@ -127,12 +127,12 @@ void FindLibraryCode() noexcept {
     if (goLibraryCode.count == 0) goLibraryCode = search.found;
 }
 
-bool MayHoldLibraryLock(NativeThread* block, const void* context) noexcept {
+bool MayHoldLibraryLock(HNativeThread* block, const void* context) noexcept {
     const auto& interrupted = *static_cast<const ucontext_t*>(context);
     const ThreadPlace place = PlaceIn(interrupted);
     constexpr std::uintptr_t kYieldBytes = 16;
     const bool yields = place.mnCode - reinterpret_cast<std::uintptr_t>(&sched_yield) < kYieldBytes;
-    const bool waits_for_us = toWakeDebts.mpoWord != nullptr || toWakeDebts.mpoCondition != nullptr;
+    const bool waits_for_us = toPendingWakeups.mpoWord != nullptr || toPendingWakeups.mpoCondition != nullptr;
     if (!InLibraryCode(place.mnCode) || yields || waits_for_us || IsCutShort(interrupted)) return false;
     const unsigned int now = ReadTicks();
     ThreadPlace& last = block->moLastPlace;

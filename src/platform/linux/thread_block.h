@@ -17,8 +17,8 @@
 //
 // One lock guards all blocks and lists. It is held for a few instructions, always under a shield, so no
 // thread is ended while it holds the lock or waits for it.
-#ifndef ZANBASE_PLATFORM_POSIX_THREAD_BLOCK_H
-#define ZANBASE_PLATFORM_POSIX_THREAD_BLOCK_H
+#ifndef ZANBASE_PLATFORM_LINUX_THREAD_BLOCK_H
+#define ZANBASE_PLATFORM_LINUX_THREAD_BLOCK_H
 
 #include <atomic>
 #include <cstddef>
@@ -26,7 +26,7 @@
 
 #include <pthread.h>
 
-#include "platform/posix/self.h"
+#include "platform/linux/thread_self.h"
 
 enum class ThreadState { Starting, Live, Leaving, Dead, Joining, Gone };
 
@@ -40,24 +40,26 @@ struct ThreadPlace {
 // included.
 constexpr std::size_t kHandlerStackBytes = 32768;
 
-struct NativeThread {
+constexpr int kNormalPriority = 3;  // the level of the process itself
+
+struct HNativeThread {
     // Constant while the thread lives.
     void (*mpfnBody)(void*);
     void* mpoArgument;
-    NativeThread* mpoOlder;  // the block made before this one
-    void* mpoHandlerStack;   // owned; kHandlerStackBytes
+    HNativeThread* mpoOlder;  // the block made before this one
+    void* mpoHandlerStack;    // owned; kHandlerStackBytes
 
     // Guarded by the block lock.
-    NativeThread* mpoNext;  // on the free list or the list of the unjoined
-    ThreadSlot* mpoSlot;    // the slot that leads here, or null
+    HNativeThread* mpoNext;  // on the free list or the list of the unjoined
+    ThreadSlot* mpoSlot;     // the slot that leads here, or null
     ThreadState mState;
-    unsigned int mnWaiters;  // threads inside AwaitThread or EndThread
+    unsigned int mnWaiters;  // threads inside JoinThread or KillThread
     pthread_t moThread;      // from Live on
     unsigned int mnNumber;   // from Live on
-    int mnImportance;        // the one wanted
-    bool mbImportanceDue;    // left to the first step to apply
+    int mnPriority;          // the one wanted
+    bool mbPriorityPending;  // left to the first step to apply
 
-    FutexWord mnNews;  // goes up, under the block lock, whenever waiters have to look again
+    FutexWord mnGeneration;  // goes up, under the block lock, whenever waiters have to look again
 
     std::atomic<bool> mbEndRequested;  // never taken back
     unsigned int mnAskedAt;            // the tick when it was requested first
@@ -80,29 +82,29 @@ public:
 };
 
 // A block in state Starting for `slot`, which leads to it from now on; null if there is no memory.
-NativeThread* OpenBlock(ThreadSlot& slot) noexcept;
+HNativeThread* OpenBlock(ThreadSlot& slot) noexcept;
 
 // No thread came of the block.
-void DropBlock(NativeThread* block) noexcept;
+void AbandonBlock(HNativeThread* block) noexcept;
 
 // The calling thread, that of the block, has come to the end of its body.
-void LeaveBlock(NativeThread* block) noexcept;
+void CloseBlock(HNativeThread* block) noexcept;
 
 // The calling thread, that of the block, dies, and waits for nobody any more.
-void DieInBlock(NativeThread* block) noexcept;
+void MarkBlockDead(HNativeThread* block) noexcept;
 
 // Makes the calling thread a waiter of the block in `slot`, unless it is its own, and gives the block; null
 // if the slot is empty.
-NativeThread* JoinWaiters(ThreadSlot& slot) noexcept;
+HNativeThread* AddWaiter(ThreadSlot& slot) noexcept;
 
 // Waits, as a waiter of the block, until its thread has ended, and leaves.
-void SeeThreadOut(NativeThread* block) noexcept;
+void WaitForThreadEnd(HNativeThread* block) noexcept;
 
 // Sleeps, as a waiter of the block and not under the block lock, until there is more news than `seen`.
-void SleepUntilNews(NativeThread* block, unsigned int seen) noexcept;
+void WaitForNewGeneration(HNativeThread* block, unsigned int seen) noexcept;
 
 // Tells the waiters to look again.
-void Announce(NativeThread* block) noexcept;
+void NotifyWaiters(HNativeThread* block) noexcept;
 
 // Joins the threads that died with nobody waiting.
 void JoinTheUnjoined() noexcept;

@@ -1,6 +1,6 @@
-// What a thread does for its part so that EndThread can end it.
-#ifndef ZANBASE_PLATFORM_POSIX_KILL_H
-#define ZANBASE_PLATFORM_POSIX_KILL_H
+// What a thread does for its part so that KillThread can end it.
+#ifndef ZANBASE_PLATFORM_LINUX_THREAD_KILL_H
+#define ZANBASE_PLATFORM_LINUX_THREAD_KILL_H
 
 #include "platform/thread.h"
 
@@ -8,10 +8,10 @@
 void ChooseEndSignal() noexcept;
 
 // Lets that signal through on the calling thread, whatever it took over from the thread that made it.
-void AdmitEndSignal() noexcept;
+void UnblockEndSignal() noexcept;
 
 // Calls body(block) as the first function of a thread. Returns when the body returns; when the thread dies,
 // it doesn't return, or returns with nothing left to do.
-void RunUntilDeath(void (*body)(NativeThread*), NativeThread* block);
+void RunUntilDeath(void (*body)(HNativeThread*), HNativeThread* block);
 
 #endif

@@ -3,7 +3,7 @@
 // The pseudo-terminal has two ends. We keep the terminal, xterm alone gets the other one. So whatever goes
 // wrong on its side, closes that end and wakes us; and when we close the terminal, xterm sees the end and
 // goes. Once it has a window, xterm types a line with the window's number into the terminal.
-#include "platform/posix/terminal_window.h"
+#include "platform/linux/terminal_window.h"
 
 #include <cerrno>
 #include <csignal>
@@ -112,7 +112,7 @@ void StartXterm(const char* terminal_name, int end) noexcept {
 }
 
 // Waits for the line that says that the window is there; false if the other end was closed before.
-bool WindowAppears(int terminal) noexcept {
+bool WaitForWindow(int terminal) noexcept {
     const unsigned int start = ReadTicks();
     pollfd news{terminal, POLLIN, 0};
     int ready = 0;
@@ -148,7 +148,7 @@ int OpenTerminalWindow() noexcept {
     tcsetattr(terminal.Get(), TCSANOW, &silent);
     StartXterm(std::strrchr(path, '/') + 1, end.Get());
     end.Close();
-    if (!WindowAppears(terminal.Get())) return -1;
+    if (!WaitForWindow(terminal.Get())) return -1;
     modes.c_iflag |= IUTF8;  // the erase key takes whole characters
     tcsetattr(terminal.Get(), TCSANOW, &modes);
     return terminal.Release();

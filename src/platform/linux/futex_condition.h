@@ -11,8 +11,8 @@
 // A thread may be ended at any instruction. A waiter that was woken and ended passes the wake-up on (see
 // futex.h); a waiter that was ended asleep leaves the bit set, which the next wake-up clears when it finds
 // nobody. So the condition stays whole.
-#ifndef ZANBASE_PLATFORM_POSIX_FUTEX_CONDITION_H
-#define ZANBASE_PLATFORM_POSIX_FUTEX_CONDITION_H
+#ifndef ZANBASE_PLATFORM_LINUX_FUTEX_CONDITION_H
+#define ZANBASE_PLATFORM_LINUX_FUTEX_CONDITION_H
 
 #include <atomic>
 
@@ -25,22 +25,22 @@ public:
     bool Sleep(const Lock& lock, typename System::Deadline deadline) {
         const unsigned int seen = mnSequence.fetch_or(1, std::memory_order_relaxed) | 1;
         lock.Give();
-        const typename System::SignalDebt debt(mnSequence, seen);
+        const typename System::PendingSignal debt(mnSequence, seen);
         const bool woken = System::SleepWhile(mnSequence, seen, deadline);
         lock.Take();
         return woken;
     }
 
-    void WakeOne() {
+    void Signal() {
         if ((mnSequence.load(std::memory_order_relaxed) & 1) == 0) return;
-        const typename System::WakeDebt debt(mnSequence);
+        const typename System::PendingWakeup debt(mnSequence);
         mnSequence.fetch_add(2, std::memory_order_relaxed);
         if (System::WakeSleepers(mnSequence, 1) == 0) WakeEverybody();
     }
 
-    void WakeAll() {
+    void Broadcast() {
         if ((mnSequence.load(std::memory_order_relaxed) & 1) == 0) return;
-        const typename System::WakeDebt debt(mnSequence);
+        const typename System::PendingWakeup debt(mnSequence);
         WakeEverybody();
     }
 

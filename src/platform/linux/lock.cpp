@@ -1,7 +1,7 @@
 // The re-entrant lock of this system: the algorithm of futex_lock.h in the caller's storage.
 #include "platform/lock.h"
 
-#include "platform/posix/system_lock.h"
+#include "platform/linux/system_lock.h"
 
 namespace {
 std::atomic<SystemLock::Thread> gnLastThread{0};
@@ -14,15 +14,15 @@ SystemLock::Thread NumberLockThread() noexcept {
     return tnLockThread;
 }
 
-void OpenLock(NativeLock* lock) noexcept {
+void InitLock(HNativeLock* lock) noexcept {
     AllowRestartableStores();
     new (lock->storage) SystemLock;
 }
 
-void CloseLock(NativeLock*) noexcept {}
+void DestroyLock(HNativeLock*) noexcept {}
 
-void TakeLock(NativeLock* lock) noexcept { In(lock).Take(LockThread()); }
+void AcquireLock(HNativeLock* lock) noexcept { In(lock).Take(LockThread()); }
 
-bool TryTakeLock(NativeLock* lock) noexcept { return In(lock).TryTake(LockThread()); }
+bool TryAcquireLock(HNativeLock* lock) noexcept { return In(lock).TryTake(LockThread()); }
 
-void GiveLock(NativeLock* lock) noexcept { In(lock).Give(); }
+void ReleaseLock(HNativeLock* lock) noexcept { In(lock).Give(); }

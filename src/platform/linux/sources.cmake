@@ -5,8 +5,8 @@ set(ZANBASE_PLATFORM_SOURCES
     console.cpp
     futex.cpp
     guard.cpp
-    kill.cpp
-    library_code.cpp
+    thread_kill.cpp
+    thread_kill_safety.cpp
     lock.cpp
     messages.cpp
     processors.cpp

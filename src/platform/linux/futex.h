@@ -3,10 +3,10 @@
 //
 // A wake-up goes to one sleeping thread. If that thread is ended before it acts on it, or the thread that is
 // about to wake it is ended first, nobody would get it. So a thread notes the word that it sleeps on or wakes
-// others on in `toWakeDebts`, and the code that ends a thread calls PassWakeUpOn() on it as its last act. A
+// others on in `toPendingWakeups`, and the code that ends a thread calls ForwardPendingWakeups() on it as its last act. A
 // wake-up too many is harmless: everybody who sleeps on a word looks at it again.
-#ifndef ZANBASE_PLATFORM_POSIX_FUTEX_H
-#define ZANBASE_PLATFORM_POSIX_FUTEX_H
+#ifndef ZANBASE_PLATFORM_LINUX_FUTEX_H
+#define ZANBASE_PLATFORM_LINUX_FUTEX_H
 
 #include <atomic>
 #include <ctime>
@@ -15,10 +15,10 @@
 #include <sys/syscall.h>
 #include <unistd.h>
 
+#include "platform/linux/build.h"
+
 using FutexWord = std::atomic<unsigned int>;
 static_assert(sizeof(FutexWord) == 4 && FutexWord::is_always_lock_free, "the kernel reads 32 bits");
-
-#define ZANBASE_FAST_THREAD_LOCAL __thread __attribute__((tls_model("initial-exec")))
 
 constexpr int kEverySleeper = 0x7fffffff;
 
@@ -37,48 +37,48 @@ timespec DeadlineIn(unsigned int ms) noexcept;
 
 // What a thread owes to others. A thread that was woken on a condition owes that until it has its lock back,
 // so it can have both kinds of debt at once, but never two of a kind.
-struct WakeDebts {
+struct PendingWakeups {
     FutexWord* mpoWord;       // a lock's or a semaphore's; null: none
     FutexWord* mpoCondition;  // null: none
     unsigned int mnSeen;      // the condition's word as it was when this thread began to wait
 };
-extern ZANBASE_FAST_THREAD_LOCAL WakeDebts toWakeDebts;
+extern ZANBASE_FAST_THREAD_LOCAL PendingWakeups toPendingWakeups;
 
 // Called on a thread that is being ended: another sleeper gets the wake-up that this thread may have
 // swallowed, or all get the one that it was about to send. A condition that nobody has signalled since owes
 // nothing.
-void PassWakeUpOn() noexcept;
+void ForwardPendingWakeups() noexcept;
 
 // Notes a debt on a lock or semaphore for a scope.
-class WakeDebt {
+class PendingWakeup {
 public:
-    explicit WakeDebt(FutexWord& word) noexcept {
-        toWakeDebts.mpoWord = &word;
+    explicit PendingWakeup(FutexWord& word) noexcept {
+        toPendingWakeups.mpoWord = &word;
         std::atomic_signal_fence(std::memory_order_seq_cst);
     }
-    ~WakeDebt() {
+    ~PendingWakeup() {
         std::atomic_signal_fence(std::memory_order_seq_cst);
-        toWakeDebts.mpoWord = nullptr;
+        toPendingWakeups.mpoWord = nullptr;
     }
-    WakeDebt(const WakeDebt&) = delete;
-    WakeDebt& operator=(const WakeDebt&) = delete;
+    PendingWakeup(const PendingWakeup&) = delete;
+    PendingWakeup& operator=(const PendingWakeup&) = delete;
 };
 
 // The same for a condition, whose word was `seen` at the start of the wait.
-class SignalDebt {
+class PendingSignal {
 public:
-    SignalDebt(FutexWord& word, unsigned int seen) noexcept {
-        toWakeDebts.mnSeen = seen;
+    PendingSignal(FutexWord& word, unsigned int seen) noexcept {
+        toPendingWakeups.mnSeen = seen;
         std::atomic_signal_fence(std::memory_order_seq_cst);
-        toWakeDebts.mpoCondition = &word;
+        toPendingWakeups.mpoCondition = &word;
         std::atomic_signal_fence(std::memory_order_seq_cst);
     }
-    ~SignalDebt() {
+    ~PendingSignal() {
         std::atomic_signal_fence(std::memory_order_seq_cst);
-        toWakeDebts.mpoCondition = nullptr;
+        toPendingWakeups.mpoCondition = nullptr;
     }
-    SignalDebt(const SignalDebt&) = delete;
-    SignalDebt& operator=(const SignalDebt&) = delete;
+    PendingSignal(const PendingSignal&) = delete;
+    PendingSignal& operator=(const PendingSignal&) = delete;
 };
 
 #endif

@@ -1,6 +1,6 @@
 // A window with a terminal in it, for a process that was started from none.
-#ifndef ZANBASE_PLATFORM_POSIX_TERMINAL_WINDOW_H
-#define ZANBASE_PLATFORM_POSIX_TERMINAL_WINDOW_H
+#ifndef ZANBASE_PLATFORM_LINUX_TERMINAL_WINDOW_H
+#define ZANBASE_PLATFORM_LINUX_TERMINAL_WINDOW_H
 
 // Opens `path` for reading and writing on a descriptor that is none of the three standard ones, even if one
 // of those is free, and that is closed on exec. It never becomes the controlling terminal. -1 on failure.

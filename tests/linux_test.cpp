@@ -5,7 +5,7 @@
 #include <thread>
 
 #include "platform/clock.h"
-#include "platform/posix/restartable.h"
+#include "platform/linux/restartable.h"
 #include "platform/processors.h"
 
 int described = 0;  // processors that have a file: those from number 4 on, two to a core
@@ -39,7 +39,7 @@ TEST(PosixSignals, CutNoPauseAndBreakAStoreInsteadOfBeingOverwritten) {
             while (hits != sent) continue;
     });
     const unsigned int start = ReadTicks();
-    PauseFor(5);
+    SleepFor(5);
     EXPECT_GE(ReadTicks() - start, 5U);
     while (hits < 5000) {
         word.store(1, std::memory_order_relaxed);  // a locked one would draw all the signals to itself

@@ -22,8 +22,8 @@
 // A thread may be ended at any instruction. From its change of mnState to its store of 0 it holds the lock,
 // which then stays held, as promised. A waiter, or a thread that was about to wake one, passes the wake-up on
 // (see futex.h), so it holds nobody up.
-#ifndef ZANBASE_PLATFORM_POSIX_FUTEX_LOCK_H
-#define ZANBASE_PLATFORM_POSIX_FUTEX_LOCK_H
+#ifndef ZANBASE_PLATFORM_LINUX_FUTEX_LOCK_H
+#define ZANBASE_PLATFORM_LINUX_FUTEX_LOCK_H
 
 #include <atomic>
 
@@ -90,7 +90,7 @@ private:
     }
 
     void AwaitFree() {
-        const typename System::WakeDebt debt(mnState);
+        const typename System::PendingWakeup debt(mnState);
         while (mnState.exchange(2, std::memory_order_acquire) != 0) {
             if (System::BreakStores()) {
                 System::SleepWhile(mnState, 2, nullptr);
@@ -101,7 +101,7 @@ private:
     }
 
     __attribute__((noinline)) void GiveSlowly() {
-        const typename System::WakeDebt debt(mnState);
+        const typename System::PendingWakeup debt(mnState);
         if (mnState.exchange(0, std::memory_order_release) == 2) System::WakeSleepers(mnState, 1);
     }
 

@@ -8,7 +8,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include "platform/posix/terminal_window.h"
+#include "platform/linux/terminal_window.h"
 
 namespace {
 

@@ -1,19 +1,19 @@
 // What the algorithms of lock, condition and semaphore need of the system, as one type. They are templates
 // over it, so that a test can run the very same code under every order of steps.
-#ifndef ZANBASE_PLATFORM_POSIX_FUTEX_SYSTEM_H
-#define ZANBASE_PLATFORM_POSIX_FUTEX_SYSTEM_H
+#ifndef ZANBASE_PLATFORM_LINUX_FUTEX_SYSTEM_H
+#define ZANBASE_PLATFORM_LINUX_FUTEX_SYSTEM_H
 
 #include <sys/single_threaded.h>
 
-#include "platform/posix/futex.h"
-#include "platform/posix/restartable.h"
+#include "platform/linux/futex.h"
+#include "platform/linux/restartable.h"
 
 struct FutexSystem {
     using Word = FutexWord;
     using Owner = std::atomic<unsigned long long>;
     using Deadline = const timespec*;  // null: none
-    using WakeDebt = ::WakeDebt;
-    using SignalDebt = ::SignalDebt;
+    using PendingWakeup = ::PendingWakeup;
+    using PendingSignal = ::PendingSignal;
     static constexpr int kEverySleeper = ::kEverySleeper;
 
     // Whether the process has never had a second thread, or the system knows that it has none now.

@@ -3,15 +3,15 @@
 
 #include <new>
 
-#include "platform/posix/futex_condition.h"
-#include "platform/posix/system_lock.h"
+#include "platform/linux/futex_condition.h"
+#include "platform/linux/system_lock.h"
 
 namespace {
 
 using Condition = FutexCondition<FutexSystem>;
-static_assert(sizeof(Condition) <= sizeof(NativeCondition::storage));
+static_assert(sizeof(Condition) <= sizeof(HNativeCondition::storage));
 
-Condition& In(NativeCondition* condition) noexcept {
+Condition& In(HNativeCondition* condition) noexcept {
     return *std::launder(reinterpret_cast<Condition*>(condition->storage));
 }
 
@@ -24,9 +24,9 @@ struct OneLevel {
 
 }  // namespace
 
-void OpenCondition(NativeCondition* condition) noexcept { new (condition->storage) Condition; }
+void InitCondition(HNativeCondition* condition) noexcept { new (condition->storage) Condition; }
 
-bool SleepOn(NativeCondition* condition, NativeLock* lock, unsigned int limit_ms) noexcept {
+bool WaitOnCondition(HNativeCondition* condition, HNativeLock* lock, unsigned int limit_ms) noexcept {
     const OneLevel level{In(lock)};
     if (limit_ms == kForever) return In(condition).Sleep(level, nullptr);
     if (limit_ms == 0) {
@@ -38,6 +38,6 @@ bool SleepOn(NativeCondition* condition, NativeLock* lock, unsigned int limit_ms
     return In(condition).Sleep(level, &deadline);
 }
 
-void WakeOne(NativeCondition* condition) noexcept { In(condition).WakeOne(); }
+void SignalCondition(HNativeCondition* condition) noexcept { In(condition).Signal(); }
 
-void WakeAll(NativeCondition* condition) noexcept { In(condition).WakeAll(); }
+void BroadcastCondition(HNativeCondition* condition) noexcept { In(condition).Broadcast(); }

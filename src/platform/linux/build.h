@@ -1,0 +1,17 @@
+// What the back end asks of the compiler: whether the thread sanitizer is on, and fast thread-local storage.
+#ifndef ZANBASE_PLATFORM_LINUX_BUILD_H
+#define ZANBASE_PLATFORM_LINUX_BUILD_H
+
+#if defined(__SANITIZE_THREAD__)
+#define ZANBASE_THREAD_SANITIZER 1
+#elif defined(__has_feature)
+#if __has_feature(thread_sanitizer)
+#define ZANBASE_THREAD_SANITIZER 1
+#endif
+#endif
+
+// A thread-local variable at a fixed offset from the thread pointer: reading it calls nothing, so signal
+// handlers may use it. Such variables come from a small reserve of the loader; keep them few.
+#define ZANBASE_FAST_THREAD_LOCAL __thread __attribute__((tls_model("initial-exec")))
+
+#endif
