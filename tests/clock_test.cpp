@@ -15,9 +15,9 @@ WallClock now = {};
 unsigned int ticks = UINT_MAX - 4, pauses = 1;  // a tick at every other pause
 std::string calls;
 
-extern "C" WallClock __wrap__Z13ReadWallClockv() { return now; }
-extern "C" unsigned int __wrap__Z9ReadTicksv() { return ticks; }
-extern "C" void __wrap__Z8SleepForj(unsigned ms) { ticks += ++pauses % 2, calls += std::to_string(ms) + ";"; }
+WallClock ReadWallClock() noexcept { return now; }
+unsigned int ReadTicks() noexcept { return ticks; }
+void SleepFor(unsigned ms) noexcept { ticks += ++pauses % 2, calls += std::to_string(ms) + ";"; }
 
 class CopyableTimer : public HTimer {};
 

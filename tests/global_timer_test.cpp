@@ -13,9 +13,9 @@
 
 static thread_local long long now_ms = 0;
 
-extern "C" WallClock __wrap__Z13ReadWallClockv() {
-    return {now_ms / 1000, static_cast<unsigned short>(now_ms % 1000)};
-}
+WallClock ReadWallClock() noexcept { return {now_ms / 1000, static_cast<unsigned short>(now_ms % 1000)}; }
+unsigned int ReadTicks() noexcept { return 0; }
+void SleepFor(unsigned int) noexcept {}
 
 namespace {
 
