@@ -1,14 +1,14 @@
-// Clocks, stopwatch, sleep and random numbers, on clocks of the test's own.
+// Clocks, stopwatch and sleep, on clocks of the test's own.
 #include "zanbase/clock.h"
 
 #include <gtest/gtest.h>
 
 #include <climits>
-#include <random>
+#include <string>
+#include <utility>
 
 #include "platform/clock.h"
 #include "timing/time_text.h"
-#include "zanbase/random.h"
 #include "zanbase/sleep.h"
 
 WallClock now = {};
@@ -47,24 +47,4 @@ TEST(USleep, PausesForATenthOfTheTimeAtLeastUntilAHookIsInstalled) {
     InstallUSleepHook([](int microseconds) { calls = std::to_string(microseconds); });
     for (const int microseconds : {INT_MAX, 0, -1}) USleep(microseconds);
     EXPECT_EQ(calls, "2147483647");
-}
-
-const int unseeded = IMPRandInt();  // before any test seeds
-
-TEST(Random, FollowsThePublishedGeneratorFromAnySeed) {
-    EXPECT_EQ(unseeded, 2147466840);
-    IMPInitRandom(1);
-    std::minstd_rand0 published(16807);  // the seed is not a draw, nor is the first step
-    for (int step = 2; step <= 10000; ++step) ASSERT_EQ(IMPRandInt(), static_cast<int>(published()));
-    now = {1750000000, 123};
-    const int rows[][3] = {
-        {0, 542982264, 16167894}, {INT_MIN, INT_MIN, 1865008398}, {INT_MAX, INT_MAX, INT_MAX}};
-    for (const auto& [seed, used, first] : rows)
-        EXPECT_TRUE(IMPInitRandom(seed) == used && IMPRandInt() == first) << seed;
-    EXPECT_EQ(IMPRandom(), 1.0);  // the last seed's state steps to itself
-    IMPInitRandom(42);
-    double sum = -6.0;
-    for (int draw = 0; draw < 12; ++draw) sum += IMPRandom();
-    IMPInitRandom(42);
-    EXPECT_EQ(IMPRandNorm(-2.0), sum * -2.0);
 }
