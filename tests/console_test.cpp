@@ -5,6 +5,10 @@
 #include <pty.h>
 #include <utmp.h>
 
+#include <future>
+#include <thread>
+
+#include "support/blocked_thread.h"
 #include "support/run_in_child.h"
 #include "zanbase/terminal.h"
 
@@ -43,6 +47,46 @@ TEST(Console, IsTheTerminalOfTheSession) {
     EXPECT_EQ(child.exit_code, 0);
     close(terminal);
     EXPECT_EQ(TextUntilTheEnd(screen), "word\r\n[word]");
+}
+
+// Standard input is being read, standard output is a pipe, standard error has wide text and no reader.
+int MakeConsoleOnBusyStreams(int terminal, int input, int output, int broken) {
+    login_tty(terminal);
+    dup2(input, STDIN_FILENO);
+    dup2(output, STDOUT_FILENO);
+    dup2(broken, STDERR_FILENO);
+    std::promise<unsigned long long> reader;
+    std::thread([&] {
+        reader.set_value(static_cast<unsigned long long>(gettid()));
+        std::getchar();
+    }).detach();
+    AwaitSleepOf(reader.get_future().get());
+    std::fputs("pending", stdout);
+    std::setvbuf(stderr, nullptr, _IOFBF, 100);
+    CLAIM(std::fputws(L"lost", stderr) >= 0);
+    CLAIM(CreateConsole() == 1);
+    std::fputws(L"wide", stderr);
+    std::fputs(" narrow", stdout);
+    std::_Exit(0);  // flushes nothing
+}
+
+TEST(Console, WaitsForNoReaderAndNoFullPipe) {
+    for (const bool is_full : {false, true}) {
+        int screen = -1, terminal = -1, input[2], broken[2], output[2];
+        ASSERT_EQ(openpty(&screen, &terminal, nullptr, nullptr, nullptr), 0);
+        ASSERT_EQ(pipe(input) + pipe(broken) + pipe(output), 0);
+        close(broken[0]);
+        const std::string filling(is_full ? static_cast<std::size_t>(fcntl(output[1], F_GETPIPE_SZ)) : 0,
+                                  '.');
+        ASSERT_EQ(write(output[1], filling.data(), filling.size()), static_cast<ssize_t>(filling.size()));
+        const ChildResult child =
+            RunInChild([&] { return MakeConsoleOnBusyStreams(terminal, input[0], output[1], broken[1]); });
+        EXPECT_EQ(child.exit_code, 0);
+        close(terminal);
+        EXPECT_EQ(TextUntilTheEnd(screen), "wide narrow");
+        close(output[1]);
+        EXPECT_EQ(TextUntilTheEnd(output[0]), is_full ? filling : "pending");
+    }
 }
 
 TEST(Console, IsAWindowWhereThereIsNoTerminal) {

@@ -35,24 +35,31 @@ ZANBASE_API int IMPAutomaticTerm();
 /// the library and stays good until it is unloaded.
 ZANBASE_API const char* IMPGetMajorRev();
 
-/// Gives the process a text console, once in its life. 1 if it has one from this call or an earlier one, also
-/// if `DestroyConsole` took that away since; 0 if none can be had, and then nothing has changed.
+/// Gives the process a text console, at most once in its life. Returns 1 if this call or an earlier one made
+/// a console, even if `DestroyConsole` has removed it; returns 0 and changes nothing if none is available.
 ///
-/// After the call that made the console, the standard input, output and error use it, unbuffered, wherever
-/// they went before. What they hold for output is written there first, or lost if that fails, and input read
-/// ahead but not used is dropped. A stream that the program has closed stays closed. Later calls leave the
-/// streams alone.
+/// The call that makes the console connects standard input, output and error to it, unbuffered. Pending
+/// output is written to the old file first; buffered input is dropped. A closed stream stays closed. Later
+/// calls leave the streams alone.
 ///
-/// On Linux the console is the terminal that the process was started from, if it has one; else a window of
-/// the program `xterm` on the display that the environment variable `DISPLAY` names, for which it waits half
-/// a minute at most. No signal and no child process shows the program that a window was started. When the
-/// user closes it, reading gives the end of input and writing fails.
-/// Not for a program that needs keys one by one or the mouse: it gives lines of text, no more.
+/// The call waits for a bounded time. It drops pending output that the old file does not accept within a
+/// second (a full pipe, or one without a reader, which raises no SIGPIPE). If another thread is using a stream
+/// for longer than a tenth of a second, because it waits for input for example, the stream uses the console
+/// from its next system call on, but stays buffered. A wide-oriented stream loses its orientation.
+///
+/// On Linux the console is the controlling terminal of the process. Without one it is a window of the program
+/// `xterm` on the display that the environment variable `DISPLAY` names; the call waits for the window for
+/// at most half a minute. The window's process is no child of the program and sends it no signal. When the
+/// user closes the window, reading gives end-of-file and writing fails.
+///
+/// Not for programs that need single keys or the mouse: the console transfers lines of text.
+/// Thread-safety: one thread at a time calls the three console operations. Other threads may use the streams.
 ZANBASE_API int CreateConsole();
 
-/// Takes away the console that `CreateConsole` made: those of the three standard streams that still use it
-/// go to the null device from now on, unbuffered, and a window of our own closes. 1 if that was done, 0 if
-/// there was no such console (or no null device, and then it stays). It can't be made again.
+/// Removes the console that `CreateConsole` made: the standard streams that use it are connected to the null
+/// device, unbuffered, by the same rules, and a window of the library's own closes. Returns 1 on success, 0 if
+/// there is no such console, or no null device (then nothing changes). The console can't be made again.
+/// Thread-safety: as `CreateConsole`.
 ZANBASE_API int DestroyConsole();
 
 /// Shows (`show` not 0) or hides (0) the window of the console. On Linux it iconifies and restores a window

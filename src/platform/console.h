@@ -7,9 +7,10 @@
 bool OpenConsole() noexcept;
 
 // Connects the three standard streams, the input first and the error last, to the open console, unbuffered.
-// What they hold for output is written to where they went before, or dropped if that fails; input read ahead
-// is dropped; an error or end of input is forgotten. A closed stream stays closed, and one that can't be
-// connected stays where it was, as usable as before; there is no other sign of it.
+// Pending output is written to the old file, or dropped if that fails; buffered input is dropped; error and
+// end-of-file indicators are cleared. A closed stream stays closed. A stream that can't be connected keeps its
+// file and stays usable; nothing reports it. Must not wait without limit for another thread that uses a
+// stream, nor for the reader of a pipe.
 void ConnectStandardStreams() noexcept;
 
 // Takes the console away; those standard streams that use it go to the null device, unbuffered. False if no

@@ -4,10 +4,11 @@
 #include <array>
 #include <cstdio>
 
-#include <stdio_ext.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "platform/linux/descriptor.h"
+#include "platform/linux/standard_stream.h"
 #include "platform/linux/terminal_window.h"
 
 namespace {
@@ -16,18 +17,6 @@ int gnConsole = -1;        // descriptor on the open console, -1 if none; kept, 
 bool gbOwnWindow = false;  // whether it is a window that we started
 
 std::array<std::FILE*, 3> StandardStreams() noexcept { return {stdin, stdout, stderr}; }
-
-// A failed dup2 leaves the stream where it was. A stream that the program closed has no descriptor, and the
-// number that it had may have gone to a file of the program's since.
-void Connect(std::FILE* stream, int target) noexcept {
-    const int descriptor = fileno(stream);
-    if (descriptor < 0) return;
-    std::fflush(stream);
-    __fpurge(stream);  // a pipe's input, which can't be given back, and output that nobody took
-    dup2(target, descriptor);
-    std::clearerr(stream);
-    std::setvbuf(stream, nullptr, _IONBF, 0);
-}
 
 bool UsesConsole(int descriptor) noexcept {
     struct stat console {};
@@ -46,7 +35,7 @@ bool OpenConsole() noexcept {
 }
 
 void ConnectStandardStreams() noexcept {
-    for (std::FILE* const stream : StandardStreams()) Connect(stream, gnConsole);
+    for (std::FILE* const stream : StandardStreams()) RedirectStream(stream, gnConsole);
 }
 
 bool CloseConsole() noexcept {
@@ -54,7 +43,7 @@ bool CloseConsole() noexcept {
     const int null_device = OpenAboveStreams("/dev/null");
     if (null_device < 0) return false;
     for (std::FILE* const stream : StandardStreams()) {
-        if (UsesConsole(fileno(stream))) Connect(stream, null_device);
+        if (UsesConsole(fileno(stream))) RedirectStream(stream, null_device);
     }
     close(null_device);
     close(gnConsole);  // a window of our own ends once nothing uses it

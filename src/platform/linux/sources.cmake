@@ -12,6 +12,7 @@ set(ZANBASE_PLATFORM_SOURCES
     processors.cpp
     restartable.cpp
     semaphore.cpp
+    standard_stream.cpp
     terminal_window.cpp
     thread.cpp
     thread_block.cpp)

@@ -10,7 +10,6 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <utility>
 
 #include <fcntl.h>
 #include <poll.h>
@@ -20,6 +19,7 @@
 #include <unistd.h>
 
 #include "platform/clock.h"
+#include "platform/linux/descriptor.h"
 
 namespace {
 
@@ -31,24 +31,6 @@ constexpr int kXtermEnd = 3;
 // Window operations for xterm to refuse: its usual list without restoring and iconifying.
 char gaResources[] =
     "*disallowedWindowOps: 3,4,5,6,7,8,9,11,13,14,18,19,20,21,GetSelection,SetSelection,SetWinLines,SetXprop";
-
-// A descriptor that is closed with its scope.
-class Descriptor {
-public:
-    explicit Descriptor(int descriptor) noexcept : mnDescriptor(descriptor) {}
-    ~Descriptor() { Close(); }
-    Descriptor(const Descriptor&) = delete;
-    Descriptor& operator=(const Descriptor&) = delete;
-
-    int Get() const noexcept { return mnDescriptor; }
-    int Release() noexcept { return std::exchange(mnDescriptor, -1); }
-    void Close() noexcept {
-        if (mnDescriptor >= 0) close(Release());
-    }
-
-private:
-    int mnDescriptor;  // -1: none
-};
 
 using TerminalPath = char[64];
 
@@ -126,12 +108,6 @@ bool WaitForWindow(int terminal) noexcept {
 }
 
 }  // namespace
-
-int OpenAboveStreams(const char* path) noexcept {
-    Descriptor opened(open(path, O_RDWR | O_NOCTTY | O_CLOEXEC));
-    if (opened.Get() > STDERR_FILENO) return opened.Release();
-    return fcntl(opened.Get(), F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
-}
 
 int OpenTerminalWindow() noexcept {
     const char* const display = std::getenv("DISPLAY");

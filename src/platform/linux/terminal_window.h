@@ -2,10 +2,6 @@
 #ifndef ZANBASE_PLATFORM_LINUX_TERMINAL_WINDOW_H
 #define ZANBASE_PLATFORM_LINUX_TERMINAL_WINDOW_H
 
-// Opens `path` for reading and writing on a descriptor that is none of the three standard ones, even if one
-// of those is free, and that is closed on exec. It never becomes the controlling terminal. -1 on failure.
-int OpenAboveStreams(const char* path) noexcept;
-
 // Starts an xterm on a new pseudo-terminal and waits until its window is there. Returns the descriptor of the
 // terminal, as OpenAboveStreams does; the xterm ends by itself when the last descriptor of it is closed. -1
 // if DISPLAY is unset or no window comes up within half a minute.
