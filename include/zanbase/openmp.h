@@ -29,6 +29,9 @@ public:
     OMPDynamic(bool enable);
     ~OMPDynamic();
 
+    /// Copies the notes of the other scope.
+    OMPDynamic(const OMPDynamic&) = default;
+
     /// Takes over the notes of the other scope.
     OMPDynamic& operator=(const OMPDynamic&);
 
@@ -44,6 +47,9 @@ public:
     /// `count` is clamped to the range from 1 to `OMPGetMaxThreads()`.
     OMPThreadCount(long long count);
     ~OMPThreadCount();
+
+    /// Copies the notes of the other scope.
+    OMPThreadCount(const OMPThreadCount&) = default;
 
     /// Takes over the notes of the other scope.
     OMPThreadCount& operator=(const OMPThreadCount&);
@@ -64,6 +70,9 @@ public:
     /// Asks for nesting, or with false for none.
     OMPNested(bool enable);
     ~OMPNested();
+
+    /// Copies the notes of the other scope.
+    OMPNested(const OMPNested&) = default;
 
     /// Takes over the notes of the other scope.
     OMPNested& operator=(const OMPNested&);

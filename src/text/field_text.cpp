@@ -55,7 +55,9 @@ void ShiftLetters(char* text, char first, char last, int distance) noexcept {
 }  // namespace
 
 const char* FormatDouble(double value, char* buffer) noexcept {
+    constexpr std::size_t kBufferBytes = 25;  // what a caller's buffer holds at least
     char* const area = buffer != nullptr ? buffer : gacDoubleText;
+    const std::size_t bytes = buffer != nullptr ? kBufferBytes : sizeof gacDoubleText;
     const double magnitude = std::fabs(value);
     if (-2147483648.0 < value && value < 2147483647.0) {
         const double below = std::floor(value);
@@ -66,8 +68,8 @@ const char* FormatDouble(double value, char* buffer) noexcept {
             return area;
         }
     }
-    constexpr std::size_t kBufferBytes = 25;
-    std::snprintf(area, kBufferBytes, magnitude > 1e7 || magnitude < 1e-7 ? "%24.15e" : "%24.11f", value);
+    const char* const format = magnitude > 1e7 || magnitude < 1e-7 ? "%24.15e" : "%24.11f";
+    if (kPrint(area, bytes, format, value) < 0) *area = '\0';
     return area;
 }
 

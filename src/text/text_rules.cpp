@@ -24,17 +24,19 @@ std::size_t WriteFixedPoint(double value, int decimals, char* area, std::size_t 
     // which are removed again, at the cost of a runtime that allocates for them.
     constexpr int kMostDecimals = 1074;
     const int count = decimals < 0 ? AutomaticDecimals(value) : std::min(decimals, kMostDecimals);
-    const auto whole_length = static_cast<std::size_t>(std::snprintf(area, bytes, "%.*f", count, value));
-    char* end = area + std::min(whole_length, bytes - 1);
+    const int printed = std::snprintf(area, bytes, "%.*f", count, value);
+    const auto length = static_cast<std::size_t>(std::max(printed, 0));  // negative if the runtime fails
+    char* end = area + std::min(length, bytes - 1);
     if (std::memchr(area, '.', static_cast<std::size_t>(end - area)) != nullptr) {
         while (end[-1] == '0') --end;
         if (end[-1] == '.') --end;
-        *end = '\0';
     }
+    *end = '\0';
     return static_cast<std::size_t>(end - area);
 }
 
 void WriteFormat(const char* format, va_list arguments, char* area, std::size_t bytes) noexcept {
+    *area = '\0';  // the text if the runtime fails without writing
     std::vsnprintf(area, bytes, format, arguments);
 }
 
