@@ -7,6 +7,8 @@
 
 #include "zanbase/export.h"
 
+struct GlobalTimerSnapshot;
+
 /// The process's flat list of cumulative timers. There is one instance.
 ///
 ///     static const auto load = GlobalTimer::GetInstance().RegisterNewTimer("load");
@@ -62,6 +64,7 @@ public:
     GlobalTimer& operator=(const GlobalTimer&);
 
 private:
+    friend struct GlobalTimerSnapshot;  // reads the rows
     struct TimerSlot;
     struct Impl;
 

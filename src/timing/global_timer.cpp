@@ -17,6 +17,7 @@
 #include "timing/row_table.h"
 #include "zanbase/mutex.h"
 #include "zanbase/openmp.h"
+#include "zanbase/snapshot.h"
 
 namespace {
 
@@ -117,4 +118,18 @@ void GlobalTimer::Report() const { mpoImpl->Report(); }
 
 void GlobalTimer::ResetAll() {
     for (const auto& row : mpoImpl->moRows.Rows()) std::fill(row->begin(), row->end(), TimerSlot());
+}
+
+GlobalTimerSnapshot GlobalTimerSnapshot::Take() {
+    const GlobalTimer::Impl& timers = *GlobalTimer::GetInstance().mpoImpl;
+    GlobalTimerSnapshot snapshot;
+    snapshot.maRows.reserve(timers.moNames.size());
+    for (const auto& [id, name] : timers.moNames) {
+        Row& row = snapshot.maRows.emplace_back();
+        row.moName = name;
+        row.mdSeconds = timers.TotalOf(id) / 1000000.0;
+        for (const auto& slots : timers.moRows.Rows())
+            row.maThreadSeconds.push_back(static_cast<double>((*slots)[id].mnElapsed) / 1000000.0);
+    }
+    return snapshot;
 }
