@@ -1,8 +1,8 @@
 #!/usr/bin/env bash
-# treescan_test.sh TREESCAN: the totals of treescan on a made tree beside those of find and wc, with one thread and
+# treescan_test.sh TREESCAN…: the totals of treescan on a made tree beside those of find and wc, with one thread and
 # several, and its answers to bad calls.
 set -euo pipefail
-treescan=$1
+treescan=("$@")
 tree=$(mktemp -d)
 trap 'rm -rf "$tree" "$tree.out"' EXIT
 mkdir -p "$tree/a b/c" "$tree/empty"
@@ -16,7 +16,7 @@ fail() { cat "$tree.out" && echo "treescan_test: $*" >&2 && exit 1; }
 files=$(find "$tree" -type f | wc -l)
 read -r lines bytes < <(find "$tree" -type f -print0 | xargs -0 cat | wc -lc)
 for threads in 1 2 5; do
-    "$treescan" --leak --threads $threads --top 3 "$tree" >"$tree.out" 2>/dev/null
+    "${treescan[@]}" --leak --threads $threads --top 3 "$tree" >"$tree.out" 2>/dev/null
     for line in "files: $files" "bytes: $bytes" "lines: $lines" "read: .*" "Memory Leak Report.*" \
         "| File  |$(printf %8d "$files") .*" "| Open  |$(printf %8d "$files") .*"; do
         grep -qx -- "$line" "$tree.out" || fail "no line: $line"
@@ -24,6 +24,6 @@ for threads in 1 2 5; do
 done
 for call in "$tree/missing" "--threads 0 $tree" --bogus ""; do
     # shellcheck disable=SC2086 # several words
-    "$treescan" $call >"$tree.out" 2>&1 && fail "accepted: $call"
+    "${treescan[@]}" $call >"$tree.out" 2>&1 && fail "accepted: $call"
     [ "$(wc -l <"$tree.out")" = 1 ] || fail "not one line for: $call"
 done

@@ -10,12 +10,17 @@ ZANBASE_AS_WRITTEN WriteToNull() {
     *nowhere = 1;
 }
 
+// The processor must fault at these: 64-bit ARM divides by zero without one, and its trap is no fault.
+#if defined(__aarch64__)
+ZANBASE_AS_WRITTEN RunIllegalInstruction() { __asm__ volatile("udf #0"); }
+ZANBASE_AS_WRITTEN DivideByZero() { RunIllegalInstruction(); }
+#else
+ZANBASE_AS_WRITTEN RunIllegalInstruction() { __builtin_trap(); }
 ZANBASE_AS_WRITTEN DivideByZero() {
     volatile int number = 7, zero = 0;
     number = number / zero;
 }
-
-ZANBASE_AS_WRITTEN RunIllegalInstruction() { __builtin_trap(); }
+#endif
 
 // In steps of less than the page that guards a stack's end, and with no call, which might fault in its stead.
 ZANBASE_AS_WRITTEN UseUpStack() {
