@@ -5,10 +5,8 @@
 #include <pty.h>
 #include <utmp.h>
 
-#include <future>
 #include <thread>
 
-#include "support/blocked_thread.h"
 #include "support/run_in_child.h"
 #include "zanbase/terminal.h"
 
@@ -34,14 +32,19 @@ TEST(Console, IsTheTerminalOfTheSession) {
         dup2(open("/dev/null", O_RDONLY), STDIN_FILENO);  // at its end at once
         std::fclose(stdout);
         std::FILE* const file = std::tmpfile();  // gets the descriptor that the output had
-        CLAIM(std::getchar() == EOF && CreateConsole() == 1);
+        CLAIM(std::getchar() == EOF);
+        CLAIM(CreateConsole() == 1);
         char word[8] = "";
         CLAIM(std::scanf("%7s", word) == 1);
         std::fprintf(stderr, "[%s]", word);
         dup2(fileno(file), STDERR_FILENO);
-        CLAIM(CreateConsole() == 1 && DestroyConsole() == 1);
-        CLAIM(std::fputs("text", stderr) >= 0 && lseek(fileno(file), 0, SEEK_CUR) == 4);
-        CLAIM(DestroyConsole() == 0 && CreateConsole() == 1 && std::getchar() == EOF);
+        CLAIM(CreateConsole() == 1);
+        CLAIM(DestroyConsole() == 1);
+        std::fputs("text", stderr);
+        CLAIM(lseek(fileno(file), 0, SEEK_CUR) == 4);
+        CLAIM(DestroyConsole() == 0);
+        CLAIM(CreateConsole() == 1);
+        CLAIM(std::getchar() == EOF);
         return 0;
     });
     EXPECT_EQ(child.exit_code, 0);
@@ -49,18 +52,18 @@ TEST(Console, IsTheTerminalOfTheSession) {
     EXPECT_EQ(TextUntilTheEnd(screen), "word\r\n[word]");
 }
 
-// Standard input is being read, standard output is a pipe, standard error has wide text and no reader.
-int MakeConsoleOnBusyStreams(int terminal, int input, int output, int broken) {
+// Standard input is being read, standard output is `pipe`, standard error has wide text and no reader.
+int MakeConsoleOnBusyStreams(int terminal, int pipe) {
     login_tty(terminal);
-    dup2(input, STDIN_FILENO);
-    dup2(output, STDOUT_FILENO);
-    dup2(broken, STDERR_FILENO);
-    std::promise<unsigned long long> reader;
-    std::thread([&] {
-        reader.set_value(static_cast<unsigned long long>(gettid()));
-        std::getchar();
-    }).detach();
-    AwaitSleepOf(reader.get_future().get());
+    int silent[2], broken[2];
+    CLAIM(::pipe(silent) == 0);
+    CLAIM(::pipe(broken) == 0);
+    close(broken[0]);
+    dup2(silent[0], STDIN_FILENO);
+    dup2(pipe, STDOUT_FILENO);
+    dup2(broken[1], STDERR_FILENO);
+    std::thread([] { std::getchar(); }).detach();
+    while (ftrylockfile(stdin) == 0) funlockfile(stdin);  // until the thread has it
     std::fputs("pending", stdout);
     std::setvbuf(stderr, nullptr, _IOFBF, 100);
     CLAIM(std::fputws(L"lost", stderr) >= 0);
@@ -71,21 +74,18 @@ int MakeConsoleOnBusyStreams(int terminal, int input, int output, int broken) {
 }
 
 TEST(Console, WaitsForNoReaderAndNoFullPipe) {
-    for (const bool is_full : {false, true}) {
-        int screen = -1, terminal = -1, input[2], broken[2], output[2];
+    for (const std::size_t filled : {0U, 65536U}) {
+        int screen = -1, terminal = -1, output[2];
         ASSERT_EQ(openpty(&screen, &terminal, nullptr, nullptr, nullptr), 0);
-        ASSERT_EQ(pipe(input) + pipe(broken) + pipe(output), 0);
-        close(broken[0]);
-        const std::string filling(is_full ? static_cast<std::size_t>(fcntl(output[1], F_GETPIPE_SZ)) : 0,
-                                  '.');
-        ASSERT_EQ(write(output[1], filling.data(), filling.size()), static_cast<ssize_t>(filling.size()));
-        const ChildResult child =
-            RunInChild([&] { return MakeConsoleOnBusyStreams(terminal, input[0], output[1], broken[1]); });
+        ASSERT_EQ(pipe(output), 0);
+        const std::string filling(filled, '.');
+        ASSERT_EQ(write(output[1], filling.data(), filled), static_cast<ssize_t>(filled));
+        const ChildResult child = RunInChild([&] { return MakeConsoleOnBusyStreams(terminal, output[1]); });
         EXPECT_EQ(child.exit_code, 0);
         close(terminal);
-        EXPECT_EQ(TextUntilTheEnd(screen), "wide narrow");
         close(output[1]);
-        EXPECT_EQ(TextUntilTheEnd(output[0]), is_full ? filling : "pending");
+        EXPECT_EQ(TextUntilTheEnd(screen), "wide narrow");
+        EXPECT_EQ(TextUntilTheEnd(output[0]), filled == 0 ? "pending" : filling);
     }
 }
 
@@ -99,20 +99,27 @@ TEST(Console, IsAWindowWhereThereIsNoTerminal) {
     const ChildResult child = RunInChild([&] {
         setsid();
         unsetenv("DISPLAY");
-        CLAIM(CreateConsole() == 0 && DestroyConsole() == 0);
+        CLAIM(CreateConsole() == 0);
+        CLAIM(DestroyConsole() == 0);
         setenv("DISPLAY", ":nowhere", 1);
         CLAIM(CreateConsole() == 0);
         setenv("DISPLAY", display, 1);
         setenv("XENVIRONMENT", ZANBASE_TEST_XTERM_RESOURCES, 1);
-        CLAIM(std::ungetc('x', stdin) == 'x' && std::printf("earlier") == 7);
-        CLAIM(CreateConsole() == 1 && waitpid(-1, nullptr, WNOHANG | __WALL) == -1);
+        std::ungetc('x', stdin);
+        std::printf("earlier");
+        CLAIM(CreateConsole() == 1);
+        CLAIM(waitpid(-1, nullptr, WNOHANG | __WALL) == -1);
         std::printf("text\n");
-        for (const int show : {0, 7}) ShowConsole(show);
-        CLAIM(DestroyConsole() == 1 && std::printf("late") == 4 && std::getchar() == EOF);
+        ShowConsole(0);
+        ShowConsole(7);
+        CLAIM(DestroyConsole() == 1);
+        CLAIM(std::printf("late") == 4);
+        CLAIM(std::getchar() == EOF);
         ShowConsole(1);
         return 0;
     });
-    EXPECT_TRUE(child.exit_code == 0 && child.out == "earlier") << child.exit_code << child.out;
+    EXPECT_EQ(child.exit_code, 0);
+    EXPECT_EQ(child.out, "earlier");
     pclose(server);  // it ends with its last client, the xterm
     EXPECT_EQ(TextUntilTheEnd(open(log, O_RDONLY)), "text\r\n\033[2t\033[1t");
     std::remove(log);

@@ -14,9 +14,8 @@ void SleepFor(unsigned int) noexcept {}
 
 const int unseeded = IMPRandInt();  // before any test seeds
 
-TEST(Random, StartsWithTheSameSequenceInEveryProcess) { EXPECT_EQ(unseeded, 2147466840); }
-
 TEST(Random, FollowsThePublishedGenerator) {
+    EXPECT_EQ(unseeded, 2147466840);
     IMPInitRandom(1);
     std::minstd_rand0 published(16807);  // the state after seeding is one step from the seed
     for (int step = 2; step <= 10000; ++step) ASSERT_EQ(IMPRandInt(), static_cast<int>(published()));

@@ -4,8 +4,6 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <array>
-#include <cstdlib>
 #include <random>
 #include <string>
 #include <utility>
@@ -70,16 +68,4 @@ TEST(Sort, MakesTheComparisonsAndThePermutationOfTheModel) {
             ASSERT_EQ(std::pair(array, std::exchange(comparisons, {})), expected) << size << ' ' << count;
             ZAN_qsort(array.data(), count, size, AlwaysAbove);  // stays in the array
         }
-}
-
-// Wants 2 GiB of memory: run it with --gtest_also_run_disabled_tests.
-TEST(Sort, DISABLED_SpansMoreThanTwoToThe31Bytes) {
-    using Huge = std::array<int, 16386>;
-    std::vector<Huge> elements((1ULL << 31) / sizeof(Huge) + 1);
-    for (Huge& element : elements) element.front() = element.back() = std::rand();
-    ZAN_qsort(elements.data(), elements.size(), sizeof(Huge), [](const void* one, const void* other) {
-        return static_cast<const Huge*>(one)->front() < static_cast<const Huge*>(other)->front() ? -1 : 1;
-    });
-    EXPECT_TRUE(std::is_sorted(elements.begin(), elements.end()));
-    for (const Huge& element : elements) ASSERT_EQ(element.front(), element.back());
 }

@@ -24,7 +24,8 @@ TEST(Revision, IsOneTextWithoutDots) {
 TEST(ScreenSize, IsThatOfTheFirstCall) {
     double sizes[] = {-1, -1, -1, -1};
     EXPECT_EQ(GetScreenSize(&sizes[0], &sizes[1], &sizes[2], &sizes[3]), 0);
-    EXPECT_EQ(SetScreenSize(0, 2, 3, 4) + SetScreenSize(9, 9, 9, 9), 1);
+    EXPECT_EQ(SetScreenSize(0, 2, 3, 4), 1);
+    EXPECT_EQ(SetScreenSize(9, 9, 9, 9), 0);
     EXPECT_EQ(GetScreenSize(nullptr, nullptr, nullptr, nullptr), 0);
     EXPECT_EQ(GetScreenSize(&sizes[0], &sizes[1], nullptr, nullptr), 1);
     EXPECT_EQ(GetScreenSize(nullptr, nullptr, &sizes[3], nullptr), 1);
