@@ -1,12 +1,18 @@
-// What signals may not cut short, and the count of cores by files of the test's own.
+// What is particular to the Linux back end: signals, cancellation, and the kernel's files on processors.
 #include <gtest/gtest.h>
+#include <pthread.h>
 #include <signal.h>
+#include <sys/time.h>
 
 #include <thread>
 
 #include "platform/clock.h"
-#include "platform/linux/restartable.h"
+#include "platform/guard.h"
+#include "platform/linux/thread_wait.h"
 #include "platform/processors.h"
+#include "support/blocked_thread.h"
+#include "support/faults.h"
+#include "support/run_in_child.h"
 
 int described = 0;  // processors that have a file: those from number 4 on, two to a core
 
@@ -18,35 +24,127 @@ extern "C" std::FILE* __wrap_fopen(const char* path, const char*) {
     return number < 4 || number >= 4 + described ? nullptr : fmemopen(list.data(), list.size(), "r");
 }
 
-TEST(PosixProcessors, AreCountedAtTheFirstOfTheirCore) {
+TEST(LinuxProcessors, AreCountedAtTheFirstOfTheirCore) {
     described = CountLogicalProcessors();
     EXPECT_EQ(CountProcessorCores(), (described + 1) / 2);
     --described;  // a processor that is described nowhere
     EXPECT_EQ(CountProcessorCores(), 0);
 }
 
-FutexWord word{0};
-std::atomic<unsigned int> hits{0};
-
-TEST(PosixSignals, CutNoPauseAndBreakAStoreInsteadOfBeingOverwritten) {
-    AllowRestartableStores();
-    word = 1;
-    if (!StoreIfStill(word, 1, 0)) GTEST_SKIP() << "this system has none";
-    EXPECT_TRUE(word == 0 && !StoreIfStill(word, 1, 2));
-    signal(SIGUSR1, [](int) { word = 2, ++hits; });
-    std::thread sender([self = pthread_self()] {
-        for (unsigned int sent = 0; sent < 5000; pthread_kill(self, SIGUSR1), ++sent)
-            while (hits != sent) continue;
-    });
+TEST(LinuxClock, SleepsOnAfterASignal) {
+    signal(SIGALRM, [](int) {});
+    const itimerval soon{{0, 0}, {0, 1000}};
+    setitimer(ITIMER_REAL, &soon, nullptr);
     const unsigned int start = ReadTicks();
     SleepFor(5);
     EXPECT_GE(ReadTicks() - start, 5U);
-    while (hits < 5000) {
-        word.store(1, std::memory_order_relaxed);  // a locked one would draw all the signals to itself
-        std::atomic_signal_fence(std::memory_order_seq_cst);
-        const unsigned int before = hits;
-        StoreIfStill(word, 1, 0);
-        EXPECT_TRUE(hits == before || word == 2);
+}
+
+ThreadSlot slot{nullptr};
+
+void BlockAllSignals() {
+    sigset_t all;
+    sigfillset(&all);
+    pthread_sigmask(SIG_SETMASK, &all, nullptr);
+}
+
+void WaitForEver(void*) {
+    static FutexWord word{0};
+    SleepWhile(word, 0, nullptr);
+}
+
+TEST(LinuxThread, DoesNotEnterItsBodyOnceKilled) {
+    {
+        const BlockLock lock;  // the first step waits for it
+        StartThread(
+            slot, [](void*) { ADD_FAILURE(); }, nullptr);
+        slot.load()->mbKillRequested = true;  // as KillThread does
     }
-    sender.join();
+    KillThread(slot);
+}
+
+TEST(LinuxThread, LeavesABlockedSignalToItsReader) {
+    sigset_t read;
+    sigemptyset(&read);
+    sigaddset(&read, SIGRTMAX - 1);
+    pthread_sigmask(SIG_BLOCK, &read, nullptr);
+    StartThread(slot, WaitForEver, nullptr);
+    kill(getpid(), SIGRTMAX - 1);
+    const timespec limit{30, 0};
+    EXPECT_EQ(sigtimedwait(&read, nullptr, &limit), SIGRTMAX - 1);
+    KillThread(slot);
+}
+
+TEST(LinuxThread, IsKilledAndSurvivesFaultsThoughItsMakerBlocksAllSignals) {
+    BlockAllSignals();
+    StartThread(
+        slot, [](void*) { EXPECT_TRUE(RunGuarded([](void*) { WriteToNull(); }, nullptr)); }, nullptr);
+    JoinThread(slot);
+    StartThread(slot, WaitForEver, nullptr);
+    KillThread(slot);
+}
+
+TEST(LinuxThread, IsNotCancelledInANoexceptFunction) {
+    StartThread(slot, WaitForEver, nullptr);
+    std::thread([] {
+        pthread_cancel(pthread_self());
+        SleepFor(1);
+        KillThread(slot);
+        EXPECT_EQ(slot.load(), nullptr);
+        pthread_testcancel();
+        ADD_FAILURE();
+    }).join();
+}
+
+void Fault(void*) { WriteToNull(); }
+void Send(void*) { raise(SIGSEGV); }
+[[noreturn]] void Exit5(int) { _exit(5); }
+
+// A fault without a frame, and a signal that was merely sent, frame or not.
+TEST(LinuxGuard, LeavesToOthersWhatIsNotItsOwn) {
+    struct Case {
+        void (*handler)(int);  // the program's, installed before the library's
+        bool is_sent;
+        int exit_code;
+        int signal;
+    };
+    const Case cases[] = {{SIG_DFL, false, -1, SIGSEGV}, {SIG_DFL, true, -1, SIGSEGV},
+                          {SIG_IGN, false, -1, SIGSEGV}, {SIG_IGN, true, 0, 0},
+                          {Exit5, false, 5, 0},          {Exit5, true, 5, 0}};
+    for (const Case& each : cases) {
+        const ChildResult child = RunInChild([&] {
+            signal(SIGSEGV, each.handler);
+            if (!RunGuarded(Fault, nullptr)) return 1;
+            each.is_sent ? void(RunGuarded(Send, nullptr)) : Fault(nullptr);
+            return 0;
+        });
+        EXPECT_EQ(child.exit_code, each.exit_code) << &each - cases;
+        EXPECT_EQ(child.signal, each.signal) << &each - cases;
+    }
+}
+
+TEST(LinuxGuard, ReceivesFromALaterHandlerThatHandsOn) {
+    static struct sigaction ours, later;
+    EXPECT_TRUE(RunGuarded(Fault, nullptr));
+    later.sa_sigaction = [](int number, siginfo_t* info, void* at) { ours.sa_sigaction(number, info, at); };
+    later.sa_flags = SA_SIGINFO;
+    sigaction(SIGSEGV, &later, &ours);
+    for (int round = 0; round < 2; ++round) EXPECT_TRUE(RunGuarded(Fault, nullptr));
+}
+
+TEST(LinuxGuard, ForwardsTheWakeUpsOfAnAbandonedBody) {
+    static FutexWord word{0};
+    std::atomic<unsigned int> number{0};
+    std::thread sleeper([&] {
+        number = CurrentThreadId();
+        SleepWhile(word, 0, nullptr);
+    });
+    while (number == 0) YieldThread();
+    AwaitSleepOf(number);
+    const auto body = [](void*) {
+        const PendingWakeup pending(word);
+        WriteToNull();
+    };
+    EXPECT_TRUE(RunGuarded(body, nullptr));
+    sleeper.join();
 }

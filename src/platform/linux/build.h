@@ -1,4 +1,4 @@
-// What the back end asks of the compiler: whether the thread sanitizer is on, and fast thread-local storage.
+// What the back end asks of the build: whether the thread sanitizer is on, and fast thread-local storage.
 #ifndef ZANBASE_PLATFORM_LINUX_BUILD_H
 #define ZANBASE_PLATFORM_LINUX_BUILD_H
 
@@ -9,6 +9,10 @@
 #define ZANBASE_THREAD_SANITIZER 1
 #endif
 #endif
+
+// True if the process runs under the thread sanitizer, be it that only the program was built with it.
+extern "C" __attribute__((weak)) void __tsan_init();
+inline bool IsThreadSanitizerOn() noexcept { return __tsan_init != nullptr; }
 
 // A thread-local variable at a fixed offset from the thread pointer: reading it calls nothing, so signal
 // handlers may use it. Such variables come from a small reserve of the loader; keep them few.

@@ -6,6 +6,7 @@
 
 #include <sched.h>
 
+#include "platform/linux/cancellation.h"
 #include "platform/linux/futex.h"
 
 namespace {
@@ -37,6 +38,7 @@ void SleepFor(unsigned int ms) noexcept {
         sched_yield();
         return;
     }
+    const NoCancellation no_cancellation;
     const timespec until = DeadlineIn(ms);
     // The end is absolute, so a pause cut by a signal goes on for just what is left of it.
     while (clock_nanosleep(CLOCK_MONOTONIC, TIMER_ABSTIME, &until, nullptr) == EINTR) {

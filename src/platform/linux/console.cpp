@@ -7,6 +7,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "platform/linux/cancellation.h"
 #include "platform/linux/descriptor.h"
 #include "platform/linux/standard_stream.h"
 #include "platform/linux/terminal_window.h"
@@ -28,6 +29,7 @@ bool UsesConsole(int descriptor) noexcept {
 }  // namespace
 
 bool OpenConsole() noexcept {
+    const NoCancellation no_cancellation;
     gnConsole = OpenAboveStreams("/dev/tty");
     gbOwnWindow = gnConsole < 0;
     if (gbOwnWindow) gnConsole = OpenTerminalWindow();
@@ -35,10 +37,12 @@ bool OpenConsole() noexcept {
 }
 
 void ConnectStandardStreams() noexcept {
+    const NoCancellation no_cancellation;
     for (std::FILE* const stream : StandardStreams()) RedirectStream(stream, gnConsole);
 }
 
 bool CloseConsole() noexcept {
+    const NoCancellation no_cancellation;
     if (gnConsole < 0) return false;
     const int null_device = OpenAboveStreams("/dev/null");
     if (null_device < 0) return false;
@@ -52,6 +56,7 @@ bool CloseConsole() noexcept {
 }
 
 void ShowConsoleWindow(bool show) noexcept {
+    const NoCancellation no_cancellation;
     constexpr char kRestore[] = "\033[1t";
     constexpr char kIconify[] = "\033[2t";
     if (!gbOwnWindow || gnConsole < 0) return;

@@ -58,6 +58,7 @@ timespec DeadlineIn(unsigned int ms) noexcept {
 
 void ForwardPendingWakeups() noexcept {
     const PendingWakeups debts = toPendingWakeups;
+    toPendingWakeups = {};  // first: if the condition's memory is gone, the read below faults
     if (debts.mpoWord != nullptr) {
         // It may have told an owner to wake sleepers, and not yet kept that owner from overwriting it. Others
         // rely on what they read there; where it fails, they do so for a short sleep only.

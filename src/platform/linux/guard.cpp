@@ -2,23 +2,23 @@
 #include "platform/guard.h"
 
 #include <csetjmp>
-#include <iterator>
 
 #include <pthread.h>
 #include <signal.h>
-#include <ucontext.h>
 
-#include "platform/linux/thread_block.h"
+#include "platform/linux/fault_handlers.h"
 #include "platform/linux/thread_self.h"
+#include "platform/linux/thread_wait.h"
 
-// Lives in RunGuarded's frame; the thread's frames form a stack.
+// Part of RunGuarded's stack frame. The frames of a thread form a stack.
 struct FaultFrame {
-    FaultFrame() noexcept : mpoOuter(toSelf.mpoFrame) { toSelf.mpoFrame = this; }
+    FaultFrame() noexcept;  // unblocks the fault signals: a fault whose signal is blocked ends the process
     ~FaultFrame() { toSelf.mpoFrame = mpoOuter; }
     FaultFrame(const FaultFrame&) = delete;
     FaultFrame& operator=(const FaultFrame&) = delete;
 
     FaultFrame* mpoOuter;
+    sigset_t moBlocked;  // the signals that a fault leaves blocked
     sigjmp_buf moPlace;
 };
 
@@ -28,11 +28,11 @@ using Action = struct sigaction;
 
 struct FaultSignal {
     int number;
-    Action previous;  // what received it before us; written once, under the block lock
+    Action previous;  // what received it before us; written once, under the block mutex
 };
 
 FaultSignal gaFaults[] = {{SIGSEGV, {}}, {SIGBUS, {}}, {SIGFPE, {}}, {SIGILL, {}}};
-std::atomic<bool> gbInstalled{false};  // written under the block lock
+std::atomic<bool> gbInstalled{false};  // written under the block mutex
 
 const Action& PreviousOf(int signal) noexcept {
     const FaultSignal* fault = gaFaults;
@@ -40,25 +40,25 @@ const Action& PreviousOf(int signal) noexcept {
     return fault->previous;
 }
 
-// As if our handler had never been there: the default action follows when the fault is repeated, or the
-// signal is sent once more if somebody had sent it.
-void LeaveToDefault(int signal, bool sent) noexcept {
+// Gives the signal its default action, which follows when the faulting instruction runs again. A signal that
+// was sent is sent again.
+void RestoreDefaultAction(int signal, bool sent) noexcept {
     Action standard{};
     standard.sa_handler = SIG_DFL;
     sigaction(signal, &standard, nullptr);
     if (sent) raise(signal);
 }
 
-void PassOn(int signal, siginfo_t* info, void* context, bool sent) {
+void CallPreviousHandler(int signal, siginfo_t* info, void* context, bool sent) {
     const Action& previous = PreviousOf(signal);
     const bool has_handler = (previous.sa_flags & SA_SIGINFO) != 0 ||
                              (previous.sa_handler != SIG_DFL && previous.sa_handler != SIG_IGN);
     if (!has_handler) {
-        // The system doesn't let a thread ignore its own fault either.
-        if (!sent || previous.sa_handler == SIG_DFL) LeaveToDefault(signal, sent);
+        // The system does not let a thread ignore its own fault either.
+        if (!sent || previous.sa_handler == SIG_DFL) RestoreDefaultAction(signal, sent);
         return;
     }
-    if ((previous.sa_flags & static_cast<int>(SA_RESETHAND)) != 0) LeaveToDefault(signal, false);
+    if ((previous.sa_flags & static_cast<int>(SA_RESETHAND)) != 0) RestoreDefaultAction(signal, false);
     sigset_t blocked = previous.sa_mask;
     if ((previous.sa_flags & SA_NODEFER) == 0) sigaddset(&blocked, signal);
     sigset_t before;
@@ -74,14 +74,28 @@ void PassOn(int signal, siginfo_t* info, void* context, bool sent) {
 void OnFault(int signal, siginfo_t* info, void* context) {
     const bool sent = info->si_code <= 0;
     FaultFrame* const frame = toSelf.mpoFrame;
-    if (sent || frame == nullptr || toSelf.mnShields != 0) return PassOn(signal, info, context, sent);
-    toPendingWakeups = {};  // the code that noted them is left
-    // The mask of the fault and not that of a handler, which may be the one that handed the fault on to this.
-    pthread_sigmask(SIG_SETMASK, &static_cast<const ucontext_t*>(context)->uc_sigmask, nullptr);
+    // While kills are deferred the thread may hold the block mutex: a fault there must not be survived.
+    if (sent || frame == nullptr || toSelf.mnKillDeferrals != 0)
+        return CallPreviousHandler(signal, info, context, sent);
+    // The fault may be that of a signal handler which interrupted a lock operation or a wait for a thread;
+    // neither continues. Both calls are safe here: the first makes system calls only, and this thread does not
+    // hold the block mutex that the second acquires.
+    ForwardPendingWakeups();
+    AbandonWait();
+    pthread_sigmask(SIG_SETMASK, &frame->moBlocked, nullptr);
     siglongjmp(frame->moPlace, 1);
 }
 
 }  // namespace
+
+FaultFrame::FaultFrame() noexcept : mpoOuter(toSelf.mpoFrame) {
+    toSelf.mpoFrame = this;
+    sigset_t faults;
+    sigemptyset(&faults);
+    for (const FaultSignal& fault : gaFaults) sigaddset(&faults, fault.number);
+    pthread_sigmask(SIG_UNBLOCK, &faults, &moBlocked);
+    for (const FaultSignal& fault : gaFaults) sigdelset(&moBlocked, fault.number);
+}
 
 void InstallFaultHandlers() noexcept {
     if (gbInstalled.load(std::memory_order_acquire)) return;
@@ -89,7 +103,7 @@ void InstallFaultHandlers() noexcept {
     if (gbInstalled.load(std::memory_order_relaxed)) return;
     Action ours{};
     ours.sa_sigaction = OnFault;
-    ours.sa_flags = SA_SIGINFO | SA_ONSTACK | SA_NODEFER;  // what else is blocked, previous handlers say
+    ours.sa_flags = SA_SIGINFO | SA_ONSTACK | SA_NODEFER;  // a previous handler's mask says what to block
     for (FaultSignal& fault : gaFaults) {
         sigaction(fault.number, nullptr, &fault.previous);  // first: a fault may come at once
         sigaction(fault.number, &ours, nullptr);

@@ -17,7 +17,8 @@ int FirstOfCore(int number) noexcept {
     for (const char* const list : {"core_cpus_list", "thread_siblings_list"}) {  // the newer name first
         char path[96];
         std::snprintf(path, sizeof path, "/sys/devices/system/cpu/cpu%d/topology/%s", number, list);
-        const std::unique_ptr<std::FILE, int (*)(std::FILE*)> file(std::fopen(path, "re"), std::fclose);
+        // "c": no cancellation point, "e": no inheritance.
+        const std::unique_ptr<std::FILE, int (*)(std::FILE*)> file(std::fopen(path, "rce"), std::fclose);
         int first = -1;
         if (file != nullptr && std::fscanf(file.get(), "%d", &first) == 1) return first;
     }

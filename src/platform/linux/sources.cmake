@@ -5,8 +5,6 @@ set(ZANBASE_PLATFORM_SOURCES
     console.cpp
     futex.cpp
     guard.cpp
-    thread_kill.cpp
-    thread_kill_safety.cpp
     lock.cpp
     messages.cpp
     processors.cpp
@@ -15,4 +13,17 @@ set(ZANBASE_PLATFORM_SOURCES
     standard_stream.cpp
     terminal_window.cpp
     thread.cpp
-    thread_block.cpp)
+    thread_block.cpp
+    thread_kill.cpp
+    thread_kill_signal.cpp
+    thread_self.cpp
+    thread_wait.cpp)
+
+# Lets a killed thread first leave the C library, so that it leaves none of the library's locks held. Without it a
+# kill takes effect at once, and 150 lines that know the processor are not built; but a process with a thread killed
+# inside malloc or printf deadlocks.
+option(ZANBASE_KILL_SAFETY "Look at where a thread is before it is killed" ON)
+if(ZANBASE_KILL_SAFETY)
+    list(APPEND ZANBASE_PLATFORM_SOURCES thread_kill_safety.cpp)
+    add_compile_definitions(ZANBASE_KILL_SAFETY)
+endif()

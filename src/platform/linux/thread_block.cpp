@@ -1,145 +1,110 @@
-// The life of control blocks: making, waiting, ending and reuse.
+// Control blocks: the states of a thread's life, and the reuse of blocks.
 #include "platform/linux/thread_block.h"
 
 #include <climits>
 #include <cstdlib>
 #include <new>
 
+#include "platform/linux/thread_kill.h"
+#include "platform/linux/thread_self.h"
+#include "platform/linux/thread_wait.h"
 #include "platform/lock.h"
 
-ZANBASE_FAST_THREAD_LOCAL Self toSelf;
+BlockMutex goBlockMutex;
 
 namespace {
 
-HNativeLock goLock;                    // the block lock
-HNativeThread* gpoNewest = nullptr;    // all blocks ever made, by mpoOlder; guarded by the block lock
-HNativeThread* gpoFree = nullptr;      // guarded by the block lock
-HNativeThread* gpoUnjoined = nullptr;  // the Dead without a waiter; guarded by the block lock
-pthread_key_t gnExitKey;               // its value is the block of a thread that is Leaving
+HNativeLock goLock;                                                     // inside goBlockMutex
+HNativeThread* gpoNewest ZANBASE_GUARDED_BY(goBlockMutex) = nullptr;    // all blocks, by mpoOlder
+HNativeThread* gpoFree ZANBASE_GUARDED_BY(goBlockMutex) = nullptr;      // Ended, no waiter
+HNativeThread* gpoUnreaped ZANBASE_GUARDED_BY(goBlockMutex) = nullptr;  // Killed, no waiter
+pthread_key_t gnExitKey;  // the value is the thread's block until that is Ended
 
-void Put(HNativeThread*& list, HNativeThread* block) noexcept {
+void Push(HNativeThread*& list, HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
     block->mpoNext = list;
     list = block;
 }
 
-HNativeThread* TakeFrom(HNativeThread*& list) noexcept {
+HNativeThread* Pop(HNativeThread*& list) noexcept ZANBASE_REQUIRES(goBlockMutex) {
     HNativeThread* const block = list;
     if (block != nullptr) list = block->mpoNext;
     return block;
 }
 
-HNativeThread* NewBlock() noexcept {
-    if (HNativeThread* const block = TakeFrom(gpoFree)) return block;
-    void* const handler_stack = std::malloc(kHandlerStackBytes);
-    auto* const block = handler_stack != nullptr ? new (std::nothrow) HNativeThread{} : nullptr;
+HNativeThread* NewBlock() noexcept ZANBASE_REQUIRES(goBlockMutex) {
+    if (HNativeThread* const block = Pop(gpoFree)) return block;
+    void* const signal_stack = std::malloc(kSignalStackBytes);
+    auto* const block = signal_stack != nullptr ? new (std::nothrow) HNativeThread{} : nullptr;
     if (block == nullptr) {
-        std::free(handler_stack);
+        std::free(signal_stack);
         return nullptr;
     }
-    block->mpoHandlerStack = handler_stack;
+    block->mpoSignalStack = signal_stack;
     block->mpoOlder = gpoNewest;
     gpoNewest = block;
     return block;
 }
 
-void EmptySlot(HNativeThread* block) noexcept {
+void EmptySlot(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
     if (block->mpoSlot != nullptr) block->mpoSlot->store(nullptr, std::memory_order_release);
     block->mpoSlot = nullptr;
 }
 
-void MarkGone(HNativeThread* block) noexcept {
-    block->mState = ThreadState::Gone;
-    if (block->mnWaiters == 0) {
-        Put(gpoFree, block);
-    } else {
-        block->mnGeneration.fetch_add(1, std::memory_order_relaxed);
-    }
-}
-
-// The value of gnExitKey goes through here when the thread runs its exit routines, round after round as long
-// as values are set again. The round after the next comes behind every routine that doesn't do the same.
-void OnThreadExit(void* value) {
-    constexpr unsigned int kRounds = 3;  // the fourth and last is that of the sanitizers
+// TLS destructor of gnExitKey. Destructors run in up to four passes while one re-sets its value; re-arming
+// twice makes this one run in pass 3, after ordinary destructors. Pass 4 is the sanitizers'.
+void OnExitKey(void* value) {
+    constexpr unsigned int kPass = 3;
     auto* const block = static_cast<HNativeThread*>(value);
-    if (++toSelf.mnExitRounds < kRounds && pthread_setspecific(gnExitKey, block) == 0) return;
+    if (toSelf.mpoBlock == block) {
+        // The thread left its body past our frames: by pthread_exit below a C frame without unwind tables.
+        toSelf.mpoFrame = nullptr;
+        if (!CloseBlock(block)) return;
+    }
+    if (++toSelf.mnExitPasses < kPass && pthread_setspecific(gnExitKey, block) == 0) return;
     {
         const BlockLock lock;
-        MarkGone(block);
+        if (block->mState != ThreadState::Exiting) return;  // killed, and returned by RunUntilKilled
+        MarkEnded(block);
     }
-    WakeSleepers(block->mnGeneration, kEverySleeper);
+    WakeWaiters(block);
 }
 
-void RemoveWaiter(HNativeThread* block) noexcept {
-    toSelf.mpoAwaited = nullptr;
-    if (--block->mnWaiters != 0) return;
-    if (block->mState == ThreadState::Gone) Put(gpoFree, block);
-    if (block->mState == ThreadState::Dead) Put(gpoUnjoined, block);
-}
-
-// Joins a thread that is Dead, under the block lock, which is let go meanwhile. The caller holds one more
-// shield: what one thread has begun to join can't be joined by another. For the same reason it isn't to be
-// cancelled.
-void Join(HNativeThread* block) noexcept {
-    block->mState = ThreadState::Joining;
-    BlockLock::Give();
-    int state = 0;
-    pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &state);
-    pthread_join(block->moThread, nullptr);
-    pthread_setcancelstate(state, nullptr);
-    BlockLock::Take();
-    MarkGone(block);
-}
-
-// True if the calling thread, a waiter of the block, has left because the thread has ended; else `news` is
-// what it has heard of so far.
-bool RemoveWaiterIfEnded(HNativeThread* block, unsigned int& news) noexcept {
-    const Shield shield;
-    bool joined = false;
-    {
-        const BlockLock lock;
-        news = block->mnGeneration.load(std::memory_order_relaxed);
-        joined = block->mState == ThreadState::Dead;
-        if (joined) Join(block);
-        if (block->mState != ThreadState::Gone) return false;
-        RemoveWaiter(block);
-    }
-    if (joined) WakeSleepers(block->mnGeneration, kEverySleeper);
-    return true;
-}
-
-// The child of a fork has one thread. All others are gone without a trace, so what leads to them is cleared.
-void StartOverInChild() noexcept {
+// Clears what leads to the threads that the child of a fork does not have: all but the calling one.
+void ReleaseInChild() noexcept ZANBASE_RELEASE(goBlockMutex) {
     toSelf.mnNumber = 0;
-    pthread_setspecific(gnExitKey, nullptr);  // in case it forked while Leaving
-    gpoFree = gpoUnjoined = nullptr;
+    if (toSelf.mpoBlock == nullptr) pthread_setspecific(gnExitKey, nullptr);  // forked by a TLS destructor
+    gpoFree = gpoUnreaped = nullptr;
     for (HNativeThread* block = gpoNewest; block != nullptr; block = block->mpoOlder) {
         block->mnWaiters = 0;
         if (block == toSelf.mpoBlock) {
             block->mnNumber = CurrentThreadId();
         } else {
             EmptySlot(block);
-            MarkGone(block);
+            MarkEnded(block);
         }
     }
-    BlockLock::Give();
+    goBlockMutex.Release();
 }
+
+void AcquireBeforeFork() noexcept ZANBASE_ACQUIRE(goBlockMutex) { goBlockMutex.Acquire(); }
+void ReleaseInParent() noexcept ZANBASE_RELEASE(goBlockMutex) { goBlockMutex.Release(); }
 
 __attribute__((constructor)) void Prepare() {
     InitLock(&goLock);
-    if (pthread_key_create(&gnExitKey, OnThreadExit) != 0) gnExitKey = PTHREAD_KEYS_MAX;  // which none has
-    pthread_atfork(BlockLock::Take, BlockLock::Give, StartOverInChild);
+    if (pthread_key_create(&gnExitKey, OnExitKey) != 0) gnExitKey = PTHREAD_KEYS_MAX;  // no such key
+    pthread_atfork(AcquireBeforeFork, ReleaseInParent, ReleaseInChild);
 }
 
 }  // namespace
 
-void BlockLock::Take() noexcept {
-    Shield::Raise();
+void BlockMutex::Acquire() noexcept ZANBASE_NO_THREAD_SAFETY_ANALYSIS {  // this is the primitive
+    DeferKill::Begin();
     AcquireLock(&goLock);
 }
 
-void BlockLock::Give() noexcept {
+void BlockMutex::Release() noexcept ZANBASE_NO_THREAD_SAFETY_ANALYSIS {
     ReleaseLock(&goLock);
-    Shield::Drop();
+    DeferKill::End();
 }
 
 HNativeThread* OpenBlock(ThreadSlot& slot) noexcept {
@@ -149,9 +114,9 @@ HNativeThread* OpenBlock(ThreadSlot& slot) noexcept {
     block->mpoSlot = &slot;
     block->mState = ThreadState::Starting;
     block->mnPriority = kNormalPriority;
-    // A new thread inherits the priority of the one that made it; if that was changed, it has to be set back.
+    // A new thread inherits the nice value of the thread that makes it.
     block->mbPriorityPending = toSelf.mpoBlock != nullptr && toSelf.mpoBlock->mnPriority != kNormalPriority;
-    block->mbEndRequested = false;
+    block->mbKillRequested = false;
     block->moLastPlace = {};
     slot.store(block, std::memory_order_release);
     return block;
@@ -161,66 +126,55 @@ void AbandonBlock(HNativeThread* block) noexcept {
     {
         const BlockLock lock;
         EmptySlot(block);
-        MarkGone(block);
+        MarkEnded(block);
     }
-    WakeSleepers(block->mnGeneration, kEverySleeper);
+    WakeWaiters(block);
 }
 
-void CloseBlock(HNativeThread* block) noexcept {
+void EnterBlock(HNativeThread* block) noexcept {
+    toSelf.mpoBlock = block;
+    block->moThread = pthread_self();
+    block->mnNumber = CurrentThreadId();
+    block->mState = ThreadState::Running;
+    pthread_setspecific(gnExitKey, block);  // without memory for it, only OnExitKey's mend is lost
+}
+
+bool CloseBlock(HNativeThread* block) noexcept {
+    RemoveSignalStack();  // the next thread of the block uses the same memory
     const BlockLock lock;
     toSelf.mpoBlock = nullptr;
-    toSelf.mbEndPending = false;
-    EmptySlot(block);
+    toSelf.mbKillPending = false;
+    EmptySlot(block);  // no further waiter can come
     pthread_detach(block->moThread);
-    block->mState = ThreadState::Leaving;
-    // Nobody can come to wait any more.
-    if (block->mnWaiters == 0) {
-        MarkGone(block);
-    } else if (pthread_setspecific(gnExitKey, block) != 0) {
-        MarkGone(block);
-        WakeSleepers(block->mnGeneration, kEverySleeper);
+    const bool has_waiters = block->mnWaiters != 0;
+    if (has_waiters && pthread_setspecific(gnExitKey, block) == 0) {
+        block->mState = ThreadState::Exiting;
+        return true;
     }
+    pthread_setspecific(gnExitKey, nullptr);
+    MarkEnded(block);
+    if (has_waiters) WakeWaiters(block);
+    return false;
 }
 
-void MarkBlockDead(HNativeThread* block) noexcept {
-    {
-        const BlockLock lock;
-        toSelf.mpoBlock = nullptr;
-        if (toSelf.mpoAwaited != nullptr) RemoveWaiter(toSelf.mpoAwaited);
-        EmptySlot(block);
-        block->mState = ThreadState::Dead;
-        if (block->mnWaiters == 0) Put(gpoUnjoined, block);
-        block->mnGeneration.fetch_add(1, std::memory_order_relaxed);
-    }
-    WakeSleepers(block->mnGeneration, kEverySleeper);
+void MarkKilled(HNativeThread* block) noexcept {
+    EmptySlot(block);
+    block->mState = ThreadState::Killed;
+    if (block->mnWaiters == 0) Push(gpoUnreaped, block);
+    block->mnGeneration.fetch_add(1, std::memory_order_relaxed);
 }
 
-HNativeThread* AddWaiter(ThreadSlot& slot) noexcept {
-    const BlockLock lock;
-    HNativeThread* const block = slot.load(std::memory_order_relaxed);
-    if (block == nullptr || block == toSelf.mpoBlock) return block;
-    ++block->mnWaiters;
-    toSelf.mpoAwaited = block;
-    return block;
+void MarkEnded(HNativeThread* block) noexcept {
+    block->mState = ThreadState::Ended;
+    if (block->mnWaiters == 0) Push(gpoFree, block);
+    block->mnGeneration.fetch_add(1, std::memory_order_relaxed);
 }
 
-void WaitForThreadEnd(HNativeThread* block) noexcept {
-    for (unsigned int seen = 0; !RemoveWaiterIfEnded(block, seen);) WaitForNewGeneration(block, seen);
+void RemoveWaiter(HNativeThread* block) noexcept {
+    toSelf.mpoAwaited = nullptr;
+    if (--block->mnWaiters != 0) return;
+    if (block->mState == ThreadState::Ended) Push(gpoFree, block);
+    if (block->mState == ThreadState::Killed) Push(gpoUnreaped, block);
 }
 
-void WaitForNewGeneration(HNativeThread* block, unsigned int seen) noexcept {
-    const PendingWakeup sleeping(block->mnGeneration);
-    while (block->mnGeneration.load(std::memory_order_relaxed) == seen)
-        SleepWhile(block->mnGeneration, seen, nullptr);
-}
-
-void NotifyWaiters(HNativeThread* block) noexcept {
-    block->mnGeneration.fetch_add(1, std::memory_order_release);
-    WakeSleepers(block->mnGeneration, kEverySleeper);
-}
-
-void JoinTheUnjoined() noexcept {
-    const Shield shield;
-    const BlockLock lock;
-    while (HNativeThread* const block = TakeFrom(gpoUnjoined)) Join(block);
-}
+HNativeThread* TakeUnreaped() noexcept { return Pop(gpoUnreaped); }

@@ -1,44 +1,56 @@
-// The control block of a thread: what its owner, those who wait for it and the thread itself share.
+// The control block of a thread. Its owner, its waiters and the thread itself share it.
 //
-//   state      entered by                                     left by
-//   Starting   StartThread                                    the thread's first step; to Gone if none was made
-//   Live       the thread's first step                        the end of its body, or its death
-//   Leaving    the end of the body, somebody waiting          the last of the thread's exit routines
-//   Dead       the thread, where it was ended                 a waiter, or the next StartThread, who joins it
-//   Joining    who joins it                                   the same, when the system's thread is gone
-//   Gone       the end of the body, nobody waiting; above     a new StartThread
+//   state     meaning                                                              next state
+//   Starting  made by StartThread                                                  Running, or Ended if the
+//                                                                                  system made no thread
+//   Running   the thread has made its first step                                   Exiting, Ended or Killed
+//   Exiting   the body has ended; TLS destructors run, and a thread waits for them  Ended
+//   Killed    the thread makes a few last steps of our own; its stack remains      Reaping
+//   Reaping   a waiter, or the next StartThread, is in pthread_join for it         Ended
+//   Ended     only waiters use the block                                           Starting, after the free list
 //
-// A slot leads to a block only while it is Starting or Live, and not even then once the thread was forgotten.
-// A thread that comes to its end detaches itself. One that died can't: the C library has not seen it go, and
-// reclaims its stack when somebody joins it.
+// A slot points to a block only while the block is Starting or Running, and no longer after DetachThread.
+// A thread whose body ends calls pthread_detach for itself. A killed thread can't, so another thread has to
+// call pthread_join before the C library reuses its stack.
 //
-// A block goes on the free list when it is Gone and nobody waits any more. It never goes back to the heap, so
-// a wake-up that comes late finds memory.
-//
-// One lock guards all blocks and lists. It is held for a few instructions, always under a shield, so no
-// thread is ended while it holds the lock or waits for it.
+// A block that is Ended and has no waiter is put on the free list. Blocks are never deleted, so a late wake-up
+// finds valid memory.
 #ifndef ZANBASE_PLATFORM_LINUX_THREAD_BLOCK_H
 #define ZANBASE_PLATFORM_LINUX_THREAD_BLOCK_H
 
-#include <atomic>
-#include <cstddef>
 #include <cstdint>
 
 #include <pthread.h>
 
-#include "platform/linux/thread_self.h"
+#include "platform/linux/futex.h"
+#include "platform/thread.h"
+#include "platform/thread_annotations.h"
 
-enum class ThreadState { Starting, Live, Leaving, Dead, Joining, Gone };
+// The lock for all blocks and lists. It is held for a few instructions and only while kills are deferred, so
+// no thread is killed while it holds the lock or waits for it.
+class ZANBASE_CAPABILITY("mutex") BlockMutex {
+public:
+    void Acquire() noexcept ZANBASE_ACQUIRE();
+    void Release() noexcept ZANBASE_RELEASE();
+};
+extern BlockMutex goBlockMutex;
 
-// Where a thread stands: the instruction and the end of its stack.
+// Holds the block mutex for a scope.
+class ZANBASE_SCOPED_CAPABILITY BlockLock {
+public:
+    BlockLock() noexcept ZANBASE_ACQUIRE(goBlockMutex) { goBlockMutex.Acquire(); }
+    ~BlockLock() ZANBASE_RELEASE() { goBlockMutex.Release(); }
+    BlockLock(const BlockLock&) = delete;
+    BlockLock& operator=(const BlockLock&) = delete;
+};
+
+enum class ThreadState { Starting, Running, Exiting, Killed, Reaping, Ended };
+
+// Where a thread is: its instruction and the top of its stack.
 struct ThreadPlace {
     std::uintptr_t mnCode;
     std::uintptr_t mnStack;
 };
-
-// Room for the signal handlers of a thread that has used up its stack, a program's own crash handler
-// included.
-constexpr std::size_t kHandlerStackBytes = 32768;
 
 constexpr int kNormalPriority = 3;  // the level of the process itself
 
@@ -47,66 +59,54 @@ struct HNativeThread {
     void (*mpfnBody)(void*);
     void* mpoArgument;
     HNativeThread* mpoOlder;  // the block made before this one
-    void* mpoHandlerStack;    // owned; kHandlerStackBytes
+    void* mpoSignalStack;     // owned; kSignalStackBytes
 
-    // Guarded by the block lock.
-    HNativeThread* mpoNext;  // on the free list or the list of the unjoined
-    ThreadSlot* mpoSlot;     // the slot that leads here, or null
-    ThreadState mState;
-    unsigned int mnWaiters;  // threads inside JoinThread or KillThread
-    pthread_t moThread;      // from Live on
-    unsigned int mnNumber;   // from Live on
-    int mnPriority;          // the one wanted
-    bool mbPriorityPending;  // left to the first step to apply
+    HNativeThread* mpoNext ZANBASE_GUARDED_BY(goBlockMutex);  // on the list of free or of unreaped blocks
+    ThreadSlot* mpoSlot ZANBASE_GUARDED_BY(goBlockMutex);     // the slot that points here, or null
+    ThreadState mState ZANBASE_GUARDED_BY(goBlockMutex);
+    unsigned int mnWaiters ZANBASE_GUARDED_BY(goBlockMutex);  // threads inside JoinThread or KillThread
+    pthread_t moThread ZANBASE_GUARDED_BY(goBlockMutex);      // valid from Running on
+    unsigned int mnNumber ZANBASE_GUARDED_BY(goBlockMutex);   // valid from Running on
+    int mnPriority ZANBASE_GUARDED_BY(goBlockMutex);          // the level wanted
+    bool mbPriorityPending ZANBASE_GUARDED_BY(goBlockMutex);  // the first step has to apply it
 
-    FutexWord mnGeneration;  // goes up, under the block lock, whenever waiters have to look again
+    // Counts the events after which waiters must look at the block again. They sleep on it.
+    FutexWord mnGeneration;
 
-    std::atomic<bool> mbEndRequested;  // never taken back
-    unsigned int mnAskedAt;            // the tick when it was requested first
+    // Written under the block mutex before the kill signal is sent, read by its handler.
+    std::atomic<bool> mbKillRequested;  // stays true
+    std::atomic<bool> mbOutputIsHeld;   // StandardOutputIsHeld at the last request
+    unsigned int mnKillRequestedAt;     // the tick of the first request
 
-    // Used by the thread's own signal handler alone: where it was found last, and since which tick.
+    // Accessed only by the thread's signal handler: the last place seen, and the tick from which on.
     ThreadPlace moLastPlace;
     unsigned int mnLastPlaceSince;
 };
 
-// Holds the block lock for a scope.
-class BlockLock {
-public:
-    BlockLock() noexcept { Take(); }
-    ~BlockLock() { Give(); }
-    BlockLock(const BlockLock&) = delete;
-    BlockLock& operator=(const BlockLock&) = delete;
-
-    static void Take() noexcept;
-    static void Give() noexcept;
-};
-
-// A block in state Starting for `slot`, which leads to it from now on; null if there is no memory.
+// Makes `slot` point to a block in state Starting and returns it; null if there is no memory.
 HNativeThread* OpenBlock(ThreadSlot& slot) noexcept;
 
-// No thread came of the block.
+// Ends a block for which the system made no thread.
 void AbandonBlock(HNativeThread* block) noexcept;
 
-// The calling thread, that of the block, has come to the end of its body.
-void CloseBlock(HNativeThread* block) noexcept;
+// Makes `block` the calling thread's own and Running.
+void EnterBlock(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex);
 
-// The calling thread, that of the block, dies, and waits for nobody any more.
-void MarkBlockDead(HNativeThread* block) noexcept;
+// Ends the calling thread's ownership of its block at the end of the body. True if TLS destructors have to
+// run before the block is Ended.
+bool CloseBlock(HNativeThread* block) noexcept;
 
-// Makes the calling thread a waiter of the block in `slot`, unless it is its own, and gives the block; null
-// if the slot is empty.
-HNativeThread* AddWaiter(ThreadSlot& slot) noexcept;
+// Empties the slot and makes the block Killed. Its thread makes no further step in a body, and uses the block no
+// more.
+void MarkKilled(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex);
 
-// Waits, as a waiter of the block, until its thread has ended, and leaves.
-void WaitForThreadEnd(HNativeThread* block) noexcept;
+// Makes the block Ended. The caller wakes the waiters after it has released the block mutex.
+void MarkEnded(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex);
 
-// Sleeps, as a waiter of the block and not under the block lock, until there is more news than `seen`.
-void WaitForNewGeneration(HNativeThread* block, unsigned int seen) noexcept;
+// Ends the calling thread's wait for the block.
+void RemoveWaiter(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex);
 
-// Tells the waiters to look again.
-void NotifyWaiters(HNativeThread* block) noexcept;
-
-// Joins the threads that died with nobody waiting.
-void JoinTheUnjoined() noexcept;
+// Takes a Killed block without waiters off its list; null if there is none.
+HNativeThread* TakeUnreaped() noexcept ZANBASE_REQUIRES(goBlockMutex);
 
 #endif

@@ -1,44 +1,69 @@
-// Ending a thread from outside: a signal of our own makes it leave by the bare system call.
+// Asynchronous termination: the handler of a real-time signal exits the thread by the raw exit system call.
 //
-// Nothing of the thread runs after that, so nothing puts in order what it was in the middle of. Memory that
-// the C library holds for it is lost: its cache of free blocks and its list of thread-exit routines. A lock
-// of the C library that it holds would stay held, malloc's for instance, and stop every other thread sooner
-// or later. So a thread that the signal finds inside the library's code is let go on, and is asked again a
-// moment later; see MayHoldLibraryLock.
+// No destructors, cancellation handlers or TLS destructors run; the C library's per-thread caches leak. A lock of
+// the C library that the thread holds, such as malloc's, would stay held and stop all other threads. So the
+// handler lets a thread that may hold one continue (see thread_kill_safety.h), and KillThread asks again.
 #include "platform/linux/thread_kill.h"
 
 #include <cerrno>
 #include <climits>
-#include <csetjmp>
 
 #include <pthread.h>
 #include <signal.h>
+#include <sys/syscall.h>
+#include <unistd.h>
 
 #include "platform/clock.h"
-#include "platform/linux/thread_block.h"
+#include "platform/linux/cancellation.h"
 #include "platform/linux/thread_kill_safety.h"
+#include "platform/linux/thread_kill_signal.h"
+#include "platform/linux/thread_wait.h"
 
 namespace {
 
-std::atomic<int> gnEndSignal{0};  // 0: none; written under the block lock
-
-#ifdef ZANBASE_THREAD_SANITIZER  // has to see a thread end in good order
-ZANBASE_FAST_THREAD_LOCAL sigjmp_buf toWayOut;
-#endif
-
-// The destructors of thread-specific data don't run, and the next thread on the same stack must not see the
-// values.
+// Clears the values of thread-specific data, whose destructors must not run. The next thread on the same stack
+// would find the values otherwise. The thread sanitizer keeps its record of the thread there.
 void DropThreadKeys() noexcept {
-#ifndef ZANBASE_THREAD_SANITIZER  // which finds its own record of the thread there
+    if (IsThreadSanitizerOn()) return;
     for (pthread_key_t key = 0; key < PTHREAD_KEYS_MAX; ++key) pthread_setspecific(key, nullptr);
-#endif
 }
 
-void OnEndSignal(int, siginfo_t*, void* context) {
+// Asks the thread of `block` to exit and waits until it has done so or has put it off. True if it has to be
+// asked again.
+// Requires: the calling thread is a waiter of the block.
+bool RequestKill(HNativeThread* block) noexcept {
+    const bool output_is_held = StandardOutputIsHeld();
+    unsigned int seen = 0;
+    {
+        const BlockLock lock;
+        seen = block->mnGeneration.load(std::memory_order_relaxed);
+        if (!block->mbKillRequested) block->mnKillRequestedAt = ReadTicks();
+        block->mbOutputIsHeld = output_is_held;
+        block->mbKillRequested = true;
+        if (block->mState == ThreadState::Running) {
+            const int signal = KillSignal();
+            if (signal == 0) return false;
+            // The thread can't end while this one holds the mutex, so the number is still its own.
+            if (syscall(SYS_tgkill, getpid(), block->mnNumber, signal) != 0) {
+                if (errno != ESRCH) return true;  // the queue of signals is full
+                MarkKilled(block);                // the thread has called exit(2) by itself
+                return false;
+            }
+        } else if (block->mState != ThreadState::Starting) {
+            return false;
+        }
+    }
+    WaitForNewGeneration(block, seen);
+    return true;
+}
+
+}  // namespace
+
+void OnKillSignal(int, siginfo_t*, void* context) {
     HNativeThread* const block = toSelf.mpoBlock;
-    if (block == nullptr || !block->mbEndRequested.load(std::memory_order_relaxed)) return;  // not from us
-    if (toSelf.mnShields != 0) {
-        toSelf.mbEndPending = true;
+    if (block == nullptr || !block->mbKillRequested.load(std::memory_order_relaxed)) return;  // not from us
+    if (toSelf.mnKillDeferrals != 0) {
+        toSelf.mbKillPending = true;
         return;
     }
     const int error = errno;
@@ -47,94 +72,39 @@ void OnEndSignal(int, siginfo_t*, void* context) {
     errno = error;
 }
 
-using Action = struct sigaction;
-
-bool IsOurs(int signal) noexcept {
-    Action action{};
-    return signal != 0 && sigaction(signal, nullptr, &action) == 0 && (action.sa_flags & SA_SIGINFO) != 0 &&
-           action.sa_sigaction == OnEndSignal;
-}
-
-// The end signal, chosen anew if a part of the program took it over; 0 if every real-time signal is in use.
-int EndSignal() noexcept {
-    if (IsOurs(gnEndSignal)) return gnEndSignal;
-    Action ours{};
-    ours.sa_sigaction = OnEndSignal;
-    ours.sa_flags = SA_SIGINFO | SA_ONSTACK | SA_RESTART;
-    sigfillset(&ours.sa_mask);
-    for (int signal = SIGRTMAX - 1; signal >= SIGRTMIN; --signal) {
-        Action action{};
-        sigaction(signal, nullptr, &action);
-        if ((action.sa_flags & SA_SIGINFO) != 0 || action.sa_handler != SIG_DFL) continue;
-        sigaction(signal, &ours, nullptr);
-        return gnEndSignal = signal;
-    }
-    return gnEndSignal = 0;
-}
-
-// Asks a thread to die and waits until it has died or put that off. False if nothing is left to ask for, or
-// no signal to ask with.
-bool AskToDie(HNativeThread* block) noexcept {
-    unsigned int news = 0;
-    {
-        const BlockLock lock;
-        news = block->mnGeneration.load(std::memory_order_relaxed);
-        if (!block->mbEndRequested) block->mnAskedAt = ReadTicks();
-        block->mbEndRequested = true;
-        if (block->mState == ThreadState::Live) {
-            const int signal = EndSignal();
-            if (signal == 0) return false;
-            // It can't get past its last step now, so the number is still its own. The queue may be full.
-            if (syscall(SYS_tgkill, getpid(), block->mnNumber, signal) != 0) return true;
-        } else if (block->mState != ThreadState::Starting) {
-            return false;
-        }
-    }
-    WaitForNewGeneration(block, news);
-    return true;
-}
-
-}  // namespace
-
-void ChooseEndSignal() noexcept {
-    if (gnEndSignal.load(std::memory_order_relaxed) != 0) return;
-    FindLibraryCode();
-    const BlockLock lock;
-    EndSignal();
-}
-
-void UnblockEndSignal() noexcept {
-    sigset_t signals;
-    sigemptyset(&signals);
-    sigaddset(&signals, gnEndSignal);
-    pthread_sigmask(SIG_UNBLOCK, &signals, nullptr);
-}
-
 void KillThread(ThreadSlot& slot) noexcept {
     HNativeThread* const block = AddWaiter(slot);
     if (block == nullptr) return;
     if (block == toSelf.mpoBlock) ExitKilledThread();
-    // Time for the thread to get on: asked again at once it might never leave its signal handler.
+    const NoCancellation no_cancellation;
+    // Without a pause the thread might never leave its signal handler.
     constexpr timespec kPause{0, 50000};
-    while (AskToDie(block)) nanosleep(&kPause, nullptr);
+    while (RequestKill(block)) nanosleep(&kPause, nullptr);
     WaitForThreadEnd(block);
 }
 
 void ExitKilledThread() noexcept {
-    Shield::Raise();  // for ever
+    DeferKill::Begin();  // for ever
     ForwardPendingWakeups();
+    AbandonWait();
     DropThreadKeys();
-    MarkBlockDead(toSelf.mpoBlock);
-#ifdef ZANBASE_THREAD_SANITIZER
-    siglongjmp(toWayOut, 1);
-#else
+    HNativeThread* const block = toSelf.mpoBlock;
+    {
+        const BlockLock lock;
+        toSelf.mpoBlock = nullptr;
+        MarkKilled(block);
+    }
+    WakeWaiters(block);
+    if (toSelf.mpoKilledExit != nullptr) siglongjmp(*toSelf.mpoKilledExit, 1);
     for (;;) syscall(SYS_exit, 0);
-#endif
 }
 
-void RunUntilDeath(void (*body)(HNativeThread*), HNativeThread* block) {
-#ifdef ZANBASE_THREAD_SANITIZER
-    if (sigsetjmp(toWayOut, 1) != 0) return;
-#endif
+void RunUntilKilled(void (*body)(HNativeThread*), HNativeThread* block) {
+    // The thread sanitizer waits in pthread_join until it has seen the thread return.
+    sigjmp_buf killed_exit;
+    if (IsThreadSanitizerOn()) {
+        if (sigsetjmp(killed_exit, 1) != 0) return;
+        toSelf.mpoKilledExit = &killed_exit;
+    }
     body(block);
 }

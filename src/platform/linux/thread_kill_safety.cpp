@@ -1,19 +1,21 @@
 // A thread may hold a lock of the C library while it executes the library's code, or code that the kernel
-// lends to it. It can stay there for long in a system call only; of those places these are taken for safe:
+// provides for it (the vDSO). It can stay there for long only in a system call. These places count as safe:
 //
-// - In sched_yield: the library doesn't call that under a lock, and a thread may do nothing else.
-// - In a wait of ours: it came through the library's bare system call.
-// - Behind a system call that the signal has cut short: the library makes no such call under its own locks,
-//   and the thread must not go on as if the wait were over.
-// - At the same system call with the same stack for a while: it waits for input, or for a mutex of the
-//   program. The library's own locks are free again sooner, unless the machine is very busy.
+// - sched_yield: the library does not call it under a lock, and a thread may do nothing else.
+// - A wait of this back end: it uses the library's syscall function, without a lock of the library.
+// - Behind a system call that the signal has made fail with EINTR: the library makes no such call under its own
+//   locks, and the program must not see the error.
+// - The same system call with the same stack for kBlockedMs: the thread waits for input, or for a mutex of the
+//   program. The library's own locks are released sooner, unless the machine is very busy. As long as a thread
+//   holds the lock of stdout or stderr, kOutputMs replaces this limit: a full pipe may be read meanwhile.
 //
-// What remains: a thread that waits for room in a stream (a full pipe, say) dies with the stream locked, and
-// so does one that executes the program's code under a lock of the library, as a callback of dl_iterate_phdr.
+// What remains: a thread that waits longer for room in a pipe, or for input of a stream, is killed with the stream
+// locked. So is a thread that executes the program's code under a lock of the library, such as a callback of
+// dl_iterate_phdr.
 #include "platform/linux/thread_kill_safety.h"
 
 #include <algorithm>
-#include <cerrno>
+#include <cstdio>
 #include <iterator>
 
 #include <dlfcn.h>
@@ -21,10 +23,10 @@
 #include <link.h>
 #include <sched.h>
 #include <sys/auxv.h>
-#include <ucontext.h>
 
 #include "platform/clock.h"
-#include "platform/linux/thread_block.h"
+#include "platform/linux/thread_kill.h"
+#include "platform/linux/thread_place.h"
 
 namespace {
 
@@ -38,14 +40,13 @@ struct LibraryCode {
     std::size_t count;
 };
 
-LibraryCode goLibraryCode{};  // complete before the first thread is made
+LibraryCode goLibraryCode{};          // written once, before the first thread is made
+std::atomic<bool> gbSearched{false};  // written under the block mutex
 
-// A thread that is never found outside the library, as one that fills memory in a loop, is given up after
-// this time, and with it what it holds.
-constexpr unsigned int kPatienceMs = 10000;
-
-// What stands at one system call for so long waits there.
-constexpr unsigned int kWaitMs = 10;
+// Limits in milliseconds.
+constexpr unsigned int kGiveUpMs = 10000;  // since the request, for a thread never found outside the library
+constexpr unsigned int kOutputMs = 1000;   // since the request, see above
+constexpr unsigned int kBlockedMs = 10;    // at one system call
 
 bool Contains(const dl_phdr_info* module, std::uintptr_t address) noexcept {
     return std::any_of(module->dlpi_phdr, module->dlpi_phdr + module->dlpi_phnum, [=](const auto& segment) {
@@ -59,12 +60,12 @@ struct Search {
     LibraryCode found;
 };
 
-// Notes the code of a module in which a mark lies. The program itself, the module without a name, is left
-// out, also if it brings an allocator: its own code isn't library code.
-int NoteLibraryCode(dl_phdr_info* module, std::size_t, void* argument) {
+// Records the code of a module that contains a mark. The program itself, the module without a name, is left out
+// even if it contains an allocator, because its other code is not library code.
+int RecordLibraryCode(dl_phdr_info* module, std::size_t, void* argument) {
     auto& [marks, found] = *static_cast<Search*>(argument);
-    const auto lies_here = [=](std::uintptr_t mark) { return Contains(module, mark); };
-    if (module->dlpi_name[0] == '\0' || std::none_of(std::begin(marks), std::end(marks), lies_here)) return 0;
+    const auto is_here = [=](std::uintptr_t mark) { return Contains(module, mark); };
+    if (module->dlpi_name[0] == '\0' || std::none_of(std::begin(marks), std::end(marks), is_here)) return 0;
     for (int i = 0; i < module->dlpi_phnum; ++i) {
         const auto& segment = module->dlpi_phdr[i];
         if (segment.p_type != PT_LOAD || (segment.p_flags & PF_X) == 0) continue;
@@ -75,70 +76,63 @@ int NoteLibraryCode(dl_phdr_info* module, std::size_t, void* argument) {
     return 0;
 }
 
-bool InLibraryCode(std::uintptr_t code) noexcept {
+bool IsLibraryCode(std::uintptr_t code) noexcept {
     return std::any_of(std::begin(goLibraryCode.ranges), std::end(goLibraryCode.ranges),
                        [=](const CodeRange& range) { return range.begin <= code && code < range.end; });
 }
 
-// Where the context of a signal handler says that the thread stands, and whether a system call has just been
-// cut short there. Elsewhere nothing is known, and a thread dies where it is.
-#if defined(__x86_64__) && \
-    !defined(ZANBASE_THREAD_SANITIZER)  // which may show a place that was left long ago
-
-constexpr bool kKnowsPlaces = true;
-
-ThreadPlace PlaceIn(const ucontext_t& context) noexcept {
-    const auto& registers = context.uc_mcontext.gregs;
-    return {static_cast<std::uintptr_t>(registers[REG_RIP]), static_cast<std::uintptr_t>(registers[REG_RSP])};
+bool IsYield(std::uintptr_t code) noexcept {
+    constexpr std::uintptr_t kYieldBytes = 16;
+    return code - reinterpret_cast<std::uintptr_t>(&sched_yield) < kYieldBytes;
 }
 
-// May also be asked for the two bytes before and behind a range of code.
-bool IsSystemCall(std::uintptr_t code) noexcept {
-    const auto* const bytes = reinterpret_cast<const unsigned char*>(code);
-    return bytes[0] == 0x0f && bytes[1] == 0x05;
+bool IsWaitOfOurs() noexcept {
+    return toPendingWakeups.mpoWord != nullptr || toPendingWakeups.mpoCondition != nullptr;
 }
 
-bool IsCutShort(const ucontext_t& context) noexcept {
-    return context.uc_mcontext.gregs[REG_RAX] == -EINTR && IsSystemCall(PlaceIn(context).mnCode - 2);
+bool IsHeld(std::FILE* stream) noexcept {
+    if (ftrylockfile(stream) != 0) return true;
+    funlockfile(stream);
+    return false;
 }
-
-#else
-
-constexpr bool kKnowsPlaces = false;
-ThreadPlace PlaceIn(const ucontext_t&) noexcept { return {}; }
-bool IsSystemCall(std::uintptr_t) noexcept { return false; }
-bool IsCutShort(const ucontext_t&) noexcept { return false; }
-
-#endif
 
 }  // namespace
 
-// The search takes locks of the loader, so it isn't made under the block lock: whoever holds those may want
-// that.
 void FindLibraryCode() noexcept {
+    // Elsewhere a thread is killed wherever it is. The thread sanitizer may show a place that was left long ago.
+    if (!kKnowsPlaces || IsThreadSanitizerOn() || gbSearched.load(std::memory_order_acquire)) return;
     Search search{
         {reinterpret_cast<std::uintptr_t>(&gnu_get_libc_version),
-         getauxval(AT_BASE),          // the loader
-         getauxval(AT_SYSINFO_EHDR),  // what the kernel lends to the library
-         reinterpret_cast<std::uintptr_t>(dlsym(RTLD_DEFAULT, "malloc"))},  // may come from elsewhere
+         getauxval(AT_BASE),                                                // the loader
+         getauxval(AT_SYSINFO_EHDR),                                        // the vDSO
+         reinterpret_cast<std::uintptr_t>(dlsym(RTLD_DEFAULT, "malloc"))},  // may be another library's
         {}};
-    if (kKnowsPlaces) dl_iterate_phdr(NoteLibraryCode, &search);
+    dl_iterate_phdr(RecordLibraryCode, &search);
     const BlockLock lock;
-    if (goLibraryCode.count == 0) goLibraryCode = search.found;
+    if (!gbSearched) goLibraryCode = search.found;
+    gbSearched = true;
+}
+
+bool StandardOutputIsHeld() noexcept {
+    const DeferKill defer_kill;
+    return IsHeld(stdout) || IsHeld(stderr);
 }
 
 bool MayHoldLibraryLock(HNativeThread* block, const void* context) noexcept {
     const auto& interrupted = *static_cast<const ucontext_t*>(context);
     const ThreadPlace place = PlaceIn(interrupted);
-    constexpr std::uintptr_t kYieldBytes = 16;
-    const bool yields = place.mnCode - reinterpret_cast<std::uintptr_t>(&sched_yield) < kYieldBytes;
-    const bool waits_for_us = toPendingWakeups.mpoWord != nullptr || toPendingWakeups.mpoCondition != nullptr;
-    if (!InLibraryCode(place.mnCode) || yields || waits_for_us || IsCutShort(interrupted)) return false;
+    if (!IsLibraryCode(place.mnCode) || IsYield(place.mnCode) || IsWaitOfOurs() ||
+        IsInterruptedCall(interrupted))
+        return false;
     const unsigned int now = ReadTicks();
+    const unsigned int asked_for = now - block->mnKillRequestedAt;
+    const bool is_call = IsSystemCall(place.mnCode);
+    const bool output_is_held = block->mbOutputIsHeld.load(std::memory_order_relaxed);
     ThreadPlace& last = block->moLastPlace;
-    if (!IsSystemCall(place.mnCode) || place.mnCode != last.mnCode || place.mnStack != last.mnStack) {
+    if (!is_call || output_is_held || place.mnCode != last.mnCode || place.mnStack != last.mnStack) {
         last = place;
         block->mnLastPlaceSince = now;
     }
-    return now - block->mnLastPlaceSince < kWaitMs && now - block->mnAskedAt < kPatienceMs;
+    return now - block->mnLastPlaceSince < kBlockedMs &&
+           asked_for < (is_call && output_is_held ? kOutputMs : kGiveUpMs);
 }

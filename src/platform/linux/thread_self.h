@@ -1,48 +1,38 @@
-// What a thread knows about itself, and the shield under which it can't be ended.
+// What the back end keeps for each thread.
 #ifndef ZANBASE_PLATFORM_LINUX_THREAD_SELF_H
 #define ZANBASE_PLATFORM_LINUX_THREAD_SELF_H
 
-#include "platform/linux/restartable.h"  // the thread sanitizer, too
-#include "platform/thread.h"
+#include <csetjmp>
+#include <cstddef>
+
+#include "platform/linux/build.h"
 
 struct FaultFrame;
+struct HNativeThread;
 
-// One a thread, all zero at its start. Only the thread itself and its signal handlers use it.
-struct Self {
-    HNativeThread* mpoBlock;          // null on a thread not started here, and from its last step on
-    HNativeThread* mpoAwaited;        // whose end it waits for; counted there as a waiter
-    FaultFrame* mpoFrame;             // the innermost one
-    volatile unsigned int mnShields;  // while not 0 the thread isn't ended, and its faults are ours
-    volatile bool mbEndPending;       // somebody asked for the end while a shield was up
-    unsigned int mnNumber;            // 0: not asked for yet
-    unsigned int mnExitRounds;        // see OnThreadExit
+// One per thread, all zero at its start. Accessed only by the thread itself and by its signal handlers.
+struct ThreadSelf {
+    HNativeThread* mpoBlock;    // null on a thread that StartThread did not make, and once its body has ended
+    HNativeThread* mpoAwaited;  // the block that counts this thread as a waiter, or null
+    FaultFrame* mpoFrame;       // the innermost frame of RunGuarded, or null
+    sigjmp_buf* mpoKilledExit;  // see RunUntilKilled
+    volatile unsigned int mnKillDeferrals;  // see DeferKill
+    volatile bool mbKillPending;            // a kill arrived while it was deferred
+    bool mbHasSignalStack;                  // InstallSignalStack installed one
+    unsigned int mnNumber;                  // the system's number of the thread; 0: not asked for yet
+    unsigned int mnExitPasses;              // passes of TLS destructors so far
 };
 
-extern ZANBASE_FAST_THREAD_LOCAL Self toSelf;
+extern ZANBASE_FAST_THREAD_LOCAL ThreadSelf toSelf;
 
-// Makes the signals of machine faults come to the frames, once for the whole process.
-void InstallFaultHandlers() noexcept;
+// Enough for a crash handler of the program that runs after the stack is used up.
+constexpr std::size_t kSignalStackBytes = 32768;
 
-// Ends the calling thread at once: nothing of it runs any more. No shield may be up.
-[[noreturn]] void ExitKilledThread() noexcept;
+// Makes the calling thread run signal handlers on `stack`, of kSignalStackBytes, so that they can run after its
+// own stack is used up. Keeps an alternate stack that is set already, such as a sanitizer's.
+void InstallSignalStack(void* stack) noexcept;
 
-// Keeps the calling thread from being ended for a scope; a request that comes meanwhile is met at its end.
-class Shield {
-public:
-    Shield() noexcept { Raise(); }
-    ~Shield() { Drop(); }
-    Shield(const Shield&) = delete;
-    Shield& operator=(const Shield&) = delete;
-
-    static void Raise() noexcept {
-        toSelf.mnShields = toSelf.mnShields + 1;
-        std::atomic_signal_fence(std::memory_order_seq_cst);
-    }
-    static void Drop() noexcept {
-        std::atomic_signal_fence(std::memory_order_seq_cst);
-        toSelf.mnShields = toSelf.mnShields - 1;
-        if (__builtin_expect(toSelf.mbEndPending, false) && toSelf.mnShields == 0) ExitKilledThread();
-    }
-};
+// Undoes InstallSignalStack.
+void RemoveSignalStack() noexcept;
 
 #endif

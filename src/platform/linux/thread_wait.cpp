@@ -1,0 +1,80 @@
+// Waiting for the end of a thread, and pthread_join for the killed ones.
+#include "platform/linux/thread_wait.h"
+
+#include "platform/linux/cancellation.h"
+#include "platform/linux/thread_kill.h"
+#include "platform/linux/thread_self.h"
+
+namespace {
+
+// Reclaims the stack of a Killed thread. Releases the block mutex meanwhile.
+// Requires: kills are deferred once more than the mutex does, because a second pthread_join can't replace one
+// that was begun.
+void Reap(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
+    block->mState = ThreadState::Reaping;
+    const pthread_t thread = block->moThread;
+    goBlockMutex.Release();
+    {
+        const NoCancellation no_cancellation;
+        pthread_join(thread, nullptr);
+    }
+    goBlockMutex.Acquire();
+    MarkEnded(block);
+}
+
+// True if the thread of the block has ended; the calling thread is no waiter any more. Otherwise false, with the
+// block's generation in `seen`.
+bool RemoveWaiterIfEnded(HNativeThread* block, unsigned int& seen) noexcept {
+    const DeferKill defer_kill;
+    bool is_reaper = false;
+    {
+        const BlockLock lock;
+        seen = block->mnGeneration.load(std::memory_order_relaxed);
+        is_reaper = block->mState == ThreadState::Killed;
+        if (is_reaper) Reap(block);
+        if (block->mState != ThreadState::Ended) return false;
+        RemoveWaiter(block);
+    }
+    if (is_reaper) WakeWaiters(block);
+    return true;
+}
+
+}  // namespace
+
+HNativeThread* AddWaiter(ThreadSlot& slot) noexcept {
+    const BlockLock lock;
+    HNativeThread* const block = slot.load(std::memory_order_relaxed);
+    if (block == nullptr || block == toSelf.mpoBlock) return block;
+    ++block->mnWaiters;
+    toSelf.mpoAwaited = block;
+    return block;
+}
+
+void WaitForThreadEnd(HNativeThread* block) noexcept {
+    for (unsigned int seen = 0; !RemoveWaiterIfEnded(block, seen);) WaitForNewGeneration(block, seen);
+}
+
+void AbandonWait() noexcept {
+    if (toSelf.mpoAwaited == nullptr) return;
+    const BlockLock lock;
+    RemoveWaiter(toSelf.mpoAwaited);
+}
+
+void WaitForNewGeneration(HNativeThread* block, unsigned int seen) noexcept {
+    const PendingWakeup pending(block->mnGeneration);
+    while (block->mnGeneration.load(std::memory_order_relaxed) == seen)
+        SleepWhile(block->mnGeneration, seen, nullptr);
+}
+
+void WakeWaiters(HNativeThread* block) noexcept { WakeSleepers(block->mnGeneration, kEverySleeper); }
+
+void NotifyWaiters(HNativeThread* block) noexcept {
+    block->mnGeneration.fetch_add(1, std::memory_order_release);
+    WakeWaiters(block);
+}
+
+void ReapKilledThreads() noexcept {
+    const DeferKill defer_kill;
+    const BlockLock lock;
+    while (HNativeThread* const block = TakeUnreaped()) Reap(block);
+}

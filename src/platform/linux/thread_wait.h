@@ -1,0 +1,31 @@
+// Waiting for the end of a thread. Every number of threads may wait for one; each is counted in its block.
+#ifndef ZANBASE_PLATFORM_LINUX_THREAD_WAIT_H
+#define ZANBASE_PLATFORM_LINUX_THREAD_WAIT_H
+
+#include "platform/linux/thread_block.h"
+
+// Counts the calling thread as a waiter of the block in `slot` and returns that block; null if the slot is
+// empty. A thread does not become a waiter of its own block.
+HNativeThread* AddWaiter(ThreadSlot& slot) noexcept;
+
+// Waits until the thread of `block` has ended. The calling thread is no waiter after that.
+// Requires: it is a waiter of the block.
+void WaitForThreadEnd(HNativeThread* block) noexcept;
+
+// Ends the wait of the calling thread, if it is a waiter, because the code that waits will not run again.
+void AbandonWait() noexcept;
+
+// Sleeps until the block's generation differs from `seen`.
+// Requires: the calling thread is a waiter of the block and does not hold the block mutex.
+void WaitForNewGeneration(HNativeThread* block, unsigned int seen) noexcept;
+
+// Wakes the waiters of `block` after a change of its generation. The block may be in other use by now.
+void WakeWaiters(HNativeThread* block) noexcept;
+
+// Makes the waiters look at the block again.
+void NotifyWaiters(HNativeThread* block) noexcept;
+
+// Reclaims the stacks of killed threads that have no waiter.
+void ReapKilledThreads() noexcept;
+
+#endif
