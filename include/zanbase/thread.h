@@ -7,6 +7,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup threads
+/// @{
+
 struct HNativeThread;
 
 /// How much of a busy processor a thread gets, from least to most. Normal is what the process itself has; a
@@ -128,5 +131,7 @@ private:
         nullptr};  // null while idle; the thread itself empties it at its end
     std::atomic<HThreadPriority> mnPriority;
 };
+
+/// @}
 
 #endif
