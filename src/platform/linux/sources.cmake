@@ -1,4 +1,4 @@
-# The files of this back end.
+# The files of this back end, and what an ELF shared library needs of the compiler and the linker.
 set(ZANBASE_PLATFORM_SOURCES
     clock.cpp
     condition.cpp
@@ -27,3 +27,13 @@ if(ZANBASE_KILL_SAFETY)
     list(APPEND ZANBASE_PLATFORM_SOURCES thread_kill_safety.cpp)
     add_compile_definitions(ZANBASE_KILL_SAFETY)
 endif()
+
+# The library calls its own functions directly: no caller may replace one, and a call through the PLT costs more.
+set(ZANBASE_PLATFORM_COMPILE_OPTIONS -fno-semantic-interposition -fno-plt)
+
+set(ZANBASE_PLATFORM_LINK_DEPENDS ${CMAKE_CURRENT_LIST_DIR}/hidden.map)
+set(ZANBASE_PLATFORM_LINK_OPTIONS
+    -Wl,-z,nodelete           # signal handlers and TLS destructors must stay mapped after a dlclose
+    -Wl,-z,now                # no symbol is resolved later, inside a signal handler or with a lock held
+    -Wl,-Bsymbolic-functions  # calls between exported functions stay inside the library, too
+    -Wl,--version-script=${ZANBASE_PLATFORM_LINK_DEPENDS})  # hides templates of other libraries; see there
