@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "environment/message_catalogue.h"
+#include "support/environment.h"
 #include "support/run_in_child.h"
 
 namespace {
@@ -17,10 +18,10 @@ namespace {
 TEST(MessageCatalogue, KeepsTheTextOfTheFirstLookUp) {
     const ChildResult child = RunInChild([] {
         (::_)("early");  // works before anything is set up
-        setenv("LANGUAGE", "de", 1);
-        setenv("LC_ALL", "de_DE.UTF-8", 1);
-        if (std::setlocale(LC_ALL, "") == nullptr) setenv("LOCPATH", ZANBASE_TEST_LOCALE_FOLDER, 1);
-        if (std::setlocale(LC_ALL, "") == nullptr) setenv("LC_ALL", "C.UTF-8", 1);  // has no decimal comma
+        SetEnvironment("LANGUAGE", "de");
+        SetEnvironment("LC_ALL", "de_DE.UTF-8");
+        if (std::setlocale(LC_ALL, "") == nullptr) SetEnvironment("LOCPATH", ZANBASE_TEST_LOCALE_FOLDER);
+        if (std::setlocale(LC_ALL, "") == nullptr) SetEnvironment("LC_ALL", "C.UTF-8");  // has no decimal comma
         std::setlocale(LC_ALL, "C");
         InitLocale(nullptr);
         InitLocaleDir(ZANBASE_TEST_LOCALE_FOLDER);

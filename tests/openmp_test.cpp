@@ -5,6 +5,7 @@
 #include <omp.h>
 
 #include "platform/processors.h"
+#include "support/environment.h"
 #include "support/run_in_child.h"
 
 int logical = 0, cores = 0, asked = 0;  // what the system tells, and how often it was asked
@@ -42,7 +43,7 @@ TEST(OpenMPNumbers, AreSettledOnceByTheFirstSource) {
         {"4", 0, 6, 3, "4 6 3\n"},  {"-2", 0, 0, 3, "3 3 3\n"},  {"4294967298", 0, 0, 0, "2147483647 7 7\n"},
         {"4", -1, 6, 3, "1 6 3\n"}, {"4", 12, 6, 3, "12 6 3\n"}, {"text", 0, 6, 0, "6 6 7\n"}};
     for (const auto& c : cases) {
-        setenv("OMP_NUM_THREADS", c.environment, 1);
+        SetEnvironment("OMP_NUM_THREADS", c.environment);
         const ChildResult child = RunInChild([&c] {
             logical = c.logical;
             cores = c.cores;
@@ -50,7 +51,7 @@ TEST(OpenMPNumbers, AreSettledOnceByTheFirstSource) {
             for (int call = 0; call < 2; ++call) {
                 std::printf("%d %d ", OMPGetMaxThreads(), GetLogicalProcessorCount());
                 std::printf("%d\n", GetPhysicalProcessorCount());
-                setenv("OMP_NUM_THREADS", "99", 1);
+                SetEnvironment("OMP_NUM_THREADS", "99");
             }
             return asked;
         });

@@ -77,7 +77,7 @@ void StressReadWrite(bool downgrades) {
 }  // namespace
 
 int main(int count, char** arguments) {
-    if (count > 1) rounds *= std::atoi(arguments[1]);
+    if (count > 1) rounds = static_cast<int>(rounds * std::atof(arguments[1]));
     StressRoomAndItems();
     StressReadWrite<HReadPrefMutex>(true);
     StressReadWrite<HWritePrefMutex>(false);

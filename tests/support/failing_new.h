@@ -10,13 +10,21 @@ inline void CountNew() {
     if (news_left >= 0 && --news_left < 0) throw std::bad_alloc();
 }
 
-extern "C" {
-void* __real__Znwm(std::size_t size);
-void* __real__ZnwmSt11align_val_t(std::size_t size, std::align_val_t alignment);
-void* __wrap__Znwm(std::size_t size) { return CountNew(), __real__Znwm(size); }
-void* __wrap__ZnwmSt11align_val_t(std::size_t size, std::align_val_t alignment) {
-    return CountNew(), __real__ZnwmSt11align_val_t(size, alignment);
+// The linker's names: ZANBASE_TEST_NEW is that of `operator new` for a size alone.
+void* RealNew(std::size_t size) asm("__real_" ZANBASE_TEST_NEW);
+void* RealNew(std::size_t size, std::align_val_t alignment) asm("__real_" ZANBASE_TEST_NEW "St11align_val_t");
+void* CountedNew(std::size_t size) asm("__wrap_" ZANBASE_TEST_NEW);
+void* CountedNew(std::size_t size,
+                 std::align_val_t alignment) asm("__wrap_" ZANBASE_TEST_NEW "St11align_val_t");
+
+void* CountedNew(std::size_t size) {
+    CountNew();
+    return RealNew(size);
 }
+
+void* CountedNew(std::size_t size, std::align_val_t alignment) {
+    CountNew();
+    return RealNew(size, alignment);
 }
 
 // Runs `body` with its first call of `operator new` failing, then with the second, and so on until it comes

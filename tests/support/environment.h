@@ -1,0 +1,11 @@
+// What tests do with the surroundings of their process, on every system: linux.cpp and windows.cpp beside this file.
+#ifndef ZANBASE_TESTS_ENVIRONMENT_H
+#define ZANBASE_TESTS_ENVIRONMENT_H
+
+// Sets an environment variable, or removes it if `value` is null.
+void SetEnvironment(const char* name, const char* value);
+
+// Whether a condition serves its other waiters after one of them was killed. Not every system promises that.
+extern const bool kConditionOutlivesKills;
+
+#endif
