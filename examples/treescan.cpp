@@ -64,9 +64,9 @@ struct Phase {
 
 std::atomic<unsigned long long> unreadable{0};
 
-void TellUnreadable(const char* path) {
+void TellUnreadable(const fs::path& path) {
     ++unreadable;
-    std::fprintf(stderr, "treescan: cannot read %s\n", path);
+    std::fprintf(stderr, "treescan: cannot read %s\n", path.string().c_str());
 }
 
 // Collects the regular files below `dir` into `files`; symbolic links are not followed.
@@ -75,16 +75,16 @@ void Walk(const fs::path& dir, std::vector<File*>& files) {
     for (fs::directory_iterator entry(dir, error), end; !error && entry != end; entry.increment(error)) {
         const fs::file_status status = entry->symlink_status(error);
         if (error) {
-            TellUnreadable(entry->path().c_str());
+            TellUnreadable(entry->path());
             error.clear();
         } else if (fs::is_directory(status)) {
             Walk(entry->path(), files);
         } else if (fs::is_regular_file(status)) {
-            char* const path = TAKE_TEXT(entry->path().c_str());
-            files.push_back(new (TAKE(sizeof(File))) File{path, 0, 0});
+            const std::string path = entry->path().string();
+            files.push_back(new (TAKE(sizeof(File))) File{TAKE_TEXT(path.c_str()), 0, 0});
         }
     }
-    if (error) TellUnreadable(dir.c_str());
+    if (error) TellUnreadable(dir);
 }
 
 // Runs a disk operation and passes the seconds that it took to `record`.
@@ -153,7 +153,7 @@ void ReadAll(const std::vector<File*>& files, const Options& options, unsigned l
 // Files, bytes and lines by extension; as in the library's reports the largest comes last.
 void PrintExtensions(const std::vector<File*>& files) {
     std::map<std::string, Counts> table;
-    for (const File* file : files) table[fs::path(file->path).extension()].Add(*file);
+    for (const File* file : files) table[fs::path(file->path).extension().string()].Add(*file);
     std::vector<std::pair<std::string, Counts>> rows(table.begin(), table.end());
     std::stable_sort(rows.begin(), rows.end(), [](const auto& one, const auto& other) {
         return one.second.bytes < other.second.bytes;

@@ -109,7 +109,9 @@ double ScanDouble(const char* field, int width) noexcept {
         copy[length] = c == 'D' ? 'E' : c == 'd' ? 'e' : c;
     }
     copy[length] = '\0';
-    return std::strtod(copy, nullptr);
+    char* end = nullptr;
+    const double value = std::strtod(copy, &end);
+    return end != copy ? value : 0;  // some runtimes make a negative zero of a lone sign
 }
 
 int ScanInt(const char* field, int width) noexcept { return ScanInteger<int>(field, width); }
