@@ -6,9 +6,6 @@
 #include "zanbase/export.h"
 #include "zanbase/mutex.h"
 
-/// @addtogroup locks
-/// @{
-
 struct HNativeCondition;
 
 /// A condition variable that is waited for with a `HMutex`.
@@ -54,7 +51,5 @@ private:
 
     HNativeCondition* mpoCondition = nullptr;  // owned; set by the constructor and never changed
 };
-
-/// @}
 
 #endif

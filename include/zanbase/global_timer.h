@@ -7,9 +7,6 @@
 
 #include "zanbase/export.h"
 
-/// @addtogroup timing
-/// @{
-
 struct GlobalTimerSnapshot;
 
 /// The process's flat list of cumulative timers. There is one instance.
@@ -76,7 +73,5 @@ private:
 
     Impl* mpoImpl = nullptr;  // owned
 };
-
-/// @}
 
 #endif

@@ -10,9 +10,6 @@
 #include "zanbase/semaphore.h"
 #include "zanbase/thread.h"
 
-/// @addtogroup threads
-/// @{
-
 /// A worker: a subclass says in `Process` what one pass of work is.
 ///
 ///     struct Saver : HHibernateThread {
@@ -74,7 +71,5 @@ private:
     HMutex moStateMutex;
     HSemaphore moWakeUp{1};  // a unit for each pass that the worker owes; it starts with the second
 };
-
-/// @}
 
 #endif

@@ -13,9 +13,6 @@
 #include "zanbase/export.h"
 #include "zanbase/mutex.h"
 
-/// @addtogroup memory
-/// @{
-
 // Boost's map header costs an including file about 90,000 lines, so it is not included here. Code that reads
 // the tables includes zanbase/memory_tables.h.
 namespace boost {
@@ -124,7 +121,5 @@ protected:
     static std::size_t mnPeekMemory;  ///< the highest total after an `Alloc` since the last clearing
     static HMutex moMutex;            ///< guards all of the above; built at load
 };
-
-/// @}
 
 #endif

@@ -7,9 +7,6 @@
 
 #include "zanbase/export.h"
 
-/// @addtogroup locks
-/// @{
-
 struct HNativeLock;
 
 /// A re-entrant mutex: the thread that owns it may take it again without blocking, and it becomes free once
@@ -80,7 +77,5 @@ private:
 
     const HMutex* mpoMutex;  // not owned; non-null exactly while this object owes it one Unlock
 };
-
-/// @}
 
 #endif

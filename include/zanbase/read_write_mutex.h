@@ -15,9 +15,6 @@
 #include "zanbase/mutex.h"
 #include "zanbase/semaphore.h"
 
-/// @addtogroup locks
-/// @{
-
 /// A lock that many readers or one writer can hold: the interface of both kinds.
 ///
 ///     HWritePrefMutex mutex;
@@ -210,7 +207,5 @@ private:
 
     const HReadWriteMutex* mpoMutex;  // not owned; non-null exactly while this object owes it one WriteUnlock
 };
-
-/// @}
 
 #endif

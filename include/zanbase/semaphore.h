@@ -7,9 +7,6 @@
 
 #include "zanbase/export.h"
 
-/// @addtogroup locks
-/// @{
-
 struct HNativeSemaphore;
 
 /// A counting semaphore: `Lock` takes a unit and waits while there is none, `Unlock` gives one.
@@ -81,7 +78,5 @@ private:
 
     HSemaphore* mpoSemaphore;  // not owned; non-null exactly while this object owes it one Unlock
 };
-
-/// @}
 
 #endif

@@ -1,19 +1,16 @@
 /// @file
-/// Services of the process's environment: terminal codes, the revision, a text console, screen measures.
+/// What a program asks about its surroundings: terminal codes, the revision, a text console, screen measures.
 ///
-/// Thread-safety: `IMPTerminal`, `IMPAutomaticTerm` and `IsWin32s` are thread-safe. The other functions share
-/// state without a lock: the first call of `IMPGetMajorRev`, the console operations and `SetScreenSize`
-/// belong to one thread at a time, usually the main thread during start-up.
+/// Any thread may call `IMPTerminal`, `IMPAutomaticTerm` and `IsWin32s` at any time. The rest shares state
+/// that no lock guards: the first call of `IMPGetMajorRev`, the console operations and `SetScreenSize` belong
+/// to one thread at a time, as a rule the one that starts the program.
 #ifndef ZANBASE_TERMINAL_H
 #define ZANBASE_TERMINAL_H
 
 #include "zanbase/export.h"
 
-/// @addtogroup environment
-/// @{
-
-/// Returns the code of the terminal `name`. The beginning of the name decides, and ASCII letters match in
-/// either case, so `vt100-w` is a VT100:
+/// The code of the terminal called `name`, which is not null. A name counts by its beginning, letters of
+/// either case alike, so `vt100-w` is a VT100:
 ///
 /// | begins with | code |
 /// |---|---|
@@ -28,15 +25,14 @@
 /// | HP2621B | 8 |
 /// | IBM, DEFAULT, AUTO | 9 |
 ///
-/// Any other name, including the empty one, has code 0. The caller decides what a code selects. Thread-safe.
-/// Requires: `name` is not null.
+/// Any other name, the empty one too, has code 0. What a code selects is the caller's affair.
 ZANBASE_API int IMPTerminal(const char* name);
 
-/// Returns 9, the code for an unknown terminal. Thread-safe.
+/// The code for a program that is not told which terminal it has: 9.
 ZANBASE_API int IMPAutomaticTerm();
 
-/// Returns the revision of the library as digits without dots, the same pointer at every call. The text
-/// belongs to the library and is valid until the process ends. Thread-safe after the first call.
+/// The revision of the library as digits without dots, the same pointer at every call. The text belongs to
+/// the library and stays good until it is unloaded.
 ZANBASE_API const char* IMPGetMajorRev();
 
 /// Gives the process a text console, at most once in its life. Returns 1 if this call or an earlier one made
@@ -47,9 +43,9 @@ ZANBASE_API const char* IMPGetMajorRev();
 /// calls leave the streams alone.
 ///
 /// The call waits for a bounded time. It drops pending output that the old file does not accept within a
-/// second (a full pipe, or one without a reader, which raises no SIGPIPE). If another thread is using a
-/// stream for longer than a tenth of a second, because it waits for input for example, the stream uses the
-/// console from its next system call on, but stays buffered. A wide-oriented stream loses its orientation.
+/// second (a full pipe, or one without a reader, which raises no SIGPIPE). If another thread is using a stream
+/// for longer than a tenth of a second, because it waits for input for example, the stream uses the console
+/// from its next system call on, but stays buffered. A wide-oriented stream loses its orientation.
 ///
 /// On Linux the console is the controlling terminal of the process. Without one it is a window of the program
 /// `xterm` on the display that the environment variable `DISPLAY` names; the call waits for the window for
@@ -61,28 +57,26 @@ ZANBASE_API const char* IMPGetMajorRev();
 ZANBASE_API int CreateConsole();
 
 /// Removes the console that `CreateConsole` made: the standard streams that use it are connected to the null
-/// device, unbuffered, by the same rules, and a window of the library's own closes. Returns 1 on success, 0
-/// if there is no such console, or no null device (then nothing changes). The console can't be made again.
+/// device, unbuffered, by the same rules, and a window of the library's own closes. Returns 1 on success, 0 if
+/// there is no such console, or no null device (then nothing changes). The console can't be made again.
 /// Thread-safety: as `CreateConsole`.
 ZANBASE_API int DestroyConsole();
 
-/// Shows the console's window if `show` is not 0, and hides it otherwise. On Linux it restores or iconifies a
-/// window of the library's own, wherever the standard streams lead; it does nothing to the terminal that the
-/// process was started from. Thread-safety: as `CreateConsole`.
+/// Shows (`show` not 0) or hides (0) the window of the console. On Linux it iconifies and restores a window
+/// of our own, whatever has become of the standard streams; without one it does nothing: the terminal that
+/// the process was started from belongs to the user.
 ZANBASE_API void ShowConsole(int show);
 
-/// Returns 0: no supported system is the 32-bit extension of a 16-bit one. Thread-safe.
+/// 0: whether the process runs on the 32-bit extension of a 16-bit system, which none does any more.
 ZANBASE_API int IsWin32s();
 
-/// Stores four measures of the screen for the life of the process, in units that the callers agree on.
-/// Returns 1 if it stored them, 0 if an earlier call had; the earlier measures stay. Not thread-safe.
+/// Stores four measures of the screen for the life of the process, in whatever units the callers agree on.
+/// 1 if they were stored, 0 if an earlier call had stored its own, which stay.
 ZANBASE_API int SetScreenSize(double first, double second, double third, double fourth);
 
-/// Writes the measures that `SetScreenSize` stored through those pointers that are not null, and returns 1.
-/// Returns 0 and writes nothing if all four are null or no measures are stored. Thread-safe after
-/// `SetScreenSize`.
+/// Hands out the measures that `SetScreenSize` stored, each to its own pointer; one that isn't wanted may be
+/// null. 1 if it did; 0, with nothing written, if all four are null or nothing was stored. After the measures
+/// were stored, any thread may call it.
 ZANBASE_API int GetScreenSize(double* first, double* second, double* third, double* fourth);
-
-/// @}
 
 #endif

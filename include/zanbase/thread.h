@@ -7,9 +7,6 @@
 
 #include "zanbase/export.h"
 
-/// @addtogroup threads
-/// @{
-
 struct HNativeThread;
 
 /// How much of a busy processor a thread gets, from least to most. Normal is what the process itself has; a
@@ -131,7 +128,5 @@ private:
         nullptr};  // null while idle; the thread itself empties it at its end
     std::atomic<HThreadPriority> mnPriority;
 };
-
-/// @}
 
 #endif

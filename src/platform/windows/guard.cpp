@@ -1,0 +1,74 @@
+// Frames for machine faults, on the system's structured exceptions. The compiler has no `__try`, so the frame is an
+// assembly routine that the runtime's own handler serves by a table of one row.
+#include "platform/guard.h"
+
+#include <malloc.h>
+
+#include "platform/windows/system.h"
+
+// CallGuarded's frame.
+struct GuardFrame {
+    char area_of_the_callee[32];
+    DWORD fault;
+};
+
+extern "C" {
+
+// Whether a fault ends the body; if so, its code is put into `frame`. All other exceptions pass, those of C++ too.
+__attribute__((used)) LONG FilterFault(const EXCEPTION_POINTERS* exception, GuardFrame* frame) {
+    const DWORD code = exception->ExceptionRecord->ExceptionCode;
+    switch (code) {
+        case EXCEPTION_ACCESS_VIOLATION:
+        case EXCEPTION_DATATYPE_MISALIGNMENT:
+        case EXCEPTION_ILLEGAL_INSTRUCTION:
+        case EXCEPTION_IN_PAGE_ERROR:
+        case EXCEPTION_INT_DIVIDE_BY_ZERO:
+        case EXCEPTION_INT_OVERFLOW:
+        case EXCEPTION_PRIV_INSTRUCTION:
+        case EXCEPTION_STACK_OVERFLOW:
+            frame->fault = code;
+            return EXCEPTION_EXECUTE_HANDLER;
+        default:
+            return EXCEPTION_CONTINUE_SEARCH;
+    }
+}
+
+// Calls body(argument). 0 if it returned, else the code of the fault that ended it.
+DWORD CallGuarded(void (*body)(void*), void* argument);
+
+}  // extern "C"
+
+// The row: from, to, filter, and where to go on.
+asm(R"(
+    .text
+    .p2align 4
+    .globl CallGuarded
+    .seh_proc CallGuarded
+CallGuarded:
+    subq $40, %rsp
+    .seh_stackalloc 40
+    .seh_endprologue
+    movq %rcx, %rax
+    movq %rdx, %rcx
+.Lguard_from:
+    call *%rax
+    movl $0, 32(%rsp)
+.Lguard_to:
+    nop
+.Lguard_fault:
+    movl 32(%rsp), %eax
+    addq $40, %rsp
+    ret
+    .seh_handler __C_specific_handler, @except
+    .seh_handlerdata
+    .long 1
+    .rva .Lguard_from, .Lguard_to, FilterFault, .Lguard_fault
+    .text
+    .seh_endproc
+)");
+
+bool RunGuarded(void (*body)(void*), void* argument) {
+    const DWORD fault = CallGuarded(body, argument);
+    if (fault == EXCEPTION_STACK_OVERFLOW) _resetstkoflw();  // the page that guards the stack's end
+    return fault != 0;
+}

@@ -1,0 +1,31 @@
+// A lock without a queue of waiters: one of them can be killed and leaves no trace.
+#ifndef ZANBASE_PLATFORM_WINDOWS_SPIN_LOCK_H
+#define ZANBASE_PLATFORM_WINDOWS_SPIN_LOCK_H
+
+#include <atomic>
+
+#include "platform/windows/system.h"
+
+class SpinLock {
+public:
+    void Acquire() noexcept {
+        while (mbHeld.exchange(true, std::memory_order_acquire)) SwitchToThread();
+    }
+    void Release() noexcept { mbHeld.store(false, std::memory_order_release); }
+
+private:
+    std::atomic<bool> mbHeld{false};
+};
+
+class SpinLockHold {
+public:
+    explicit SpinLockHold(SpinLock& lock) noexcept : mpoLock(&lock) { mpoLock->Acquire(); }
+    ~SpinLockHold() { mpoLock->Release(); }
+    SpinLockHold(const SpinLockHold&) = delete;
+    SpinLockHold& operator=(const SpinLockHold&) = delete;
+
+private:
+    SpinLock* mpoLock;
+};
+
+#endif

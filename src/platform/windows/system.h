@@ -1,0 +1,15 @@
+// The system's header, for sources of this back end alone: its macros rewrite names.
+#ifndef ZANBASE_PLATFORM_WINDOWS_SYSTEM_H
+#define ZANBASE_PLATFORM_WINDOWS_SYSTEM_H
+
+#define WIN32_LEAN_AND_MEAN
+#ifndef NOMINMAX
+#define NOMINMAX
+#endif
+#include <windows.h>
+
+#include "platform/wait_limit.h"
+
+static_assert(kForever == INFINITE);
+
+#endif
