@@ -1,34 +1,89 @@
-// The mutex beside the standard library's re-entrant one.
-#include <benchmark/benchmark.h>
+// HMutex beside the standard library's re-entrant mutex: a free pair before and after the process has had a
+// second thread, threads that compete for the mutex, and what that does to the tracker, which holds one.
+#include "zanbase/mutex.h"
 
+#include <benchmark/benchmark.h>
+#include <sys/single_threaded.h>
+
+#include <cstdlib>
 #include <mutex>
+#include <string>
 
 #include "ratios.h"
-#include "zanbase/mutex.h"
+#include "zanbase/memory.h"
 
 namespace {
 
-HMutex our_mutex;
-std::recursive_mutex std_mutex;
+struct Ours {
+    void Lock() { moMutex.Lock(); }
+    void Unlock() { moMutex.Unlock(); }
 
+private:
+    HMutex moMutex;
+};
+
+struct Standard {
+    void Lock() { moMutex.lock(); }
+    void Unlock() { moMutex.unlock(); }
+
+private:
+    std::recursive_mutex moMutex;
+};
+
+template <class Mutex>
+Mutex shared_mutex;
+
+// Holds the mutex for `state.range(0)` steps; each thread asks for it again at once.
+template <class Mutex>
 void MutexPair(benchmark::State& state) {
+    const auto steps = state.range(0);
     for (auto _ : state) {
-        our_mutex.Lock();
-        our_mutex.Unlock();
+        shared_mutex<Mutex>.Lock();
+        for (long step = 0; step < steps; ++step) benchmark::DoNotOptimize(step);
+        shared_mutex<Mutex>.Unlock();
     }
 }
-BENCHMARK(MutexPair)->ThreadRange(1, 2)->UseRealTime();
 
-void StdRecursiveMutexPair(benchmark::State& state) {
+// main runs it before the process starts its first thread, which raises the price of a lock for good.
+template <class Mutex>
+void MutexPairWithoutThreads(benchmark::State& state) {
+    if (__libc_single_threaded == 0) return state.SkipWithError("the process has had threads");
     for (auto _ : state) {
-        std_mutex.lock();
-        std_mutex.unlock();
+        shared_mutex<Mutex>.Lock();
+        shared_mutex<Mutex>.Unlock();
     }
 }
-BENCHMARK(StdRecursiveMutexPair)->ThreadRange(1, 2)->UseRealTime();
 
-const bool rows =
-    AddRatio("MutexPair/real_time/threads:1", "StdRecursiveMutexPair/real_time/threads:1", 0.7) &&
-    AddRatio("MutexPair/real_time/threads:2", "StdRecursiveMutexPair/real_time/threads:2", 1.0);
+void TrackedPair(benchmark::State& state) {
+    void* const block = std::malloc(8);
+    for (auto _ : state) {
+        HMemory::Alloc(block, 8, __FILE__, __LINE__);
+        HMemory::Free(block);
+    }
+    std::free(block);
+}
+
+BENCHMARK_TEMPLATE(MutexPairWithoutThreads, Ours);
+BENCHMARK_TEMPLATE(MutexPairWithoutThreads, Standard);
+BENCHMARK_TEMPLATE(MutexPair, Ours)->Arg(0)->Threads(1)->Threads(2)->Threads(4)->UseRealTime();
+BENCHMARK_TEMPLATE(MutexPair, Standard)->Arg(0)->Threads(1)->Threads(2)->Threads(4)->UseRealTime();
+BENCHMARK_TEMPLATE(MutexPair, Ours)->Arg(300)->Arg(3000)->Threads(2)->UseRealTime();
+BENCHMARK_TEMPLATE(MutexPair, Standard)->Arg(300)->Arg(3000)->Threads(2)->UseRealTime();
+BENCHMARK(TrackedPair)->Threads(1)->Threads(2)->UseRealTime();
+
+bool AddRows() {
+    AddRatio("MutexPairWithoutThreads<Ours>", "MutexPairWithoutThreads<Standard>", 1.0);
+    AddRatio("MutexPairWithoutThreads<Ours>", "MutexPair<Standard>/0/real_time/threads:1", 0.5);
+    const auto compare = [](const std::string& variant, double goal) {
+        AddRatio("MutexPair<Ours>" + variant, "MutexPair<Standard>" + variant, goal);
+    };
+    compare("/0/real_time/threads:1", 1.0);
+    compare("/0/real_time/threads:2", 1.1);
+    compare("/0/real_time/threads:4", 1.1);
+    compare("/300/real_time/threads:2", 1.05);
+    compare("/3000/real_time/threads:2", 1.05);
+    return AddRatio("TrackedPair/real_time/threads:2", "TrackedPair/real_time/threads:1", 4.0);
+}
+const bool rows = AddRows();
 
 }  // namespace

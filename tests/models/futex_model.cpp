@@ -1,5 +1,5 @@
-// Lock, semaphore and condition as they are shipped, on words, sleepers and restartable stores of the
-// explorer; once, at any step, a thread may be ended or the breaking of stores may fail.
+// The shipped algorithms of lock, semaphore and condition on words and sleepers of the explorer. One thread may be
+// killed, at any of its steps.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -13,60 +13,71 @@
 
 namespace {
 
-// The word of what is tested; a lock beside a condition; whether the one mishap has been; how many own the
-// lock; items to wait for; who changed a word last from 0. Then for each thread the word that it sleeps on, its
-// debts (a word, a condition, what it saw there) and the word that it is about to store to, all plus 1.
-constexpr std::size_t kWord = 0, kLock = 1, kMishap = 2, kOwners = 3, kItems = 4, kTaker = 5, kSleeps = 6,
-                      kDebt = kSleeps + kThreads, kSignalDebt = kDebt + kThreads,
-                      kSeen = kSignalDebt + kThreads, kStores = kSeen + kThreads;
-enum class Fault { kNone, kUnbrokenStores, kForgottenDebts, kForgottenSignalDebts };
+// Places in State::words. The first six stand once, the others once for each thread.
+constexpr std::size_t kWord = 0;                            // the futex word under test
+constexpr std::size_t kLock = 1;                            // the simple lock beside a condition
+constexpr std::size_t kHasKilled = 2;                       // 1 after the one kill
+constexpr std::size_t kOwners = 3;                          // threads that own the lock under test
+constexpr std::size_t kItems = 4;                           // what the waiters on a condition wait for
+constexpr std::size_t kLastTaker = 5;                       // the thread that last changed a lock from 0
+constexpr std::size_t kAsleep = 6;                          // 1: the thread sleeps on kWord
+constexpr std::size_t kPendingWakeup = kAsleep + kThreads;  // 1: noted on a lock or semaphore
+constexpr std::size_t kPendingSignal = kPendingWakeup + kThreads;  // 1: noted on a condition
+constexpr std::size_t kSeen = kPendingSignal + kThreads;  // the condition's word at the start of the wait
+
+enum class Fault { kNone, kForgetsWakeups, kForgetsSignals };
 
 Fault fault = Fault::kNone;
 constexpr int kSoon = 0;  // a deadline, which may pass at any time
 
-// Notes who has last changed a word from 0.
-Value Becomes(Value old, Value value) {
-    if (old == 0 && value != 0) explorer.now.words[kTaker] = explorer.self;
-    return value;
+// The value a word changes to; notes the thread that changes it from 0.
+Value Take(Value old, Value desired) {
+    if (old == 0 && desired != 0) explorer.now.words[kLastTaker] = explorer.self;
+    return desired;
 }
 
+unsigned int As32Bits(Value value) { return static_cast<unsigned int>(value); }
+
 struct Word {
-    explicit Word(unsigned int) {}  // the state starts with it
-    unsigned int load(std::memory_order) const { return As(Get(kWord)); }
+    explicit Word(unsigned int) {}  // the explorer's start state has the value
+    unsigned int load(std::memory_order) const { return As32Bits(Get(kWord)); }
+    void store(unsigned int desired, std::memory_order) { Set(kWord, desired); }
     unsigned int exchange(unsigned int desired, std::memory_order) {
-        return As(Change(kWord, [=](Value old) { return Becomes(old, desired); }));
+        return As32Bits(Change(kWord, [=](Value old) { return Take(old, desired); }));
     }
     unsigned int fetch_add(unsigned int more, std::memory_order) {
-        return As(Add(kWord, static_cast<int>(more)));
+        return As32Bits(Add(kWord, static_cast<int>(more)));
     }
     unsigned int fetch_or(unsigned int bits, std::memory_order) {
-        return As(Change(kWord, [=](Value value) { return value | bits; }));
+        return As32Bits(Change(kWord, [=](Value value) { return value | bits; }));
     }
     bool compare_exchange_strong(unsigned int& expected, unsigned int desired, std::memory_order,
                                  std::memory_order = {}) {
         const unsigned int wanted = expected;
-        expected = As(Change(kWord, [=](Value old) { return old == wanted ? Becomes(old, desired) : old; }));
+        expected =
+            As32Bits(Change(kWord, [=](Value old) { return old == wanted ? Take(old, desired) : old; }));
         return expected == wanted;
     }
-    static unsigned int As(Value value) { return static_cast<unsigned int>(value); }
 };
 
-struct Owner {  // says something to its own thread only, and no thread here takes the lock twice
+// A thread reads its own number only if it owns the lock, and no thread here acquires twice: so it reads 0.
+struct Owner {
     explicit Owner(int) {}
     unsigned long long load(std::memory_order) const { return 0; }
     void store(unsigned long long, std::memory_order) const {}
 };
 
-template <std::size_t kPlace, Fault kForgotten>
-struct Debt {
-    explicit Debt(const Word&, unsigned int seen = 0) {
+template <std::size_t kPlace, Fault kForgets>
+struct Pending {
+    explicit Pending(const Word&, unsigned int seen = 0) {
         explorer.Step([&](State& state) {
             state.words[kSeen + explorer.self] = seen;
-            return state.words[kPlace + explorer.self] = fault == kForgotten ? 0 : kWord + 1;
+            return state.words[kPlace + explorer.self] = fault == kForgets ? 0 : 1;
         });
     }
-    ~Debt() noexcept(false) {  // a step that ends the run leaves scopes too, which is none of the algorithm's
-        if (std::uncaught_exceptions() == 0) Set(kPlace + explorer.self, 0);
+    ~Pending() noexcept(false) {
+        const bool is_explorers_exception = std::uncaught_exceptions() != 0;
+        if (!is_explorers_exception) Set(kPlace + explorer.self, 0);
     }
 };
 
@@ -74,166 +85,151 @@ struct System {
     using Word = ::Word;
     using Owner = ::Owner;
     using Deadline = const int*;
-    using PendingWakeup = Debt<kDebt, Fault::kForgottenDebts>;
-    using PendingSignal = Debt<kSignalDebt, Fault::kForgottenSignalDebts>;
+    using PendingWakeup = Pending<kPendingWakeup, Fault::kForgetsWakeups>;
+    using PendingSignal = Pending<kPendingSignal, Fault::kForgetsSignals>;
     static constexpr int kEverySleeper = kThreads;
 
-    template <class Attempt>
-    static bool Spin(Attempt) {
-        return false;
-    }
-
     static bool IsAlone() { return false; }
-    static void StoreAlone(Word&, unsigned int) {}
 
+    // Two steps: fall asleep if the word is as expected; go on once woken or at the deadline.
     static bool SleepWhile(Word&, unsigned int expected, Deadline deadline) {
-        const std::size_t sleeps = kSleeps + explorer.self;
-        const Value slept = explorer.Step([&](State& state) {
-            return state.words[sleeps] = state.words[kWord] == expected ? kWord + 1 : 0;
-        });
+        const std::size_t asleep = kAsleep + explorer.self;
+        const Value slept = explorer.Step(
+            [&](State& state) { return state.words[asleep] = state.words[kWord] == expected ? 1 : 0; });
         if (slept == 0) return true;
-        return Change(sleeps, [&](Value asleep) {
-                   if (asleep != 0 && deadline == nullptr) Explorer::Block();
-                   return Value{0};
-               }) == 0;
+        const Value still_asleep = Change(asleep, [&](Value value) {
+            if (value != 0 && deadline == nullptr) Explorer::Block();
+            return Value{0};
+        });
+        return still_asleep == 0;
     }
 
-    static int WakeSleepers(Word&, int most) {  // any sleeper may be the one
+    // Any sleeper may be the one that is woken.
+    static int WakeSleepers(Word&, int most) {
         return static_cast<int>(explorer.Step([&](State& state) {
             std::vector<std::size_t> sleepers;
-            for (std::size_t place = kSleeps; place < kSleeps + kThreads; ++place)
+            for (std::size_t place = kAsleep; place < kAsleep + kThreads; ++place)
                 if (state.words[place] != 0) sleepers.push_back(place);
             if (most == 1 && !sleepers.empty()) sleepers = {sleepers[explorer.Choose(sleepers.size())]};
             for (const std::size_t place : sleepers) state.words[place] = 0;
             return sleepers.size();
         }));
     }
-
-    static bool StoreIfStill(Word&, unsigned int expected, unsigned int desired) {
-        if (explorer.Step([&](State& state) {
-                return state.words[kStores + explorer.self] = state.words[kWord] == expected ? 1 : 0;
-            }) == 0)
-            return false;
-        return explorer.Step([&](State& state) {
-            if (state.words[kStores + explorer.self] != 0) state.words[kWord] = desired;
-            return std::exchange(state.words[kStores + explorer.self], 0);
-        }) != 0;
-    }
-
-    static bool BreakStores() {
-        return explorer.Step([](State& state) {
-            if (state.words[kMishap] == 0 && explorer.Choose(2) != 0) {
-                state.words[kMishap] = 1;
-                return Value{0};
-            }
-            if (fault != Fault::kUnbrokenStores) std::fill_n(&state.words[kStores], kThreads, 0);
-            return Value{1};
-        }) != 0;
-    }
-
-    static void SleepShortly(Word& word, unsigned int expected) { SleepWhile(word, expected, &kSoon); }
 };
 
-// Ends a thread, which passes on what it owes as ForwardPendingWakeups does.
+// Kills a thread, which forwards its pending wake-ups as ForwardPendingWakeups does.
 bool Kill(State& state, std::size_t thread) {
-    if (state.words[kMishap] != 0) return false;
-    state.words[kMishap] = state.threads[thread].dead = true;
-    Value* const sleeps = &state.words[kSleeps];
-    sleeps[thread] = 0;
-    if (state.words[kDebt + thread] != 0) {
-        std::fill_n(&state.words[kStores], kThreads, 0);
-        std::fill_n(sleeps, kThreads, 0);
-    }
-    Value* const first = std::find(sleeps, sleeps + kThreads, kWord + 1);
-    const bool signalled =
-        state.words[kSignalDebt + thread] != 0 && state.words[kWord] != state.words[kSeen + thread];
-    if (signalled && first != sleeps + kThreads) *first = 0;
+    if (state.words[kHasKilled] != 0) return false;
+    state.words[kHasKilled] = 1;
+    state.threads[thread].dead = true;
+    Value* const asleep = &state.words[kAsleep];
+    asleep[thread] = 0;
+    if (state.words[kPendingWakeup + thread] != 0) std::fill_n(asleep, kThreads, 0);
+    const bool was_signalled =
+        state.words[kPendingSignal + thread] != 0 && state.words[kWord] != state.words[kSeen + thread];
+    Value* const sleeper = std::find(asleep, asleep + kThreads, 1);
+    if (was_signalled && sleeper != asleep + kThreads) *sleeper = 0;
     return true;
 }
 
-// No order of steps goes wrong, but one does with each of the faults. In the end a thread may wait only
-// where `is_free` says that there is nothing to be had, or for a lock at `lock` that a thread held when it
-// was ended.
-void Explore(std::size_t lock, bool (*is_free)(const State&), std::array<std::string, kThreads> scripts,
-             std::initializer_list<Fault> seeded) {
+using Scripts = std::array<std::string, kThreads>;
+using IsAvailable = bool (*)(const State&);
+
+// What is wrong in some order of steps. At the end a living thread may still wait only if what it waits for is not
+// available, or if a killed thread holds the lock at `lock`.
+std::string Explore(std::size_t lock, IsAvailable is_available, Scripts scripts,
+                    Fault seeded = Fault::kNone) {
+    fault = seeded;
     explorer.scripts = std::move(scripts);
     explorer.check = [=](const State& state, bool at_the_end) -> const char* {
         if (state.words[kOwners] > 1) return "two owners";
-        if (!at_the_end || !is_free(state)) return nullptr;
-        if (state.words[lock] != 0 && state.threads[state.words[kTaker]].dead) return nullptr;
+        if (!at_the_end || !is_available(state)) return nullptr;
+        if (state.words[lock] != 0 && state.threads[state.words[kLastTaker]].dead) return nullptr;
         for (std::size_t thread = 0; thread < kThreads; ++thread)
             if (!state.threads[thread].dead && !explorer.IsDone(state, thread)) return "asleep";
         return nullptr;
     };
-    fault = Fault::kNone;
-    EXPECT_EQ(explorer.Explore({}), "");
-    for (const Fault each : seeded) {
-        fault = each;
-        EXPECT_EQ(explorer.Explore({}), "asleep");
+    return explorer.Explore({});
+}
+
+// A: acquire; R: release.
+void CallLock(char call) {
+    FutexLock<System> lock;
+    if (call == 'A') {
+        lock.Acquire(1);
+        ++explorer.now.words[kOwners];
+    } else {
+        Add(kOwners, -1);
+        lock.Release();
     }
 }
 
-TEST(FutexModel, LockIsWhole) {
+TEST(FutexModel, LockHasOneOwnerAndLosesNoWakeUp) {
     explorer.kill = Kill;
-    explorer.call = [](char call) {
-        FutexLock<System> lock;
-        if (call == 'R') {
-            Add(kOwners, -1);
-            return lock.Give();
-        }
-        lock.Take(1);
-        ++explorer.now.words[kOwners];
-    };
-    const auto always = [](const State&) { return true; };
-    Explore(kWord, always, {"TRTR", "TR", "TR"}, {Fault::kUnbrokenStores, Fault::kForgottenDebts});
+    explorer.call = CallLock;
+    const auto is_available = [](const State&) { return true; };
+    const Scripts scripts{"ARAR", "AR", "AR"};
+    EXPECT_EQ(Explore(kWord, is_available, scripts), "");
+    EXPECT_EQ(Explore(kWord, is_available, scripts, Fault::kForgetsWakeups), "asleep");
 }
 
-TEST(FutexModel, SemaphoreIsWhole) {
+// A: acquire; a: acquire before a deadline; R: release.
+void CallSemaphore(char call) {
+    FutexSemaphore<System> semaphore(0);
+    if (call == 'R') return semaphore.Release();
+    semaphore.Acquire(call == 'a' ? &kSoon : nullptr);
+}
+
+TEST(FutexModel, SemaphoreLosesNoUnitAndNoWakeUp) {
     explorer.kill = Kill;
-    explorer.call = [](char call) {
-        FutexSemaphore<System> semaphore(0);
-        if (call == 'G') return semaphore.Give();
-        semaphore.Take(call == 't' ? &kSoon : nullptr);
-    };
+    explorer.call = CallSemaphore;
     const auto has_units = [](const State& state) {
         return (state.words[kWord] & FutexSemaphore<System>::kMost) != 0;
     };
-    Explore(kLock, has_units, {"TG", "T", "GG"}, {Fault::kForgottenDebts});
-    Explore(kLock, has_units, {"T", "t", "GG"}, {});
+    EXPECT_EQ(Explore(kLock, has_units, {"AR", "A", "RR"}), "");
+    EXPECT_EQ(Explore(kLock, has_units, {"A", "a", "RR"}), "");
+    EXPECT_EQ(Explore(kLock, has_units, {"AR", "A", "RR"}, Fault::kForgetsWakeups), "asleep");
 }
 
 struct SimpleLock {
-    void Take() const {
+    void Acquire() const {
         Change(kLock, [](Value old) {
             if (old != 0) Explorer::Block();
-            return Becomes(old, 1);
+            return Take(old, 1);
         });
     }
-    void Give() const { Set(kLock, 0); }
+    void Release() const { Set(kLock, 0); }
 };
 
-TEST(FutexModel, ConditionIsWhole) {
-    // Wait for one and take it, add one, wake one, wake all.
-    explorer.call = [](char call) {
-        FutexCondition<System> condition;
-        if (call == 'o') return condition.Signal();
-        if (call == 'a') return condition.Broadcast();
-        const SimpleLock lock;
-        lock.Take();
-        while (call == 'W' && Get(kItems) == 0) condition.Sleep(lock, nullptr);
-        Add(kItems, call == 'W' ? -1 : 1);
-        lock.Give();
-    };
-    // The third thread wakes the others. Before it has changed the word that it read first it owes nothing.
-    explorer.kill = [](State& state, std::size_t thread) {
-        const std::vector<Value>& log = state.threads[2].log;
-        const bool wakes = log.size() > 2 && state.words[kWord] != log[0];
-        return (thread != 2 || wakes) && Kill(state, thread);
-    };
+// W: wait for an item and take it; +: add an item; s: signal; b: broadcast.
+void CallCondition(char call) {
+    FutexCondition<System> condition;
+    if (call == 's') return condition.Signal();
+    if (call == 'b') return condition.Broadcast();
+    const SimpleLock lock;
+    lock.Acquire();
+    while (call == 'W' && Get(kItems) == 0) condition.Wait(lock, nullptr);
+    Add(kItems, call == 'W' ? -1 : 1);
+    lock.Release();
+}
+
+// The third thread signals. Killed before it has changed the word that it read first, it has signalled nothing.
+bool KillOutsideStartOfSignal(State& state, std::size_t thread) {
+    const std::vector<Value>& steps = state.threads[2].log;
+    const bool has_changed_word = steps.size() > 2 && state.words[kWord] != steps[0];
+    return (thread != 2 || has_changed_word) && Kill(state, thread);
+}
+
+TEST(FutexModel, ConditionLosesNoWakeUp) {
+    explorer.kill = KillOutsideStartOfSignal;
+    explorer.call = CallCondition;
     const auto has_items = [](const State& state) { return state.words[kItems] != 0; };
-    Explore(kLock, has_items, {"W", "W", "+o+o"}, {Fault::kForgottenDebts});
-    Explore(kLock, has_items, {"W", "W", "+o"}, {Fault::kForgottenSignalDebts});
-    Explore(kLock, has_items, {"W", "W", "++a"}, {Fault::kForgottenDebts});
+    EXPECT_EQ(Explore(kLock, has_items, {"W", "W", "+s+s"}), "");
+    EXPECT_EQ(Explore(kLock, has_items, {"W", "W", "+s"}), "");
+    EXPECT_EQ(Explore(kLock, has_items, {"W", "W", "++b"}), "");
+    EXPECT_EQ(Explore(kLock, has_items, {"W", "W", "+s+s"}, Fault::kForgetsWakeups), "asleep");
+    EXPECT_EQ(Explore(kLock, has_items, {"W", "W", "+s"}, Fault::kForgetsSignals), "asleep");
+    EXPECT_EQ(Explore(kLock, has_items, {"W", "W", "++b"}, Fault::kForgetsWakeups), "asleep");
 }
 
 }  // namespace

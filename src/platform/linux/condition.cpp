@@ -18,8 +18,8 @@ Condition& In(HNativeCondition* condition) noexcept {
 // One level of a lock that the calling thread holds.
 struct OneLevel {
     SystemLock& mrLock;
-    void Give() const noexcept { mrLock.Give(); }
-    void Take() const noexcept { mrLock.TakeAfterSleep(LockThread()); }
+    void Release() const noexcept { mrLock.Release(); }
+    void Acquire() const noexcept { mrLock.Acquire(LockThread()); }
 };
 
 }  // namespace
@@ -28,14 +28,14 @@ void InitCondition(HNativeCondition* condition) noexcept { new (condition->stora
 
 bool WaitOnCondition(HNativeCondition* condition, HNativeLock* lock, unsigned int limit_ms) noexcept {
     const OneLevel level{In(lock)};
-    if (limit_ms == kForever) return In(condition).Sleep(level, nullptr);
+    if (limit_ms == kForever) return In(condition).Wait(level, nullptr);
     if (limit_ms == 0) {
-        level.Give();
-        level.Take();
+        level.Release();
+        level.Acquire();
         return false;
     }
     const timespec deadline = DeadlineIn(limit_ms);
-    return In(condition).Sleep(level, &deadline);
+    return In(condition).Wait(level, &deadline);
 }
 
 void SignalCondition(HNativeCondition* condition) noexcept { In(condition).Signal(); }

@@ -4,13 +4,11 @@
 #include <cerrno>
 #include <tuple>
 
-#include "platform/linux/restartable.h"
-
 ZANBASE_FAST_THREAD_LOCAL PendingWakeups toPendingWakeups = {nullptr, nullptr, 0};
 
 namespace {
 
-// 0, or why there was no wake-up.
+// 0, or the error number that says why there was no wake-up.
 int Wait(FutexWord& word, unsigned int expected, const timespec* deadline) noexcept {
     const long result = syscall(SYS_futex, &word, FUTEX_WAIT_BITSET_PRIVATE, expected, deadline, nullptr,
                                 FUTEX_BITSET_MATCH_ANY);
@@ -18,8 +16,8 @@ int Wait(FutexWord& word, unsigned int expected, const timespec* deadline) noexc
 }
 
 #ifdef ZANBASE_THREAD_SANITIZER
-// That tool delivers no signal to a thread inside a system call it doesn't know, and threads are ended by a
-// signal. So a long wait is cut up, with a call between that it knows.
+// The thread sanitizer delivers no signal to a thread inside a system call that it does not intercept, and
+// threads are killed by a signal. So a long wait is cut into slices, with an intercepted call between them.
 int WaitInSlices(FutexWord& word, unsigned int expected, const timespec* deadline) noexcept {
     for (;;) {
         const timespec soon = DeadlineIn(5);
@@ -37,7 +35,7 @@ constexpr auto WaitInSlices = Wait;
 }  // namespace
 
 bool SleepWhile(FutexWord& word, unsigned int expected, const timespec* deadline) noexcept {
-    const int callers_errno = errno;  // nobody expects a lock to change it
+    const int callers_errno = errno;  // callers do not expect a lock to change it
     int error = EINTR;
     while (error == EINTR) error = WaitInSlices(word, expected, deadline);
     errno = callers_errno;
@@ -57,14 +55,9 @@ timespec DeadlineIn(unsigned int ms) noexcept {
 }
 
 void ForwardPendingWakeups() noexcept {
-    const PendingWakeups debts = toPendingWakeups;
+    const PendingWakeups pending = toPendingWakeups;
     toPendingWakeups = {};  // first: if the condition's memory is gone, the read below faults
-    if (debts.mpoWord != nullptr) {
-        // It may have told an owner to wake sleepers, and not yet kept that owner from overwriting it. Others
-        // rely on what they read there; where it fails, they do so for a short sleep only.
-        static_cast<void>(BreakStores());
-        WakeSleepers(*debts.mpoWord, kEverySleeper);
-    }
-    if (debts.mpoCondition != nullptr && *debts.mpoCondition != debts.mnSeen)
-        WakeSleepers(*debts.mpoCondition, 1);
+    if (pending.mpoWord != nullptr) WakeSleepers(*pending.mpoWord, kEverySleeper);
+    if (pending.mpoCondition != nullptr && *pending.mpoCondition != pending.mnSeen)
+        WakeSleepers(*pending.mpoCondition, 1);
 }

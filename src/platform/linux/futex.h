@@ -1,10 +1,11 @@
-// The one place that blocks: waits on a 32-bit word, with one rule for deadlines and for threads that are
-// ended while they wait. Lock, condition and semaphore of this back end stand on it.
+// The one place that blocks: waits on a 32-bit word, with one rule for deadlines and for threads that are killed
+// while they wait. Lock, condition and semaphore of this back end are built on it.
 //
-// A wake-up goes to one sleeping thread. If that thread is ended before it acts on it, or the thread that is
-// about to wake it is ended first, nobody would get it. So a thread notes the word that it sleeps on or wakes
-// others on in `toPendingWakeups`, and the code that ends a thread calls ForwardPendingWakeups() on it as its last act. A
-// wake-up too many is harmless: everybody who sleeps on a word looks at it again.
+// A wake-up reaches one sleeping thread. If that thread is killed before it acts on the wake-up, or the waking
+// thread is killed before it sends it, the wake-up is lost and other sleepers may sleep for ever. So a thread
+// notes the word that it sleeps on or wakes others on in toPendingWakeups, and the code that kills a thread calls
+// ForwardPendingWakeups() on it as its last act. A superfluous wake-up is harmless: every sleeper checks the word
+// again.
 #ifndef ZANBASE_PLATFORM_LINUX_FUTEX_H
 #define ZANBASE_PLATFORM_LINUX_FUTEX_H
 
@@ -22,34 +23,37 @@ static_assert(sizeof(FutexWord) == 4 && FutexWord::is_always_lock_free, "the ker
 
 constexpr int kEverySleeper = 0x7fffffff;
 
-// Wakes up to `most` threads that sleep on `word` and tells how many there were. Touches only the address, so
-// the word may be gone already.
+// Wakes up to `most` threads that sleep on `word`; returns how many it woke. Passes only the address to the
+// kernel, so the word may have been destroyed already.
 inline int WakeSleepers(FutexWord& word, int most) noexcept {
     return static_cast<int>(syscall(SYS_futex, &word, FUTEX_WAKE_PRIVATE, most, nullptr, nullptr, 0));
 }
 
-// Sleeps as long as `word` is `expected`, until a wake-up or the absolute monotonic `deadline` (null: none).
-// False if the deadline has passed. True says only that it is time to look at the word again.
+// Sleeps if `word` is `expected`, until a wake-up or the absolute monotonic `deadline` (null: none). False if the
+// deadline has passed. True means only that the caller has to check the word again: it was different, or the
+// wake-up may be spurious. Preserves errno. Orders no memory: the caller's accesses to the word do.
 bool SleepWhile(FutexWord& word, unsigned int expected, const timespec* deadline) noexcept;
 
 // Now plus `ms` milliseconds on the monotonic clock.
 timespec DeadlineIn(unsigned int ms) noexcept;
 
-// What a thread owes to others. A thread that was woken on a condition owes that until it has its lock back,
-// so it can have both kinds of debt at once, but never two of a kind.
+// Wake-ups to forward if this thread is killed now: on a lock or semaphore word while it sleeps on it or wakes
+// others, on a condition until it has acquired the lock again. Both may be set, never two of one kind. Only the
+// thread itself and its signal handlers access it, so signal fences suffice to order the accesses.
 struct PendingWakeups {
     FutexWord* mpoWord;       // a lock's or a semaphore's; null: none
     FutexWord* mpoCondition;  // null: none
-    unsigned int mnSeen;      // the condition's word as it was when this thread began to wait
+    unsigned int mnSeen;      // the condition's word when this thread began to wait
 };
 extern ZANBASE_FAST_THREAD_LOCAL PendingWakeups toPendingWakeups;
 
-// Called on a thread that is being ended: another sleeper gets the wake-up that this thread may have
-// swallowed, or all get the one that it was about to send. A condition that nobody has signalled since owes
-// nothing.
+// Sends the pending wake-ups of the calling thread and clears them; for a thread that is being killed or
+// abandons a lock operation. All sleepers of a lock or semaphore word are woken, since this thread may have been
+// about to send a wake-up as well as received one; one sleeper of a condition, if it was signalled since.
+// Async-signal-safe.
 void ForwardPendingWakeups() noexcept;
 
-// Notes a debt on a lock or semaphore for a scope.
+// Notes a pending wake-up on a lock or semaphore word for a scope.
 class PendingWakeup {
 public:
     explicit PendingWakeup(FutexWord& word) noexcept {
@@ -64,7 +68,7 @@ public:
     PendingWakeup& operator=(const PendingWakeup&) = delete;
 };
 
-// The same for a condition, whose word was `seen` at the start of the wait.
+// Notes a pending wake-up on a condition for a scope; its word was `seen` at the start of the wait.
 class PendingSignal {
 public:
     PendingSignal(FutexWord& word, unsigned int seen) noexcept {

@@ -1,27 +1,32 @@
 // A re-entrant lock on one futex word.
 //
-// mnState is 0 free, 1 held, 2 held and somebody may sleep:
+// mnState is 0: free, 1: held, 2: held, and threads may sleep on it.
 //
-//   0 -> 1   taken at once              1 -> 2   a waiter is about to sleep
-//   0 -> 2   taken by a waiter, who can't know whether others sleep
-//   1 -> 0   given back                 2 -> 0   given back, one sleeper woken
+//   0 -> 1   Acquire, TryAcquire                  1 -> 2   a waiter is about to sleep
+//   0 -> 2   Acquire by a waiter, which can't know whether others sleep
+//   1 -> 0   Release                              2 -> 0   Release, which then wakes one sleeper
 //
-// 1 -> 0 is a plain store where the system has restartable ones. A waiter breaks such stores after it has
-// written 2, so no owner that saw the 1 can overwrite the 2 any more. Where it can't break them, nobody might
-// wake it, so it looks again after a short sleep.
+// A waiter does not spin. The owner that wakes a sleeper goes on and may acquire the lock again before the
+// sleeper runs; under contention one thread so does many short sections in a row, and the lock's cache line
+// stays with it. Spinning was measured and lost: it moves the line and the lock at every release.
 //
-// As long as the process has one thread, plain loads and stores do: nobody can wait, and whoever starts a second
-// thread makes all that came before visible to it.
+// Memory order. The acquire loads of 0 in TryAcquireFree and AcquireContended read the value of the release store in
+// Release (or a later value of the same release sequence, which read-modify-writes continue), so an owner
+// happens after the previous owner. mnState needs no order beyond that: the kernel compares the word and
+// queues the sleeper in one step against a wake-up, so a waiter either sees the 0 or is woken.
+//   mnOwner is relaxed. Only the owner stores its own number, and clears it before the release store. So a
+// thread reads its own number exactly if it stored it and still holds the lock, whatever else it may read.
+//   mnDepth is plain: the owner alone reads and writes it.
+//   In a process with one thread, plain loads and stores do. Starting the second thread makes them visible.
 //
-// mnOwner and mnDepth are written by the owner alone. Another thread that reads mnOwner can only see that the
-// owner isn't itself. An owner is known by a number that is never given to a second thread, so a lock whose
-// owner was ended is not taken for its own by a thread that the system gave the same identifier.
+// An owner is known by a number that is never given to a second thread (system_lock.h). The system's thread
+// identifiers are reused, so the lock of a killed owner would seem to belong to a later thread.
 //
-// After the state has become 0 the lock is not touched again: whoever takes it next may destroy it.
+// Release does not touch the lock after its store of 0: the next owner may destroy it. The wake-up passes the
+// address alone to the kernel.
 //
-// A thread may be ended at any instruction. From its change of mnState to its store of 0 it holds the lock,
-// which then stays held, as promised. A waiter, or a thread that was about to wake one, passes the wake-up on
-// (see futex.h), so it holds nobody up.
+// A thread may be killed at any instruction. From its change of mnState to its store of 0 it holds the lock,
+// which then stays held. A waiter, and an owner that is about to wake one, notes a pending wake-up (futex.h).
 #ifndef ZANBASE_PLATFORM_LINUX_FUTEX_LOCK_H
 #define ZANBASE_PLATFORM_LINUX_FUTEX_LOCK_H
 
@@ -32,82 +37,67 @@ class FutexLock {
 public:
     using Thread = unsigned long long;  // never 0
 
-    void Take(Thread self) {
-        if (TakeAgain(self)) return;
-        if (!TakeFree()) TakeSlowly();
-        mnOwner.store(self, std::memory_order_relaxed);
+    void Acquire(Thread self) {
+        if (!TryAcquire(self)) AcquireContended(self);
     }
 
-    // The same after a sleep on a condition. The thread that has woken this one mostly holds the lock still;
-    // on the same processor it can't go on as long as this one spins.
-    void TakeAfterSleep(Thread self) {
-        if (TakeAgain(self)) return;
-        if (!TakeFree()) AwaitFree();
-        mnOwner.store(self, std::memory_order_relaxed);
-    }
-
-    bool TryTake(Thread self) {
-        if (TakeAgain(self)) return true;
-        if (!TakeFree()) return false;
+    bool TryAcquire(Thread self) {
+        if (TryAcquireAgain(self)) return true;
+        if (!TryAcquireFree()) return false;
         mnOwner.store(self, std::memory_order_relaxed);
         return true;
     }
 
-    void Give() {
+    // Gives back one level. Requires: the calling thread owns the lock.
+    void Release() {
         if (mnDepth != 0) {
             --mnDepth;
             return;
         }
         mnOwner.store(0, std::memory_order_relaxed);
+        unsigned int expected = 1;
         if (System::IsAlone()) {
-            System::StoreAlone(mnState, 0);
-        } else if (!System::StoreIfStill(mnState, 1, 0)) {
-            GiveSlowly();
+            mnState.store(0, std::memory_order_relaxed);
+        } else if (!mnState.compare_exchange_strong(expected, 0, std::memory_order_release,
+                                                    std::memory_order_relaxed)) {
+            ReleaseAndWake();
         }
     }
 
 private:
-    bool TakeAgain(Thread self) {
+    bool TryAcquireAgain(Thread self) {
         if (mnOwner.load(std::memory_order_relaxed) != self) return false;
         ++mnDepth;
         return true;
     }
 
-    bool TakeFree() {
+    bool TryAcquireFree() {
         unsigned int expected = 0;
         if (System::IsAlone()) {
             if (mnState.load(std::memory_order_relaxed) != 0) return false;
-            System::StoreAlone(mnState, 1);
+            mnState.store(1, std::memory_order_relaxed);
             return true;
         }
         return mnState.compare_exchange_strong(expected, 1, std::memory_order_acquire,
                                                std::memory_order_relaxed);
     }
 
-    __attribute__((noinline)) void TakeSlowly() {
-        const auto attempt = [this] { return mnState.load(std::memory_order_relaxed) == 0 && TakeFree(); };
-        if (!System::Spin(attempt)) AwaitFree();
+    __attribute__((noinline)) void AcquireContended(Thread self) {
+        const typename System::PendingWakeup pending(mnState);
+        while (mnState.exchange(2, std::memory_order_acquire) != 0) System::SleepWhile(mnState, 2, nullptr);
+        mnOwner.store(self, std::memory_order_relaxed);
     }
 
-    void AwaitFree() {
-        const typename System::PendingWakeup debt(mnState);
-        while (mnState.exchange(2, std::memory_order_acquire) != 0) {
-            if (System::BreakStores()) {
-                System::SleepWhile(mnState, 2, nullptr);
-            } else {
-                System::SleepShortly(mnState, 2);
-            }
-        }
-    }
-
-    __attribute__((noinline)) void GiveSlowly() {
-        const typename System::PendingWakeup debt(mnState);
-        if (mnState.exchange(0, std::memory_order_release) == 2) System::WakeSleepers(mnState, 1);
+    // The state is 2 and stays so: only the owner changes it from there.
+    __attribute__((noinline)) void ReleaseAndWake() {
+        const typename System::PendingWakeup pending(mnState);
+        mnState.store(0, std::memory_order_release);
+        System::WakeSleepers(mnState, 1);
     }
 
     typename System::Word mnState{0};
     unsigned int mnDepth = 0;           // levels held beyond the first
-    typename System::Owner mnOwner{0};  // 0: nobody
+    typename System::Owner mnOwner{0};  // 0: no thread
 };
 
 #endif

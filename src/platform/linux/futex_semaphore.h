@@ -1,20 +1,26 @@
 // A counting semaphore on one futex word.
 //
-// mnUnits is the count of free units, with its highest bit set if somebody may sleep:
+// mnUnits is the number of free units; its highest bit says that threads may sleep.
 //
-//   n -> n - 1            taken            n -> n + 1             given back
+//   n -> n - 1            TryAcquire              n -> n + 1          Release
 //   0 -> bit              a waiter is about to sleep
-//   bit + n -> n + 1      given back, one sleeper woken
-//   n -> bit + n - 1      taken by a waiter, who can't know whether others sleep
+//   bit + n -> n + 1      Release, which then wakes one sleeper
+//   n -> bit + n - 1      Acquire by a waiter, which can't know whether others sleep
 //
-// Whoever was woken either takes a unit or sets the bit again before it sleeps, so the bit is missing only
-// while somebody is on the way who will set it. As several units may have come meanwhile, a woken thread that
-// leaves units behind wakes the next.
+// A woken waiter acquires a unit and sets the bit, or sets the bit before it sleeps again. So while sleepers
+// exist and the bit is clear, a woken waiter is on its way to set it. Several units may have been released by
+// then: a woken waiter that leaves units behind wakes the next sleeper.
 //
-// After a unit was given the semaphore is not touched again: whoever takes the unit may destroy it.
+// Memory order. Every change is a compare-and-exchange with acq_rel. The release half publishes what the
+// thread did before Release; the acquire half of the change that takes the unit makes it visible. All changes
+// are read-modify-writes, so they continue the release sequence of each earlier Release: the thread that
+// acquires any later unit happens after that Release too. Loads are relaxed: they only choose the value that
+// the next change expects, and a failed change reads again.
 //
-// A thread may be ended at any instruction. Before its change of mnUnits it has no unit and has given none;
-// the wake-up that it may have swallowed, or not yet sent, is passed on (see futex.h).
+// Release does not touch the semaphore after its change: the thread that acquires the unit may destroy it.
+//
+// A thread may be killed at any instruction. Before its change of mnUnits it has acquired and released
+// nothing; a wake-up that it received or was about to send is forwarded (futex.h).
 #ifndef ZANBASE_PLATFORM_LINUX_FUTEX_SEMAPHORE_H
 #define ZANBASE_PLATFORM_LINUX_FUTEX_SEMAPHORE_H
 
@@ -27,18 +33,17 @@ public:
 
     explicit FutexSemaphore(unsigned int count) : mnUnits(count) {}
 
-    bool TryTake() {
+    bool TryAcquire() {
         unsigned int seen = mnUnits.load(std::memory_order_relaxed);
         while ((seen & kMost) != 0)
             if (Change(seen, seen - 1)) return true;
         return false;
     }
 
-    // False if there was no unit until the deadline. Doesn't spin first: a unit may be long in coming, and a
-    // giver on the same processor would come later for it.
-    bool Take(typename System::Deadline deadline) {
-        if (TryTake()) return true;
-        const typename System::PendingWakeup debt(mnUnits);
+    // False if there was no unit until the deadline. Does not spin: a unit may be long in coming.
+    bool Acquire(typename System::Deadline deadline) {
+        if (TryAcquire()) return true;
+        const typename System::PendingWakeup pending(mnUnits);
         unsigned int seen = mnUnits.load(std::memory_order_relaxed);
         for (;;) {
             if ((seen & kMost) != 0) {
@@ -52,8 +57,9 @@ public:
         }
     }
 
-    void Give() {
-        const typename System::PendingWakeup debt(mnUnits);
+    // No effect at kMost free units.
+    void Release() {
+        const typename System::PendingWakeup pending(mnUnits);
         unsigned int seen = mnUnits.load(std::memory_order_relaxed);
         do {
             if ((seen & kMost) == kMost) return;
@@ -64,7 +70,7 @@ public:
 private:
     static constexpr unsigned int kSleepers = ~kMost;
 
-    // Takes need the acquire half, gifts the release half.
+    // On failure `seen` becomes the value that was there.
     bool Change(unsigned int& seen, unsigned int desired) {
         return mnUnits.compare_exchange_strong(seen, desired, std::memory_order_acq_rel,
                                                std::memory_order_relaxed);

@@ -14,15 +14,16 @@ SystemLock::Thread NumberLockThread() noexcept {
     return tnLockThread;
 }
 
-void InitLock(HNativeLock* lock) noexcept {
-    AllowRestartableStores();
-    new (lock->storage) SystemLock;
-}
+void InitLock(HNativeLock* lock) noexcept { new (lock->storage) SystemLock; }
 
 void DestroyLock(HNativeLock*) noexcept {}
 
-void AcquireLock(HNativeLock* lock) noexcept { In(lock).Take(LockThread()); }
+// The number is looked up in two places, so that the frequent path calls nothing and saves no registers.
+void AcquireLock(HNativeLock* lock) noexcept {
+    if (__builtin_expect(tnLockThread != 0, 1)) return In(lock).Acquire(tnLockThread);
+    In(lock).Acquire(NumberLockThread());
+}
 
-bool TryAcquireLock(HNativeLock* lock) noexcept { return In(lock).TryTake(LockThread()); }
+bool TryAcquireLock(HNativeLock* lock) noexcept { return In(lock).TryAcquire(LockThread()); }
 
-void ReleaseLock(HNativeLock* lock) noexcept { In(lock).Give(); }
+void ReleaseLock(HNativeLock* lock) noexcept { In(lock).Release(); }

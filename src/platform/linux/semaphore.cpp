@@ -18,11 +18,11 @@ HNativeSemaphore* NewSemaphore(unsigned int count) {
 void DeleteSemaphore(HNativeSemaphore* semaphore) noexcept { delete semaphore; }
 
 bool AcquireUnit(HNativeSemaphore* semaphore, unsigned int limit_ms) noexcept {
-    if (limit_ms == 0) return semaphore->TryTake();
-    if (limit_ms == kForever) return semaphore->Take(nullptr);
-    if (semaphore->TryTake()) return true;
+    if (limit_ms == 0) return semaphore->TryAcquire();
+    if (limit_ms == kForever) return semaphore->Acquire(nullptr);
+    if (semaphore->TryAcquire()) return true;
     const timespec deadline = DeadlineIn(limit_ms);
-    return semaphore->Take(&deadline);
+    return semaphore->Acquire(&deadline);
 }
 
-void ReleaseUnit(HNativeSemaphore* semaphore) noexcept { semaphore->Give(); }
+void ReleaseUnit(HNativeSemaphore* semaphore) noexcept { semaphore->Release(); }

@@ -8,7 +8,6 @@ set(ZANBASE_PLATFORM_SOURCES
     lock.cpp
     messages.cpp
     processors.cpp
-    restartable.cpp
     semaphore.cpp
     standard_stream.cpp
     terminal_window.cpp

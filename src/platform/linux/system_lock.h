@@ -16,7 +16,10 @@ inline SystemLock& In(HNativeLock* lock) noexcept {
     return *std::launder(reinterpret_cast<SystemLock*>(lock->storage));
 }
 
-extern ZANBASE_FAST_THREAD_LOCAL SystemLock::Thread tnLockThread;  // 0: no number yet
+// The calling thread's number as an owner of locks; 0: it has none yet. Numbers are never reused.
+extern ZANBASE_FAST_THREAD_LOCAL SystemLock::Thread tnLockThread;
+
+// Gives the calling thread its number.
 SystemLock::Thread NumberLockThread() noexcept;
 
 inline SystemLock::Thread LockThread() noexcept {
