@@ -1,4 +1,4 @@
-// Which signals count, what a pass may go through, and the end of the worker.
+// Which signals are accepted, what a pass may do, and the end of the worker.
 #include "zanbase/hibernate_thread.h"
 
 #include <gtest/gtest.h>
@@ -18,16 +18,19 @@ const HSemaphore parked(0), leave(0);
 struct Worker : HHibernateThread {
     Worker(std::function<void(int)> pass) : moPass(std::move(pass)) {}
 
-    // Returns when the worker has begun this many passes, ended the last one, and sleeps.
+    // Returns when the worker has made this many passes and sleeps.
     void AwaitSleepAfter(int passes) const {
         while (mnPasses != passes || IsProcessing()) std::this_thread::yield();
         AwaitSleepOf(mnNumber);
         EXPECT_EQ(mnPasses, passes);
     }
 
-    // Holds the worker, asleep or not, in a signal handler until `leave` is given.
+    // Holds the sleeping worker in a signal handler until `leave` is unlocked.
     void Park() const {
-        signal(SIGUSR1, [](int) { parked.Unlock(), leave.Lock(); });
+        signal(SIGUSR1, [](int) {
+            parked.Unlock();
+            leave.Lock();
+        });
         tgkill(getpid(), static_cast<pid_t>(mnNumber), SIGUSR1);
         parked.Lock();
     }
@@ -42,24 +45,39 @@ struct Worker : HHibernateThread {
     std::atomic<unsigned long long> mnNumber{0};
 };
 
-TEST(HHibernateThread, CountsSignalsOnlyWhileItHibernates) {
+TEST(HHibernateThread, AcceptsNoSignalBeforeItsStart) {
+    Worker worker([](int) {});
+    EXPECT_TRUE(worker.IsProcessing());
+    EXPECT_FALSE(worker.Signal());
+}
+
+TEST(HHibernateThread, AcceptsNoSignalDuringAPass) {
     const HSemaphore entered(0), go_on(0);
-    Worker worker([&](int) { entered.Unlock(), go_on.Lock(); });
-    EXPECT_TRUE(worker.IsProcessing() && !worker.Signal() && worker.Start(true));
-    for (int pass = 1; pass <= 5; ++pass) {
+    Worker worker([&](int) {
+        entered.Unlock();
+        go_on.Lock();
+    });
+    worker.Start(true);
+    for (int pass = 1; pass <= 2; ++pass) {
         entered.Lock();
-        EXPECT_TRUE(worker.IsProcessing() && !worker.Signal());
+        EXPECT_TRUE(worker.IsProcessing());
+        EXPECT_FALSE(worker.Signal());
         go_on.Unlock();
-        if (pass != 2) continue;
-        worker.AwaitSleepAfter(2);
-        worker.Park();
-        for (int i = 0; i < 3; ++i) EXPECT_TRUE(worker.Signal());
-        leave.Unlock();
     }
+    worker.AwaitSleepAfter(2);
+}
+
+TEST(HHibernateThread, MakesOnePassForEachSignalThatItAccepts) {
+    Worker worker([](int) {});
+    worker.Start(true);
+    worker.AwaitSleepAfter(2);
+    worker.Park();
+    for (int i = 0; i < 3; ++i) EXPECT_TRUE(worker.Signal());
+    leave.Unlock();
     worker.AwaitSleepAfter(5);
 }
 
-TEST(HHibernateThread, SurvivesWhatGoesWrongInAPass) {
+TEST(HHibernateThread, SurvivesExceptionsAndFaultsInAPass) {
     const ChildResult child = RunInChild([] {
         Worker worker([](int pass) {
             if (pass == 1) throw std::runtime_error("bad luck");
@@ -85,10 +103,12 @@ TEST(HHibernateThread, EndsWithItsObjectByPolling) {
         EXPECT_EQ(microseconds, 1000);
         if (++polls == 3) leave.Unlock();
     });
-    for (const bool starts : {false, true}) {
+    {
+        const Worker never_started([](int) {});
+    }
+    EXPECT_EQ(polls, 0);
+    {
         Worker worker([](int pass) { passes = pass; });
-        EXPECT_EQ(polls, 0);
-        if (!starts) continue;
         worker.Start(true);
         worker.AwaitSleepAfter(2);
         worker.Park();

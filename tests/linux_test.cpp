@@ -143,6 +143,7 @@ TEST(LinuxGuard, ForwardsTheWakeUpsOfAnAbandonedBody) {
     AwaitSleepOf(number);
     const auto body = [](void*) {
         const PendingWakeup pending(word);
+        word = 1;
         WriteToNull();
     };
     EXPECT_TRUE(RunGuarded(body, nullptr));

@@ -1,6 +1,6 @@
-// Kills threads wherever they may stand, starts, kills and awaits one from all sides, and signals a worker: for
-// some seconds, or as many times longer as the argument says. A broken promise ends it with a message, a lock
-// of the C library that stays held with a hang.
+// Kills threads in different operations; starts, kills and awaits one thread from several; signals a worker. Runs
+// for some seconds, or as many times longer as the argument says. A broken promise aborts with a message; a lock of
+// the C library that stays held is a hang.
 #include <sys/resource.h>
 #include <unistd.h>
 
@@ -15,10 +15,10 @@
 #include "support/runner.h"
 #include "zanbase/hibernate_thread.h"
 
-// Who is killed frees nothing and joins nobody.
+// A killed thread frees nothing and joins no thread.
 extern "C" const char* __asan_default_options() { return "detect_leaks=0"; }
 extern "C" const char* __tsan_default_options() { return "report_thread_leaks=0"; }
-extern "C" __attribute__((weak)) void __asan_init(), __tsan_init();  // there under the sanitizers
+extern "C" __attribute__((weak)) void __asan_init(), __tsan_init();  // defined under the sanitizers
 
 namespace {
 
@@ -38,18 +38,18 @@ void Allocate() {
     for (unsigned int size = 1; size < 2000; size += 100) texts.emplace_back(size, 'x');
 }
 
-// Objects outlive their threads, whatever becomes of the thread that started those.
+// Global, so that they outlive their threads though the thread that started those is killed.
 const HSemaphore never(0);
 Runner endless([] { never.Lock(); });
 Runner allocating(Allocate);
 
 void ReadPipe() { Require(read(pipe_ends[0], pipe_ends, 1) != 0, "the pipe stays open"); }
 
-// Nearly always inside the C library, and so killed only after seconds: left to the longer runs.
+// Nearly always inside the C library, so a kill takes seconds: for longer runs only.
 void MakeThread() { std::thread(Allocate).join(); }
 
-// What a thread does again and again until it is killed.
-void (*const kDeeds[])() = {
+// What a thread repeats until it is killed.
+void (*const kOperations[])() = {
     [] {},
     std::this_thread::yield,
     [] { sleep(1000); },
@@ -62,14 +62,14 @@ void (*const kDeeds[])() = {
 };
 
 // A thousand kills in a row.
-void KillInEveryDeed() {
+void KillInEveryOperation() {
     std::atomic<int> steps{0};
-    for (const auto deed : kDeeds) {
-        if (deed == ReadPipe && __tsan_init != nullptr) continue;  // which holds signals back meanwhile
-        if (deed == MakeThread && rounds == kRounds) continue;
+    for (const auto operation : kOperations) {
+        if (operation == ReadPipe && __tsan_init != nullptr) continue;  // the tool delays signals meanwhile
+        if (operation == MakeThread && rounds == kRounds) continue;
         Runner runner([&] {
             const HMutex mutex;
-            for (const HMutexLock lock(&mutex);; ++steps) deed();
+            for (const HMutexLock lock(&mutex);; ++steps) operation();
         });
         for (int round = 0; round < 7 * rounds; ++round) {
             runner.Start(true);
@@ -86,7 +86,7 @@ struct Counter : HHibernateThread {
     void Process() override { ++passes; }
 };
 
-void OperateFromAllSides() {
+void OperateFromSeveralThreads() {
     Counter counter;
     counter.Start(true);
     std::mutex mutex;  // keeps a start and a kill apart
@@ -119,8 +119,8 @@ void LeaveNothingBehind() {
         if (round == 1000) getrusage(RUSAGE_SELF, &before);
     }
     getrusage(RUSAGE_SELF, &after);
-    const bool keeps_back = __asan_init != nullptr || __tsan_init != nullptr;
-    Require(keeps_back || after.ru_maxrss < before.ru_maxrss + 400, "level memory");
+    const bool is_sanitizer = __asan_init != nullptr || __tsan_init != nullptr;
+    Require(is_sanitizer || after.ru_maxrss < before.ru_maxrss + 400, "level memory");
 }
 
 }  // namespace
@@ -129,9 +129,9 @@ int main(int count, char** arguments) {
     if (count > 1) rounds *= std::atoi(arguments[1]);
     if (waste == nullptr || pipe(pipe_ends) != 0) return 1;
     LeaveNothingBehind();
-    OperateFromAllSides();
+    OperateFromSeveralThreads();
     endless.Start(true);
-    KillInEveryDeed();
+    KillInEveryOperation();
     allocating.Wait();
     endless.Kill();
     return 0;

@@ -1,4 +1,4 @@
-// Machine faults to order. The sanitizers are kept off them: they would report before the machine does.
+// Machine faults. Not instrumented: a sanitizer would report them before the machine raises them.
 #ifndef ZANBASE_TESTS_FAULTS_H
 #define ZANBASE_TESTS_FAULTS_H
 
@@ -22,7 +22,7 @@ ZANBASE_AS_WRITTEN DivideByZero() {
 }
 #endif
 
-// In steps of less than the page that guards a stack's end, and with no call, which might fault in its stead.
+// In steps below the size of the guard page at a stack's end, and without a call, which might fault instead.
 ZANBASE_AS_WRITTEN UseUpStack() {
     for (;;) *static_cast<volatile char*>(__builtin_alloca(1024)) = 0;
 }

@@ -1,4 +1,4 @@
-// A thread object whose Run is any function, with the protected part in reach.
+// A thread object whose Run calls any function.
 #ifndef ZANBASE_TESTS_RUNNER_H
 #define ZANBASE_TESTS_RUNNER_H
 
