@@ -1,5 +1,4 @@
-// From a signal to the pass that it makes and back, beside a worker of the same manner that stands on a
-// condition variable.
+// From a signal to its pass and back, beside a worker built on a condition variable.
 #include "zanbase/hibernate_thread.h"
 
 #include <benchmark/benchmark.h>
@@ -12,7 +11,7 @@
 
 namespace {
 
-// Both answer a pass by a unit of this.
+// Both workers release a unit of it in each pass.
 const HSemaphore answers(0);
 
 class Hibernating : public HHibernateThread {

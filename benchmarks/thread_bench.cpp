@@ -1,4 +1,4 @@
-// A thread from its start to its end, beside the standard library's, and asking for the own thread's number.
+// Start and end of a thread, beside the standard library's, and the number of the calling thread.
 #include "zanbase/thread.h"
 
 #include <benchmark/benchmark.h>

@@ -1,5 +1,5 @@
 // A worker counts words in the background: signals that it accepts, signals that it drops, a pass that fails,
-// and how its object is destroyed at the right moment.
+// and the destruction of its object once it hibernates.
 #include <cstdio>
 #include <map>
 #include <stdexcept>
@@ -10,7 +10,7 @@
 
 class WordCounter : public HHibernateThread {
 public:
-    // Before the base class: it ends a worker, but can't wait for a pass that needs this object.
+    // Here and not in the base class: a pass needs this object.
     ~WordCounter() override { CatchUp(); }
 
     void Add(const std::string& word) {
@@ -18,19 +18,18 @@ public:
             const HMutexLock lock(&moMutex);
             moWaiting.push_back(word);
         }
-        Offer();
+        RequestPass();
     }
 
-    // Returns when every word is counted and the worker sleeps.
+    // Returns when all words are counted and the worker hibernates.
     void CatchUp() {
-        // An offer made during a pass is dropped, and that pass may have taken its words before the last one
-        // came.
+        // A signal during a pass is dropped, and the pass may have taken its words before the last was added.
         while (IsRunning() && HasWaiting()) {
-            Offer();
+            RequestPass();
             USleep(1000);
         }
-        // First the count: once the last pass owed has begun, hibernating means that it is over.
-        while (IsRunning() && (mnPasses < mnOwed || IsProcessing())) USleep(1000);
+        // The count first: once the last requested pass has begun, hibernating means that it has ended.
+        while (IsRunning() && (mnPasses < mnRequested || IsProcessing())) USleep(1000);
     }
 
     int CountOf(const std::string& word) const {
@@ -39,8 +38,8 @@ public:
     }
 
 private:
-    void Offer() {
-        if (Signal()) ++mnOwed;
+    void RequestPass() {
+        if (Signal()) ++mnRequested;
     }
 
     bool HasWaiting() {
@@ -62,9 +61,9 @@ private:
 
     HMutex moMutex;
     std::vector<std::string> moWaiting;   // guarded by moMutex
-    std::map<std::string, int> moCounts;  // the worker's; anybody's while it sleeps
+    std::map<std::string, int> moCounts;  // the worker's; any thread may read it while the worker hibernates
     std::atomic<int> mnPasses{0};         // begun
-    int mnOwed = 2;                       // the worker makes two unasked
+    int mnRequested = 2;                  // the worker makes two after its start
 };
 
 int main() {

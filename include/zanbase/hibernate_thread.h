@@ -1,5 +1,5 @@
 /// @file
-/// A worker thread that does one pass of work whenever it is signalled, and sleeps in between.
+/// A worker thread that makes one pass of work for each signal, and sleeps in between.
 #ifndef ZANBASE_HIBERNATE_THREAD_H
 #define ZANBASE_HIBERNATE_THREAD_H
 
@@ -10,7 +10,7 @@
 #include "zanbase/semaphore.h"
 #include "zanbase/thread.h"
 
-/// A worker: a subclass says in `Process` what one pass of work is.
+/// A worker. A subclass implements `Process`, one pass of work.
 ///
 ///     struct Saver : HHibernateThread {
 ///         void Process() override { SaveWhatChanged(); }
@@ -19,57 +19,60 @@
 ///     saver.Start(true);
 ///     const bool will_save = saver.Signal();
 ///
-/// After `Start` the worker makes two passes in a row, unasked, and then hibernates: it sleeps without using
-/// the processor. Each signal that it accepts makes one pass more. What goes wrong in a pass does not end the
-/// worker: for an exception that escapes `Process`, or a machine fault in it, a line goes to standard output,
-/// and it hibernates as after any other pass (see `HThread` for what a fault leaves behind).
+/// After `Start` the worker makes two passes and then hibernates: it sleeps and uses no processor time. Each
+/// accepted signal adds one pass. If an exception escapes `Process`, or a machine fault ends it, one line is
+/// printed on standard output and the worker continues as after any other pass (see `HThread` for what a
+/// fault leaves behind).
 ///
-/// | Worker      | `IsProcessing` | `Signal`             | Left by                      |
-/// |-------------|----------------|----------------------|------------------------------|
-/// | not started | true           | false                | `Start`                      |
-/// | in a pass   | true           | false                | the end of the pass          |
-/// | hibernating | false          | true, one pass more  | a pass that it owes          |
-/// | ended       | true           | false                | not at all: the object goes  |
+/// | Worker      | `IsProcessing` | `Signal`             | Left by                       |
+/// |-------------|----------------|----------------------|-------------------------------|
+/// | not started | true           | false                | `Start`                       |
+/// | in a pass   | true           | false                | the end of the pass           |
+/// | hibernating | false          | true, adds one pass  | the pass that a signal added  |
+/// | ended       | true           | false                | never; the object is destroyed |
 ///
-/// A signal is an offer and not an entry in a queue: one made during a pass is dropped, and its sender has to
-/// see to that. Where every request counts, take a queue with a `HCondVar`. The worker lives until its object
-/// is destroyed; `Stop` does not stop it. `Kill` ends it by force, with all that `HThread::Kill` warns of:
-/// between two passes its own mutex may stay locked, and then `Signal` never returns.
+/// A signal is not queued: a signal during a pass is dropped, and the caller must handle that. Where every
+/// request counts, use a queue with a `HCondVar`.
 ///
-/// Destroy an object only while its worker is in no pass and owes none: the two after `Start` and one for
-/// each true answer of `Signal` are done, and `IsProcessing` gives false. Otherwise the worker may enter
-/// `Process` when the subclass is gone. A subclass that counts its passes can wait for that in its own
-/// destructor.
+/// The worker runs until its object is destroyed; `Stop` does not stop it. `Kill` terminates it, with all
+/// effects that `HThread::Kill` documents. A killed worker leaves the object in the state it was killed in:
+/// if that was hibernating, `Signal` still returns true and no pass follows; if it was between two passes,
+/// the object's mutex may stay locked, and then `Signal` deadlocks.
+///
+/// **Lifetime.** Destroy an object only while its worker hibernates and has no pass left to make: the two
+/// passes after `Start` and one for each true result of `Signal` are done, and `IsProcessing` returns false.
+/// Otherwise the worker may call `Process` after the subclass is destroyed. A subclass that counts its passes
+/// can wait for this in its own destructor.
 class ZANBASE_API HHibernateThread : public HThread {
 public:
-    /// A worker that is not started, at normal priority.
+    /// Creates a worker at normal priority. Does not start it.
     HHibernateThread();
 
-    /// Ends the worker and waits for that, testing once a millisecond by `USleep`; the pass it is in, if any,
-    /// comes to its end first, and no other follows. An object that was never started goes at once.
-    /// The subclass is gone by then: see above for when an object may be destroyed.
+    /// Ends the worker and waits for its end, polling once a millisecond by `USleep`. A pass that has begun
+    /// is completed first. Returns at once if the worker was never started.
+    /// Requires: see Lifetime.
     ~HHibernateThread() override;
 
-    /// Offers one pass. True if the worker is hibernating: it will make one pass more, and so many as there
-    /// are true answers. False if it isn't: nothing has happened. Any thread, at any time.
+    /// Requests one pass. True if the worker was hibernating; one pass runs per true result. Otherwise false,
+    /// no effect. Thread-safe.
     bool Signal() const;
 
-    /// False while the worker hibernates, else true, also before `Start`. A snapshot, which may be out of
-    /// date at once: a false as long as the worker owes a pass or somebody signals. Any thread, at any time.
+    /// False while the worker hibernates, otherwise true, also before `Start`. The result may be out of date
+    /// at once; false is while another thread calls `Signal` or a requested pass has not begun. Thread-safe.
     [[nodiscard]] bool IsProcessing() const;
 
 protected:
-    /// The worker's loop of passes and sleeps.
+    /// The worker's loop.
     void Run() override;
 
-    /// One pass of work; called on the worker thread alone.
+    /// One pass of work. Called only on the worker thread.
     virtual void Process() = 0;
 
 private:
-    std::atomic<bool> mbStop{false};         // set by the destructor alone; ordered by moWakeUp
-    std::atomic<bool> mbHibernating{false};  // guarded by moStateMutex, except that anybody may look
+    std::atomic<bool> mbStop{false};         // written by the destructor; published by moWakeUp
+    std::atomic<bool> mbHibernating{false};  // written under moStateMutex; IsProcessing reads it without
     HMutex moStateMutex;
-    HSemaphore moWakeUp{1};  // a unit for each pass that the worker owes; it starts with the second
+    HSemaphore moWakeUp{1};  // one unit for each pass to make; the initial unit is the second pass
 };
 
 #endif

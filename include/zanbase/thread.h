@@ -1,5 +1,5 @@
 /// @file
-/// The thread object that callers derive from, and the library's notion of which thread is which.
+/// The thread object that callers derive from, and the number of the calling thread.
 #ifndef ZANBASE_THREAD_H
 #define ZANBASE_THREAD_H
 
@@ -9,10 +9,10 @@
 
 struct HNativeThread;
 
-/// How much of a busy processor a thread gets, from least to most. Normal is what the process itself has; a
-/// value beyond the last counts as normal. On Linux the values stand for a nice value of the thread, 39, 10
-/// and 5 above that of the process and 5, 10 and 39 below, within -20 to 19. The system lets only privileged
-/// processes lower it, be it back to normal, and a refusal goes unreported.
+/// How much of a busy processor a thread gets, from least to most. Normal is the priority of the process; a
+/// value beyond the last counts as normal. On Linux a priority sets the nice value of the thread: 39, 10 and
+/// 5 above that of the process, or 5, 10 and 39 below, clamped to -20 to 19. Only privileged processes may
+/// lower a nice value, also back to normal. A refusal is not reported.
 enum HThreadPriority : unsigned int {
     HThreadPriorityIdle = 0,
     HThreadPriorityLowest = 1,
@@ -23,7 +23,7 @@ enum HThreadPriority : unsigned int {
     HThreadPriorityTimeCritical = 6
 };
 
-/// A thread: a subclass says in `Run` what it does, `Start` lets it do that on a thread of its own.
+/// A thread. A subclass implements `Run`; `Start` calls it on a new thread.
 ///
 ///     struct Greeter : HThread {
 ///         void Run() override { std::puts("hello"); }
@@ -32,100 +32,112 @@ enum HThreadPriority : unsigned int {
 ///     greeter.Start(true);
 ///     greeter.Wait();
 ///
-/// An object owns one thread at most. When `Run` has ended, in whatever way, the object is idle and can be
-/// started again, also at another priority. An exception that escapes `Run` ends the thread and not the
-/// process, and so does a machine fault in it: an access to memory that isn't there, an integer division by
-/// zero, an exhausted stack. One line on standard output tells of either. A fault abandons the frames of
-/// `Run` as they stand: no destructor runs, locks stay held, and a fault inside `malloc` leaves that locked
-/// too. `abort` ends the process as ever, and `pthread_exit` in `Run` ends the thread without a word. A
-/// handler for such signals that the program installs after the first start sees the faults first, and has to
-/// hand on those of threads like this.
+/// An object owns at most one thread. When `Run` has ended, in whatever way, the object is idle and can be
+/// started again.
 ///
-/// Any thread may call any operation at any time, except that `Start` must not run twice at once on one
-/// object, nor beside `Kill`; of two calls of `SetPriority` at once either may win. The object must outlive
-/// its thread, and the destructor does not wait: destroy it only while it is idle. A subclass whose `Run`
-/// uses its members has to see the thread end before they go. In the child of a fork every object is idle but
-/// that of the thread that forked. For a worker that is woken again and again take `HHibernateThread`; for
-/// many short jobs, or one whose result is awaited, a thread each is the wrong tool.
+/// **Thread safety.** All operations are thread-safe, with one exception: `Start` must not run concurrently
+/// with `Start` or `Kill` on the same object. Of two concurrent calls of `SetPriority` either may win.
+///
+/// **Lifetime.** The object must outlive its thread. The destructor does not wait: destroy the object only
+/// while it is idle. A subclass whose `Run` uses its members must wait for the thread before those are
+/// destroyed.
+///
+/// **Exceptions and machine faults.** An exception that escapes `Run` ends the thread and prints one line on
+/// standard output. So does a machine fault: an invalid memory access, an integer division by zero, an
+/// illegal instruction, an exhausted stack. A fault abandons the frames of `Run` without unwinding them: no
+/// destructor runs, and locks stay held. A fault inside `malloc` or `fwrite` leaves the heap or the stream
+/// locked; then the next thread that allocates, or calls `fflush(nullptr)`, deadlocks. On Linux:
+///   - `Run` must not block SIGSEGV, SIGBUS, SIGFPE or SIGILL: the system ends the process at a fault whose
+///     signal is blocked. A mask inherited from the thread that called `Start` does no harm.
+///   - A handler for these signals that the program installs after the first `Start` is called first. It must
+///     pass on the faults of these threads to the handler that it replaced.
+///   - `abort` ends the process. `pthread_exit` in `Run` ends the thread and prints nothing. A thread that
+///     calls the raw `exit` system call stays "running" until `Kill`.
+///
+/// **Fork.** In the child every object is idle, except that of the thread that called `fork`.
+///
+/// Use `HHibernateThread` for a worker that is woken repeatedly. Don't use a thread each for many short jobs.
 class ZANBASE_API HThread {
 public:
-    /// An idle object that wants `priority`. Makes no thread.
+    /// Creates an idle object with the given priority. Creates no thread.
     HThread(HThreadPriority priority = HThreadPriorityNormal);
 
-    /// Does nothing about the thread.
+    /// Has no effect on the thread. Requires: the object is idle.
     virtual ~HThread();
 
-    /// Makes a thread that calls `Run`, at the priority wanted, and returns true if it is still running.
-    /// False if there is a thread already, which goes on undisturbed; if `Run` is over already; or if the
-    /// system can't make a thread: then a line on standard output says why, and a later call may succeed. The
-    /// argument has no effect.
+    /// Creates a thread that calls `Run`, sets its priority, and returns true if the thread is still running.
+    /// Returns false if there is a thread already, which is not affected; if `Run` has ended already; or if
+    /// the system can't create a thread. In the last case a line on standard output gives the reason, and a
+    /// later call may succeed. The argument has no effect.
     virtual bool Start(bool);
 
-    /// Does nothing. A subclass may let it ask `Run` to end.
+    /// Does nothing. A subclass may override it with a request to end `Run`.
     virtual void Stop();
 
-    /// Whether there is a thread. A false is final until the next `Start`, and all that the thread wrote can
-    /// be seen; a true may be out of date at once.
+    /// True if there is a thread. True may be out of date at once. False is final until the next `Start`, and
+    /// everything that the thread did happens before.
     [[nodiscard]] bool IsRunning() const;
 
-    /// Waits until the thread has ended, with the destructors of its thread-local objects. Any number of
+    /// Waits until the thread has ended, including the destructors of its thread-local objects. Any number of
     /// threads may wait. Returns at once if there is no thread, and on the thread itself.
     void Wait();
 
-    /// Ends the thread wherever it stands, and returns when it is gone and the object idle. Nothing of it
-    /// runs any more: no destructor, no handler, no exit routine. What it holds stays held for ever, a
-    /// `HMutex` for instance, and what it was changing stays half changed. On the thread itself it doesn't
-    /// return. A last resort.
+    /// Terminates the thread asynchronously and returns when it is gone and the object is idle. Returns at
+    /// once if there is no thread; does not return on the thread itself. No destructor, handler or exit
+    /// routine of the thread runs. What it holds stays held for ever, such as a `HMutex`; what it was
+    /// changing stays half changed. Use it only if nothing else is left.
     ///
-    /// On Linux a signal ends the thread: of the real-time signals the highest but one, or the next below it
-    /// that the program has no handler for. What that can't do, and what it breaks:
-    ///   - A thread that blocks all signals is ended when it admits them again or has come to its end, and
-    ///     the call waits until then. So it does if the program uses every real-time signal.
-    ///   - A thread inside the C library may hold a lock there, that of `malloc` or of a stream, which would
-    ///     stop every other thread. So it is let out first, which takes microseconds as a rule; one that is
-    ///     never found outside for ten seconds, as it fills memory without pause, is ended all the same. A
-    ///     wait inside the library counts as outside after ten milliseconds. So a lock of the library can
-    ///     stay held if the thread waits for room in a pipe that it writes to by `printf`, or runs in a
-    ///     callback that the library makes under a lock, such as that of `dl_iterate_phdr`.
-    ///   - Other threads that wait for a `std::condition_variable` together with it may miss their wake-ups
-    ///     from then on. Mutexes, the semaphores and the `HCondVar` of this library stay whole.
-    ///   - The C library loses the thread's cache of freed blocks: about 0.7 kB, and what the thread has
-    ///     freed, up to 234 kB; also 32 bytes for each of its thread-local objects with a destructor.
+    /// A thread that has not entered `Run` yet does not enter it.
+    ///
+    /// On Linux a signal terminates the thread: the highest real-time signal but one, or the next below it
+    /// that the program neither handles nor blocks at the first `Start`. Limits and side effects:
+    ///   - If the thread blocks all signals, `Kill` waits until it unblocks them or ends. `Kill` also waits
+    ///     for the end of the thread if the program has a handler for every real-time signal.
+    ///   - A thread inside the C library may hold a lock there, such as that of `malloc`. It is terminated
+    ///     once it has left, mostly within microseconds. It is terminated inside the library if it is not
+    ///     found outside for ten seconds, or if it waits at one system call for ten milliseconds; the latter
+    ///     is one second while a thread holds the lock of `stdout` or `stderr`.
+    ///   - So these locks can stay held: that of `stdin`, if the thread waits in `fgets(stdin)` or
+    ///     `getline(cin)`, after which every `fflush(nullptr)` deadlocks; that of a stream, if the thread
+    ///     waits in `printf` for room in a pipe; those of the resolver, if it waits in `getaddrinfo`; the
+    ///     loader's, if it runs in a callback of `dl_iterate_phdr`. Before the call end such a wait, by
+    ///     closing the other end of the pipe for instance.
+    ///   - Other threads that wait on a `std::condition_variable` together with the thread may miss wake-ups
+    ///     from then on. The mutexes, semaphores and condition variables of this library are not affected.
+    ///   - Memory leaks: the thread's cache of freed blocks (0.7 kB, and up to 234 kB that the thread has
+    ///     freed), and 32 bytes for each thread-local object with a destructor.
     ///   - If the initial thread has ended by `pthread_exit`, the process ends without its exit handlers.
     void Kill();
 
-    /// Sets the priority wanted, which lasts over restarts. A running thread takes it at once; nothing
-    /// happens if it is the one wanted already.
+    /// Sets the priority, for the running thread and for later starts. Does nothing if it is set already.
     void SetPriority(HThreadPriority priority);
 
-    /// The calling thread's number in the system. It never has more than 32 bits, is the same on every call
-    /// from one thread, and differs between threads that live at the same time; the system may give the
-    /// number of a thread that has ended to a new one. Cheap.
+    /// The system's number of the calling thread. Fits in 32 bits, never changes, and differs between threads
+    /// that live at the same time; the system may reuse the number of a thread that has ended. Cheap.
     [[nodiscard]] static unsigned long long GetCurrentThreadId();
 
 protected:
-    /// A thread object of its own: idle, at normal priority, whatever the other one is.
+    /// Creates an idle object at normal priority. Takes nothing from the other object.
     HThread(const HThread&);
 
-    /// Changes nothing.
+    /// Does nothing.
     HThread& operator=(const HThread&);
 
-    /// What the thread does.
+    /// The body of the thread.
     virtual void Run() = 0;
 
-    /// Lets another thread that is ready run first.
+    /// Offers the processor to other threads that are ready.
     void(Yield)();
 
-    /// Lets the thread go: the object is idle, the thread runs on without an owner, and touches the object no
-    /// more once `Run` is over. Who waits for it already goes on waiting.
+    /// Detaches the thread. The object becomes idle; the thread does not access it after `Run` returns.
+    /// Threads already in `Wait` keep waiting.
     void DestroyThread();
 
-    /// What a new thread does: `Run`, and the line if an exception or a fault ends it.
+    /// Calls `Run` on the new thread, and prints the line if an exception or a machine fault ends it.
     static void _Run_(HThread* thread);
 
 private:
-    std::atomic<HNativeThread*> mpoThread{
-        nullptr};  // null while idle; the thread itself empties it at its end
+    std::atomic<HNativeThread*> mpoThread{nullptr};  // null while idle; the thread clears it at its end
     std::atomic<HThreadPriority> mnPriority;
 };
 

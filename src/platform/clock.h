@@ -7,14 +7,14 @@ struct WallClock {
     unsigned short milliseconds;  // 0 to 999, within that second
 };
 
-// The system's wall clock, cut to milliseconds. It moves when the system time is set.
+// The system's wall clock, truncated to milliseconds. It jumps when the system time is set.
 WallClock ReadWallClock() noexcept;
 
-// A count that goes up by 1000 a second of real time, also while the process sleeps, and never back; it wraps
-// at 32 bits.
+// A monotonic count of milliseconds, which includes the time that the process sleeps. Wraps at 32 bits.
 unsigned int ReadTicks() noexcept;
 
-// Returns after `ms` milliseconds or a little later, never earlier; 0 lets another ready thread run first.
+// Returns after `ms` milliseconds or a little later, never earlier. 0 offers the processor to other threads
+// that are ready. Not a cancellation point.
 void SleepFor(unsigned int ms) noexcept;
 
 #endif

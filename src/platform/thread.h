@@ -1,9 +1,10 @@
-// Contract: threads that can be ended from outside, each known by a slot in its owner's object.
+// Contract: threads that can be terminated from outside. A slot in the owner's object identifies each thread.
 //
-// A slot is null, or leads to the one thread that its owner owns. StartThread fills it before the first
-// instruction of the body; at the body's end the thread empties it, if it still leads to that thread, and
-// touches neither the slot nor its owner after that. Any thread may call these functions on one slot at any
-// time, except that a slot is started by one thread at a time, and only while it is empty.
+// A slot is null or points to the one thread that its owner owns. StartThread fills it before the first
+// instruction of the body. When the body ends, the thread empties the slot if it still points to that thread,
+// and accesses neither the slot nor its owner after that.
+//
+// All functions are thread-safe, except that only one thread at a time may start a slot.
 #ifndef ZANBASE_PLATFORM_THREAD_H
 #define ZANBASE_PLATFORM_THREAD_H
 
@@ -13,38 +14,40 @@
 struct HNativeThread;
 using ThreadSlot = std::atomic<HNativeThread*>;
 
-// Starts a thread at the process's own priority, level 3, that calls body(argument); nothing but what
-// RethrowThreadExit throws may leave the body. 0, or the system's number for what went wrong, with the slot
-// left empty.
+// Starts a thread that calls body(argument), at level 3, the priority of the process. Returns 0, or the
+// system's error number with the slot left empty.
+// Requires: the slot is empty; only what RethrowThreadExit throws leaves the body.
 int StartThread(ThreadSlot& slot, void (*body)(void*), void* argument) noexcept;
 
-// The system's text for a number that StartThread gave, without a line end.
+// The system's text for an error number of StartThread, without a line end.
 std::string SystemErrorText(int error);
 
-// Waits until the thread in the slot has ended, with the destructors of its thread-local objects. Returns at
-// once if the slot is empty or leads to the calling thread.
+// Waits until the thread in the slot has ended, including the destructors of its thread-local objects. Any
+// number of threads may wait. Returns at once if the slot is empty or points to the calling thread.
 void JoinThread(ThreadSlot& slot) noexcept;
 
-// Ends the thread in the slot where it stands, or, if it has not yet entered its body, before it does: no
-// destructor, handler or exit routine of it runs, and what it holds stays held. Returns when no instruction
-// of it can run any more, with the slot empty; does not return on the thread in the slot itself.
+// Terminates the thread in the slot asynchronously: no destructor, handler or exit routine of it runs, and
+// what it holds stays held. A thread that has not entered its body does not enter it. Returns when no
+// instruction of the thread can run any more, with the slot empty. Does not return on the thread in the slot
+// itself.
 void KillThread(ThreadSlot& slot) noexcept;
 
-// Empties the slot; the thread runs on and can't be reached any more. Who waits for it already still does.
+// Empties the slot. The thread runs on and can't be reached any more; threads already in JoinThread keep
+// waiting.
 void DetachThread(ThreadSlot& slot) noexcept;
 
-// Sets the priority of the thread in the slot: a level from 0 (idle) to 6 (time-critical); 3 is the priority of
-// the process itself. Does nothing if the slot is empty. A refusal of the system is not reported.
+// Sets the priority of the thread in the slot: a level from 0 (idle) to 6 (time-critical); 3 is the priority
+// of the process. Does nothing if the slot is empty. A refusal of the system is not reported.
 void SetNativePriority(ThreadSlot& slot, int level) noexcept;
 
-// To be called first in every `catch (...)` that may stand around the code of a body: where the system ends a
-// thread by an exception of its own, this passes it on, so that the thread can end.
+// Rethrows the exception by which the system ends a thread, if that is the current one; otherwise returns.
+// Requires: called first in every `catch (...)` around the code of a body.
 void RethrowThreadExit();
 
-// A number that no other living thread of the system has.
+// The system's number of the calling thread, which no other living thread has.
 unsigned int CurrentThreadId() noexcept;
 
-// Lets another ready thread run first.
+// Offers the processor to other threads that are ready.
 void YieldThread() noexcept;
 
 #endif

@@ -1,4 +1,4 @@
-// HHibernateThread: a flag that says whether a signal counts, and a semaphore that counts them.
+// HHibernateThread: a flag decides whether a signal is accepted, and a semaphore counts the accepted ones.
 #include "zanbase/hibernate_thread.h"
 
 #include "threads/reported_body.h"
@@ -11,14 +11,14 @@ HHibernateThread::HHibernateThread() = default;
 HHibernateThread::~HHibernateThread() {
     mbStop = true;
     moWakeUp.Unlock();
-    constexpr int kMicrosecondsBetweenTests = 1000;
-    while (IsRunning()) USleep(kMicrosecondsBetweenTests);
+    constexpr int kMicrosecondsBetweenPolls = 1000;
+    while (IsRunning()) USleep(kMicrosecondsBetweenPolls);
 }
 
 bool HHibernateThread::Signal() const {
     HMutexLock lock(&moStateMutex);
     const bool accepted = mbHibernating;
-    lock.Release();  // first, or the worker wakes up only to wait for it
+    lock.Release();  // before the wake-up: the worker would only wait for the mutex
     if (accepted) moWakeUp.Unlock();
     return accepted;
 }
@@ -33,7 +33,7 @@ void HHibernateThread::Run() {
             const HMutexLock lock(&moStateMutex);
             mbHibernating = true;
         }
-        // A signal from here on leaves its unit in the semaphore, so none is lost before the sleep.
+        // A signal between the two leaves its unit in the semaphore, so it is not lost.
         moWakeUp.Lock();
         const HMutexLock lock(&moStateMutex);
         mbHibernating = false;

@@ -1,4 +1,4 @@
-// Runs the code of a caller so that what goes wrong in it is printed and goes no further.
+// Runs a caller's code; an exception or machine fault in it is printed and ends there.
 #ifndef ZANBASE_THREADS_REPORTED_BODY_H
 #define ZANBASE_THREADS_REPORTED_BODY_H
 
@@ -8,8 +8,8 @@
 #include "platform/guard.h"
 #include "platform/thread.h"
 
-// Calls body(argument). An exception or a machine fault that ends it becomes one line on standard output,
-// which begins with `where`.
+// Calls body(argument). If an exception or a machine fault ends it, prints one line on standard output that
+// begins with `where`. Thread-safe.
 inline void RunReported(const char* where, void (*body)(void*), void* argument) {
     try {
         if (!RunGuarded(body, argument)) return;

@@ -1,4 +1,4 @@
-// HThread on the platform's threads: messages and priorities; the rest is the platform's.
+// HThread on the threads of the platform layer, with its messages and priorities.
 #include "zanbase/thread.h"
 
 #include <cstdio>
@@ -56,9 +56,8 @@ void(HThread::Yield)() { YieldThread(); }
 
 void HThread::DestroyThread() { DetachThread(mpoThread); }
 
-// The platform empties mpoThread when this returns, if it still leads to this thread, and that is the last
-// access to the object. It isn't done here, by DestroyThread, because the object may own another thread by
-// now.
+// When this returns, the platform layer empties mpoThread if it still points to this thread: the last access
+// to the object. DestroyThread can't do that here, because the object may own another thread by now.
 void HThread::_Run_(HThread* thread) {
     RunReported(
         "HThread::_Run_()", [](void* object) { static_cast<HThread*>(object)->Run(); }, thread);

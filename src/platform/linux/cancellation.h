@@ -1,5 +1,5 @@
-// Keeps pthread_cancel out of functions that are noexcept: a cancellation unwinds the thread, which would end the
-// process there.
+// Keeps pthread_cancel out of functions that are noexcept: a cancellation unwinds the thread, which would end
+// the process there.
 #ifndef ZANBASE_PLATFORM_LINUX_CANCELLATION_H
 #define ZANBASE_PLATFORM_LINUX_CANCELLATION_H
 

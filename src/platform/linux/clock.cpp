@@ -40,7 +40,7 @@ void SleepFor(unsigned int ms) noexcept {
     }
     const NoCancellation no_cancellation;
     const timespec until = DeadlineIn(ms);
-    // The end is absolute, so a pause cut by a signal goes on for just what is left of it.
+    // The deadline is absolute, so after a signal only the rest is slept.
     while (clock_nanosleep(CLOCK_MONOTONIC, TIMER_ABSTIME, &until, nullptr) == EINTR) {
     }
 }

@@ -78,8 +78,8 @@ void OnFault(int signal, siginfo_t* info, void* context) {
     if (sent || frame == nullptr || toSelf.mnKillDeferrals != 0)
         return CallPreviousHandler(signal, info, context, sent);
     // The fault may be that of a signal handler which interrupted a lock operation or a wait for a thread;
-    // neither continues. Both calls are safe here: the first makes system calls only, and this thread does not
-    // hold the block mutex that the second acquires.
+    // neither continues. Both calls are safe here: the first makes system calls only, and this thread does
+    // not hold the block mutex that the second acquires.
     ForwardPendingWakeups();
     AbandonWait();
     pthread_sigmask(SIG_SETMASK, &frame->moBlocked, nullptr);

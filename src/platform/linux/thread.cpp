@@ -106,7 +106,8 @@ void SetNativePriority(ThreadSlot& slot, int level) noexcept {
     }
 }
 
-// The exception of pthread_exit has no object; the undefined-behaviour sanitizer takes it for a null reference.
+// The exception of pthread_exit has no object; the undefined-behaviour sanitizer takes it for a null
+// reference.
 __attribute__((no_sanitize("undefined"))) void RethrowThreadExit() {
     try {
         throw;

@@ -7,14 +7,15 @@
 //   Exiting   the body has ended; TLS destructors run, and a thread waits for them  Ended
 //   Killed    the thread makes a few last steps of our own; its stack remains      Reaping
 //   Reaping   a waiter, or the next StartThread, is in pthread_join for it         Ended
-//   Ended     only waiters use the block                                           Starting, after the free list
+//   Ended     only waiters use the block                                           Starting, after the free
+//   list
 //
 // A slot points to a block only while the block is Starting or Running, and no longer after DetachThread.
 // A thread whose body ends calls pthread_detach for itself. A killed thread can't, so another thread has to
 // call pthread_join before the C library reuses its stack.
 //
-// A block that is Ended and has no waiter is put on the free list. Blocks are never deleted, so a late wake-up
-// finds valid memory.
+// A block that is Ended and has no waiter is put on the free list. Blocks are never deleted, so a late
+// wake-up finds valid memory.
 #ifndef ZANBASE_PLATFORM_LINUX_THREAD_BLOCK_H
 #define ZANBASE_PLATFORM_LINUX_THREAD_BLOCK_H
 
@@ -96,8 +97,8 @@ void EnterBlock(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex);
 // run before the block is Ended.
 bool CloseBlock(HNativeThread* block) noexcept;
 
-// Empties the slot and makes the block Killed. Its thread makes no further step in a body, and uses the block no
-// more.
+// Empties the slot and makes the block Killed. Its thread makes no further step in a body, and uses the block
+// no more.
 void MarkKilled(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex);
 
 // Makes the block Ended. The caller wakes the waiters after it has released the block mutex.

@@ -1,8 +1,9 @@
 // Asynchronous termination: the handler of a real-time signal exits the thread by the raw exit system call.
 //
-// No destructors, cancellation handlers or TLS destructors run; the C library's per-thread caches leak. A lock of
-// the C library that the thread holds, such as malloc's, would stay held and stop all other threads. So the
-// handler lets a thread that may hold one continue (see thread_kill_safety.h), and KillThread asks again.
+// No destructors, cancellation handlers or TLS destructors run; the C library's per-thread caches leak. A
+// lock of the C library that the thread holds, such as malloc's, would stay held and stop all other threads.
+// So the handler lets a thread that may hold one continue (see thread_kill_safety.h), and KillThread asks
+// again.
 #include "platform/linux/thread_kill.h"
 
 #include <cerrno>
@@ -21,8 +22,8 @@
 
 namespace {
 
-// Clears the values of thread-specific data, whose destructors must not run. The next thread on the same stack
-// would find the values otherwise. The thread sanitizer keeps its record of the thread there.
+// Clears the values of thread-specific data, whose destructors must not run. The next thread on the same
+// stack would find the values otherwise. The thread sanitizer keeps its record of the thread there.
 void DropThreadKeys() noexcept {
     if (IsThreadSanitizerOn()) return;
     for (pthread_key_t key = 0; key < PTHREAD_KEYS_MAX; ++key) pthread_setspecific(key, nullptr);

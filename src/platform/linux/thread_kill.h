@@ -1,5 +1,5 @@
-// Asynchronous termination of threads: deferring it, and the end of a thread that is killed. KillThread itself is
-// declared in platform/thread.h.
+// Asynchronous termination of threads: deferring it, and the end of a thread that is killed. KillThread
+// itself is declared in platform/thread.h.
 #ifndef ZANBASE_PLATFORM_LINUX_THREAD_KILL_H
 #define ZANBASE_PLATFORM_LINUX_THREAD_KILL_H
 
@@ -7,8 +7,8 @@
 
 #include "platform/linux/thread_self.h"
 
-// Terminates the calling thread, which StartThread made. No destructor, cancellation handler or TLS destructor
-// runs; wake-ups that the thread has to forward are forwarded.
+// Terminates the calling thread, which StartThread made. No destructor, cancellation handler or TLS
+// destructor runs; wake-ups that the thread has to forward are forwarded.
 // Requires: kills are not deferred.
 [[noreturn]] void ExitKilledThread() noexcept;
 

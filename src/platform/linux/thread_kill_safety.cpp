@@ -3,15 +3,16 @@
 //
 // - sched_yield: the library does not call it under a lock, and a thread may do nothing else.
 // - A wait of this back end: it uses the library's syscall function, without a lock of the library.
-// - Behind a system call that the signal has made fail with EINTR: the library makes no such call under its own
-//   locks, and the program must not see the error.
-// - The same system call with the same stack for kBlockedMs: the thread waits for input, or for a mutex of the
-//   program. The library's own locks are released sooner, unless the machine is very busy. As long as a thread
-//   holds the lock of stdout or stderr, kOutputMs replaces this limit: a full pipe may be read meanwhile.
+// - Behind a system call that the signal has made fail with EINTR: the library makes no such call under its
+//   own locks, and the program must not see the error.
+// - The same system call with the same stack for kBlockedMs: the thread waits for input, or for a mutex of
+//   the program. The library's own locks are released sooner, unless the machine is very busy. As long as a
+//   thread holds the lock of stdout or stderr, kOutputMs replaces this limit: a full pipe may be read
+//   meanwhile.
 //
-// What remains: a thread that waits longer for room in a pipe, or for input of a stream, is killed with the stream
-// locked. So is a thread that executes the program's code under a lock of the library, such as a callback of
-// dl_iterate_phdr.
+// What remains: a thread that waits longer for room in a pipe, or for input of a stream, is killed with the
+// stream locked. So is a thread that executes the program's code under a lock of the library, such as a
+// callback of dl_iterate_phdr.
 #include "platform/linux/thread_kill_safety.h"
 
 #include <algorithm>
@@ -60,8 +61,8 @@ struct Search {
     LibraryCode found;
 };
 
-// Records the code of a module that contains a mark. The program itself, the module without a name, is left out
-// even if it contains an allocator, because its other code is not library code.
+// Records the code of a module that contains a mark. The program itself, the module without a name, is left
+// out even if it contains an allocator, because its other code is not library code.
 int RecordLibraryCode(dl_phdr_info* module, std::size_t, void* argument) {
     auto& [marks, found] = *static_cast<Search*>(argument);
     const auto is_here = [=](std::uintptr_t mark) { return Contains(module, mark); };
@@ -99,7 +100,8 @@ bool IsHeld(std::FILE* stream) noexcept {
 }  // namespace
 
 void FindLibraryCode() noexcept {
-    // Elsewhere a thread is killed wherever it is. The thread sanitizer may show a place that was left long ago.
+    // Elsewhere a thread is killed wherever it is. The thread sanitizer may show a place that was left long
+    // ago.
     if (!kKnowsPlaces || IsThreadSanitizerOn() || gbSearched.load(std::memory_order_acquire)) return;
     Search search{
         {reinterpret_cast<std::uintptr_t>(&gnu_get_libc_version),

@@ -21,8 +21,8 @@ bool HasHandler(int signal) noexcept {
     return (action.sa_flags & SA_SIGINFO) != 0 || action.sa_handler != SIG_DFL;
 }
 
-// The highest signal but one without a handler; 0 if there is none. A signal in `excluded` is taken only if all
-// others have a handler.
+// The highest signal but one without a handler; 0 if there is none. A signal in `excluded` is taken only if
+// all others have a handler.
 int FindUnusedSignal(const sigset_t& excluded) noexcept {
     int excluded_choice = 0;
     for (int signal = SIGRTMAX - 1; signal >= SIGRTMIN; --signal) {

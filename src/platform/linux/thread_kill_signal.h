@@ -6,8 +6,8 @@
 
 #include "platform/linux/thread_block.h"
 
-// Returns the number of the kill signal. If the program has taken it over, chooses another. 0 if there is no unused
-// real-time signal.
+// Returns the number of the kill signal. If the program has taken it over, chooses another. 0 if there is no
+// unused real-time signal.
 int KillSignal() noexcept ZANBASE_REQUIRES(goBlockMutex);
 
 // Unblocks the kill signal on the calling thread.

@@ -44,8 +44,8 @@ inline long long ResultIn(const ucontext_t&) noexcept { return 0; }
 
 #endif
 
-// True if the instruction at `code` is a system call. A thread that a signal interrupts in a system call is at
-// this instruction if the kernel restarts the call, and behind it if the call fails with EINTR.
+// True if the instruction at `code` is a system call. A thread that a signal interrupts in a system call is
+// at this instruction if the kernel restarts the call, and behind it if the call fails with EINTR.
 inline bool IsSystemCall(std::uintptr_t code) noexcept {
     return std::memcmp(reinterpret_cast<const void*>(code), kSystemCallCode, sizeof kSystemCallCode) == 0;
 }

@@ -22,8 +22,8 @@ void Reap(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
     MarkEnded(block);
 }
 
-// True if the thread of the block has ended; the calling thread is no waiter any more. Otherwise false, with the
-// block's generation in `seen`.
+// True if the thread of the block has ended; the calling thread is no waiter any more. Otherwise false, with
+// the block's generation in `seen`.
 bool RemoveWaiterIfEnded(HNativeThread* block, unsigned int& seen) noexcept {
     const DeferKill defer_kill;
     bool is_reaper = false;
