@@ -27,9 +27,8 @@ read -ra libraries <<<"$(pkg-config --libs zanbase)"
 if "$compiler" "${flags[@]}" -M "$consumer/main.cpp" | grep -F /boost/; then exit 1; fi
 "$compiler" "${flags[@]}" "$consumer/main.cpp" "${libraries[@]}" -o "$work/program"
 "$work/program"
-# The program on the first screen of the README prints what stands below it, and a blank line.
-for block in 1 3; do
-    awk '/^```/ {block += 1; next} block == '$block "$sources/README.md" >"$work/$block.cpp"
-done
-"$compiler" "${flags[@]}" "$work/1.cpp" "${libraries[@]}" -o "$work/program"
-diff "$work/3.cpp" <("$work/program" | sed '$d')
+# The README's first program prints the block after it and an empty line.
+readme_block() { awk -v number="$1" '/^```/ {block += 1; next} block == number' "$sources/README.md"; }
+readme_block 1 >"$work/program.cpp"
+(cd "$work" && "$compiler" "${flags[@]}" program.cpp "${libraries[@]}" -o program)
+diff <(readme_block 3) <("$work/program" | sed '$d')
