@@ -1,0 +1,248 @@
+/// @file
+/// Memory that the allocation tracker knows of without a line of feeding: a memory resource, an allocator, an
+/// owning pointer, and what a replacement of the global `operator new` needs.
+#ifndef ZANBASE_ADAPTERS_TRACKED_MEMORY_H
+#define ZANBASE_ADAPTERS_TRACKED_MEMORY_H
+
+#include <cstddef>
+#include <memory>
+#include <memory_resource>
+#include <new>
+#include <type_traits>
+#include <utility>
+
+#include "zanbase/memory.h"
+
+#if __cplusplus >= 202002L
+#include <version>
+#endif
+#ifdef __cpp_lib_source_location
+#include <source_location>
+#endif
+
+//     HTrackedResource memory;                          // blocks are recorded at this file and line
+//     std::pmr::vector<int> numbers(&memory);
+//
+//     std::vector<int, HTrackedAllocator<int>> more(HCallSite::Here());
+//     HTrackedPtr<Widget> widget = HMakeTracked<Widget>(HCallSite::Here(), 3, "three");
+//
+// All of them record a block after it was allocated, and its end before it is given back, so no other thread
+// can record the same address in between. If the tracker has no memory for a record, the block is given back
+// and `std::bad_alloc` reaches the caller. If a free can't be recorded, the record stays. What is freed and
+// was never recorded (because it was allocated during a pause, or the tables were reset) is given back all
+// the same. Any thread may use any of them, where what they allocate from is thread-safe.
+//
+// examples/adapters/tracked_memory.cpp shows these, examples/adapters/operator_new.cpp the replacement.
+
+/// A call site for the tracker. The text must stay readable as long as the tracker holds it; texts of
+/// `__builtin_FILE` and of `std::source_location` do.
+struct HCallSite {
+    const char* mpcFile;  ///< not owned, not null
+    int mnLine;           ///< line in that file
+
+    /// The place of the call; as a default argument, the place of the call that uses it.
+    static constexpr HCallSite Here(const char* file = __builtin_FILE(), int line = __builtin_LINE()) {
+        return {file, line};
+    }
+
+#ifdef __cpp_lib_source_location
+    /// The place that `where` tells.
+    static constexpr HCallSite At(const std::source_location& where) {
+        return {where.file_name(), static_cast<int>(where.line())};
+    }
+#endif
+};
+
+/// While one of these exists on a thread, the adapters of this header record nothing on that thread. Pauses
+/// nest. An object belongs to the thread that made it.
+///
+/// In a program whose `operator new` records, put a pause around the tracker's own operations (reports,
+/// snapshots, `Push`, `Pop`, the resets): those allocate and free while they walk over its tables.
+/// Requires: no block that was recorded is freed during the pause; its record would stay.
+class HTrackerPause {
+public:
+    /// Starts a pause.
+    HTrackerPause() noexcept { ++mnPauses; }
+    /// Ends it.
+    ~HTrackerPause() { --mnPauses; }
+    HTrackerPause(const HTrackerPause&) = delete;
+    HTrackerPause& operator=(const HTrackerPause&) = delete;
+
+    /// True if the calling thread has a pause.
+    [[nodiscard]] static bool IsActive() noexcept { return mnPauses != 0; }
+
+private:
+    static inline thread_local int mnPauses = 0;
+};
+
+/// Records the block at `ptr`, unless the thread has a pause. What the tracker allocates for its record is
+/// not recorded, so a replaced `operator new` may call this.
+inline void HTrackAlloc(void* ptr, std::size_t size, const HCallSite& site) {
+    if (HTrackerPause::IsActive()) return;
+    const HTrackerPause pause;
+    HMemory::Alloc(ptr, size, site.mpcFile, site.mnLine);
+}
+
+/// Records that the block at `ptr` is given back, unless the thread has a pause. Call it before the block is
+/// given back. If the tracker has no memory for it, the record stays.
+inline void HTrackFree(void* ptr) noexcept {
+    if (HTrackerPause::IsActive()) return;
+    const HTrackerPause pause;
+    try {
+        HMemory::Free(ptr);
+    } catch (const std::bad_alloc&) {
+    }
+}
+
+/// Calls `allocate`, records its block of `size` bytes and returns it. If that can't be recorded, calls
+/// `deallocate` with the block and passes the exception on. For code that wraps another allocator.
+template <class Allocate, class Deallocate>
+auto HTrackedAllocation(std::size_t size, const HCallSite& site, Allocate allocate, Deallocate deallocate) {
+    const auto unrecorded = [](auto call, auto... block) {
+        const HTrackerPause pause;  // what is below may be an operator new that records
+        return call(block...);
+    };
+    const auto block = unrecorded(allocate);
+    try {
+        HTrackAlloc(block, size, site);
+    } catch (...) {
+        unrecorded(deallocate, block);
+        throw;
+    }
+    return block;
+}
+
+/// A memory resource that takes blocks from `upstream` and records them at one call site, by default the line
+/// that makes the resource.
+class HTrackedResource : public std::pmr::memory_resource {
+public:
+    /// Takes from the default resource of the moment.
+    explicit HTrackedResource(const HCallSite& site = HCallSite::Here())
+        : HTrackedResource(std::pmr::get_default_resource(), site) {}
+    /// Takes from `upstream`, which is not null and outlives this resource.
+    explicit HTrackedResource(std::pmr::memory_resource* upstream, const HCallSite& site = HCallSite::Here())
+        : mpoUpstream(upstream), moSite(site) {}
+
+private:
+    void* do_allocate(std::size_t bytes, std::size_t alignment) override {
+        return HTrackedAllocation(
+            bytes, moSite, [&] { return mpoUpstream->allocate(bytes, alignment); },
+            [&](void* block) { mpoUpstream->deallocate(block, bytes, alignment); });
+    }
+
+    void do_deallocate(void* block, std::size_t bytes, std::size_t alignment) override {
+        HTrackFree(block);
+        const HTrackerPause pause;
+        mpoUpstream->deallocate(block, bytes, alignment);
+    }
+
+    bool do_is_equal(const std::pmr::memory_resource& other) const noexcept override {
+        const auto* const tracked = dynamic_cast<const HTrackedResource*>(&other);
+        return tracked != nullptr && tracked->mpoUpstream->is_equal(*mpoUpstream);
+    }
+
+    std::pmr::memory_resource* mpoUpstream;  // not owned
+    HCallSite moSite;
+};
+
+/// An allocator that takes from `Upstream` and records at one call site. It has no default constructor: a
+/// container that made its own would tell a line of the standard library.
+template <class T, class Upstream = std::allocator<T>>
+class HTrackedAllocator {
+    using Traits = std::allocator_traits<Upstream>;
+    static_assert(std::is_same_v<typename Traits::pointer, T*>, "the tracker knows plain pointers only");
+
+public:
+    /// @cond
+    using value_type = T;
+    using propagate_on_container_copy_assignment = typename Traits::propagate_on_container_copy_assignment;
+    using propagate_on_container_move_assignment = typename Traits::propagate_on_container_move_assignment;
+    using propagate_on_container_swap = typename Traits::propagate_on_container_swap;
+    using is_always_equal = typename Traits::is_always_equal;
+    template <class Other>
+    struct rebind {
+        using other = HTrackedAllocator<Other, typename Traits::template rebind_alloc<Other>>;
+    };
+    /// @endcond
+
+    /// Records at `site` what it takes from `upstream`.
+    HTrackedAllocator(const HCallSite& site, const Upstream& upstream = Upstream())
+        : moUpstream(upstream), moSite(site) {}
+    /// For another type, the same site and a copy of the upstream.
+    template <class Other, class OtherUpstream>
+    HTrackedAllocator(const HTrackedAllocator<Other, OtherUpstream>& other)
+        : moUpstream(other.GetUpstream()), moSite(other.GetSite()) {}
+
+    /// Room for `count` objects.
+    [[nodiscard]] T* allocate(std::size_t count) {
+        return HTrackedAllocation(
+            count * sizeof(T), moSite, [&] { return Traits::allocate(moUpstream, count); },
+            [&](T* block) { Traits::deallocate(moUpstream, block, count); });
+    }
+    /// Gives the room back.
+    void deallocate(T* block, std::size_t count) {
+        HTrackFree(block);
+        const HTrackerPause pause;
+        Traits::deallocate(moUpstream, block, count);
+    }
+
+    /// What it takes from.
+    [[nodiscard]] const Upstream& GetUpstream() const { return moUpstream; }
+    /// Where it records.
+    [[nodiscard]] const HCallSite& GetSite() const { return moSite; }
+
+    /// Equal if the upstreams are; the site does not matter.
+    friend bool operator==(const HTrackedAllocator& one, const HTrackedAllocator& other) {
+        return one.moUpstream == other.moUpstream;
+    }
+    /// The opposite.
+    friend bool operator!=(const HTrackedAllocator& one, const HTrackedAllocator& other) {
+        return !(one == other);
+    }
+
+private:
+    Upstream moUpstream;
+    HCallSite moSite;
+};
+
+/// Destroys an object of `HMakeTracked`. Where `T` is a base of the object's class, it has a virtual destructor.
+template <class T>
+struct HTrackedDelete {
+    HTrackedDelete() = default;
+    /// For a pointer to a base.
+    template <class Derived, class = std::enable_if_t<std::is_convertible_v<Derived*, T*>>>
+    HTrackedDelete(const HTrackedDelete<Derived>&) noexcept {}
+
+    /// Destroys `object`, which is not null, and records that its block is given back.
+    void operator()(T* object) const noexcept {
+        void* block = object;
+        if constexpr (std::is_polymorphic_v<T>) block = dynamic_cast<void*>(object);  // the whole object
+        object->~T();
+        HTrackFree(block);
+        const HTrackerPause pause;
+        ::operator delete(block);
+    }
+};
+
+/// Owns one object that the tracker knows.
+template <class T>
+using HTrackedPtr = std::unique_ptr<T, HTrackedDelete<T>>;
+
+/// Makes a `T` of `arguments` and records its block at `site`.
+template <class T, class... Arguments>
+[[nodiscard]] HTrackedPtr<T> HMakeTracked(const HCallSite& site, Arguments&&... arguments) {
+    static_assert(alignof(T) <= __STDCPP_DEFAULT_NEW_ALIGNMENT__, "for a stricter alignment use a container");
+    using Block = std::unique_ptr<void, void (*)(void*)>;
+    Block block(HTrackedAllocation(
+                    sizeof(T), site, [] { return ::operator new(sizeof(T)); },
+                    [](void* failed) { ::operator delete(failed); }),
+                [](void* unused) {
+                    HTrackFree(unused);
+                    ::operator delete(unused);
+                });
+    HTrackedPtr<T> object(::new (block.get()) T(std::forward<Arguments>(arguments)...));
+    block.release();
+    return object;
+}
+
+#endif
