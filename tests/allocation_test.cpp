@@ -5,28 +5,19 @@
 
 #include <csignal>
 #include <cstring>
-#include <new>
 
+#include "support/failing_allocation.h"
 #include "support/run_in_child.h"
 
 namespace {
 
-// The first `failures` attempts fail, by null or by an exception.
-int failures = 0, attempts = 0, handled = 0;
-bool throws = false;
+int attempts = 0, handled = 0;
+bool fails_by_exception = false;
 
 bool Fails() {
-    if (++attempts > failures) return false;
-    return throws ? throw std::bad_alloc() : true;
-}
-
-void Count() { ++handled; }
-void CountAndLeave() { ++handled, HOutOfMemoryHandler(nullptr); }
-void Throw() { throw std::bad_alloc(); }
-
-void FailNext(int times, bool by_exception = false, void (*handler)() = Count) {
-    handled = attempts = 0, failures = times, throws = by_exception;
-    HOutOfMemoryHandler(handler);
+    ++attempts;
+    if (!AttemptFails()) return false;
+    return fails_by_exception ? throw std::bad_alloc() : true;
 }
 
 }  // namespace
@@ -42,55 +33,82 @@ void* __wrap_realloc(void* ptr, std::size_t size) { return Fails() ? nullptr : _
 
 namespace {
 
-// "attempts/calls of the handler", and whether a block came of them.
-std::string Outcome(void* (*allocate)(), int times, bool by_exception, void (*handler)()) {
-    FailNext(times, by_exception, handler);
-    std::string end = " block";
+void Count() { ++handled; }
+void CountAndLeave() {
+    ++handled;
+    HOutOfMemoryHandler(nullptr);
+}
+void Throw() { throw std::bad_alloc(); }
+
+void FailNext(int times, void (*handler)(), bool by_exception = false) {
+    attempts = handled = 0;
+    attempts_to_fail = times;
+    fails_by_exception = by_exception;
+    HOutOfMemoryHandler(handler);
+}
+
+using Allocator = void* (*)();
+
+std::string OutcomeOf(Allocator allocate) {
+    std::string end = "block";
     try {
         std::free(allocate());
     } catch (const std::bad_alloc&) {
-        end = " none";
+        end = "exception";
     }
-    return std::to_string(attempts) + "/" + std::to_string(handled) + end;
+    return std::to_string(attempts) + " attempts, " + std::to_string(handled) + " handled, " + end;
 }
 
-TEST(Allocators, CallTheHandlerOnceForEachFailedAttempt) {
-    void* (*const allocators[])() = {[] { return HMalloc(0); }, [] { return HCalloc(4, 10); },
-                                     [] { return HRealloc(nullptr, 40); },
-                                     [] { return static_cast<void*>(HString("text")); },
-                                     [] { return static_cast<void*>(HString(nullptr)); }};
-    for (const auto& each : allocators) {
-        SCOPED_TRACE(&each - allocators);
-        const bool copies = &each - allocators > 2;  // which lets an exception of the attempt itself pass
-        EXPECT_EQ(Outcome(each, 3, false, Count), "4/3 block");
-        EXPECT_EQ(Outcome(each, 3, false, CountAndLeave), "4/1 block");  // patience follows
-        EXPECT_EQ(Outcome(each, 1, true, Count), copies ? "1/0 none" : "2/1 block");
-        EXPECT_EQ(Outcome(each, 1, false, Throw), "1/0 none");
-    }
+class Allocators : public testing::TestWithParam<Allocator> {};
+
+TEST_P(Allocators, CallTheHandlerOnceForEachFailedAttempt) {
+    FailNext(3, Count);
+    EXPECT_EQ(OutcomeOf(GetParam()), "4 attempts, 3 handled, block");
+    FailNext(3, CountAndLeave);  // pauses follow
+    EXPECT_EQ(OutcomeOf(GetParam()), "4 attempts, 1 handled, block");
+    FailNext(1, Throw);
+    EXPECT_EQ(OutcomeOf(GetParam()), "1 attempts, 0 handled, exception");
 }
 
-TEST(Allocators, StopTheProcessWhenNobodyHandlesALastingShortage) {
-    const ChildResult child =
-        RunInChild([] { return FailNext(9999, false, nullptr), HMalloc(8) == nullptr; });
+void* CopyText() { return HString("text"); }
+
+INSTANTIATE_TEST_SUITE_P(All, Allocators,
+                         testing::Values([] { return HMalloc(0); }, [] { return HCalloc(4, 10); },
+                                         [] { return HRealloc(nullptr, 40); }, CopyText,
+                                         []() -> void* { return HString(nullptr); }));
+
+TEST(Allocator, TakesAnExceptionForAFailedAttemptExceptInHString) {
+    FailNext(1, Count, true);
+    EXPECT_EQ(OutcomeOf([] { return HMalloc(1); }), "2 attempts, 1 handled, block");
+    FailNext(1, Count, true);
+    EXPECT_EQ(OutcomeOf(CopyText), "1 attempts, 0 handled, exception");
+}
+
+TEST(Allocator, EndsTheProcessIfAShortageLastsAndNoHandlerIsInstalled) {
+    const ChildResult child = RunInChild([] {
+        FailNext(9999, nullptr);
+        return HMalloc(8) == nullptr ? 1 : 0;
+    });
     EXPECT_EQ(child.signal, SIGABRT);
-    EXPECT_EQ(child.err, "zanbase: memory exhausted and no handler installed\n");
+    EXPECT_EQ(child.err, "zanbase: memory exhausted and no handler installed: 8 bytes requested\n");
 }
 
-TEST(Allocators, GiveTheBlocksTheyPromise) {
-    FailNext(0);
+TEST(Allocator, GivesTheBlocksItPromises) {
     char text[] = "text";
     char* copy = HString(text);
     text[0] = 'T';
-    FailNext(2);
+    FailNext(2, Count);
     copy = static_cast<char*>(HRealloc(copy, 4000));
     EXPECT_STREQ(copy, "text");
-    FailNext(1, true);
+    FailNext(1, Count, true);
     EXPECT_EQ(HRealloc(copy, 0), nullptr);
-    EXPECT_EQ(attempts * 10 + handled, 10);  // to free is tried once
+    EXPECT_EQ(attempts, 1);
+    EXPECT_EQ(handled, 0);
     std::free(copy);
     char* const empty = HString(nullptr);
     EXPECT_STREQ(empty, "");
-    EXPECT_STREQ(std::strcpy(empty, "fifteen letters"), "fifteen letters");  // the address sanitizer looks on
+    EXPECT_STREQ(std::strcpy(empty, "fifteen letters"),
+                 "fifteen letters");  // the address sanitizer checks 16 bytes
     std::free(empty);
 }
 

@@ -8,7 +8,7 @@
 #include <thread>
 
 #include "diskio/disk_io_reports.h"
-#include "support/failing_new.h"
+#include "support/failing_allocation.h"
 #include "support/run_in_child.h"
 #include "zanbase/string_makers.h"
 

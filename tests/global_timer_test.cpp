@@ -7,7 +7,7 @@
 #include <iostream>
 
 #include "platform/clock.h"
-#include "support/failing_new.h"
+#include "support/failing_allocation.h"
 #include "support/run_in_child.h"
 #include "zanbase/openmp.h"
 

@@ -4,7 +4,7 @@
 #include <map>
 #include <thread>
 
-#include "support/failing_new.h"
+#include "support/failing_allocation.h"
 #include "support/written_text.h"
 #include "zanbase/memory_tables.h"
 #include "zanbase/string_makers.h"

@@ -6,7 +6,7 @@
 
 #include <thread>
 
-#include "support/failing_new.h"
+#include "support/failing_allocation.h"
 #include "zanbase/disk_io.h"
 #include "zanbase/global_timer.h"
 #include "zanbase/memory.h"

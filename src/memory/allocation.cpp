@@ -2,6 +2,7 @@
 #include "zanbase/allocation.h"
 
 #include <atomic>
+#include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -15,21 +16,22 @@ using Handler = void (*)();
 
 std::atomic<Handler> gpfnOutOfMemoryHandler{nullptr};
 
-// The C library declares its allocators not to throw, and a compiler then drops a `catch` around a call; an
-// allocator that a program put in their place may throw all the same. Nothing is assumed of a call through a
-// volatile pointer.
+// The C library declares its allocators not to throw, and a compiler then drops a `catch` around a call. An allocator
+// that a program put in their place may throw. The compiler assumes nothing about a call through a volatile pointer.
 void* (*const volatile kMalloc)(std::size_t) = std::malloc;
 void* (*const volatile kCalloc)(std::size_t, std::size_t) = std::calloc;
 void* (*const volatile kRealloc)(void*, std::size_t) = std::realloc;
 
-// What a failed attempt leads to when nobody installed a handler: memory may come back while other threads or
-// processes end, so the attempt is repeated after 1, 2, 4, … ms; a caller that can't go on without its block
-// must not go on, so after the last pause the process stops.
-class Patience {
+// The pauses between attempts while no handler is installed. Memory may be freed while other threads or processes end,
+// so the attempt is repeated after 1, 2, 4, … ms. A caller that requires its block must not continue without it, so
+// after the last pause the process is aborted.
+class RetryPauses {
 public:
-    void Use() {
+    // Sleeps for the next pause; aborts after the last one. `bytes` is the size that was requested.
+    void SleepOrAbort(std::size_t bytes) {
         if (mnPauseMs > kLongestPauseMs) {
-            std::fputs("zanbase: memory exhausted and no handler installed\n", stderr);
+            std::fprintf(stderr, "zanbase: memory exhausted and no handler installed: %zu bytes requested\n",
+                         bytes);
             std::abort();
         }
         SleepFor(mnPauseMs);
@@ -41,36 +43,41 @@ private:
     unsigned int mnPauseMs = 1;
 };
 
-// Runs `attempt` until it gives a block; a std::bad_alloc out of it counts as a null.
+// Repeats `attempt` until it gives a block of `bytes` bytes. A std::bad_alloc out of it counts as null.
 template <class Attempt>
-void* Insist(Attempt attempt) {
-    Patience patience;
+void* RetryUntilAllocated(std::size_t bytes, Attempt attempt) {
+    RetryPauses pauses;
     for (;;) {
         try {
             if (void* block = attempt()) return block;
         } catch (const std::bad_alloc&) {
-            // Not passed on: the handler decides what becomes of exhausted memory.
+            // Not passed on: the handler decides what exhausted memory leads to.
         }
         if (const Handler handler = gpfnOutOfMemoryHandler.load()) {
             handler();
         } else {
-            patience.Use();
+            pauses.SleepOrAbort(bytes);
         }
     }
+}
+
+// The largest size if the product is larger still.
+std::size_t Product(std::size_t count, std::size_t size) {
+    return size != 0 && count > SIZE_MAX / size ? SIZE_MAX : count * size;
 }
 
 }  // namespace
 
 void* HMalloc(std::size_t size) {
-    return Insist([=] { return kMalloc(size); });
+    return RetryUntilAllocated(size, [=] { return kMalloc(size); });
 }
 
 void* HCalloc(std::size_t count, std::size_t size) {
-    return Insist([=] { return kCalloc(count, size); });
+    return RetryUntilAllocated(Product(count, size), [=] { return kCalloc(count, size); });
 }
 
 void* HRealloc(void* ptr, std::size_t size) {
-    if (size != 0) return Insist([=] { return kRealloc(ptr, size); });
+    if (size != 0) return RetryUntilAllocated(size, [=] { return kRealloc(ptr, size); });
     try {
         return kRealloc(ptr, 0);
     } catch (const std::bad_alloc&) {
@@ -78,14 +85,14 @@ void* HRealloc(void* ptr, std::size_t size) {
     }
 }
 
-// Unlike the others it lets a std::bad_alloc of the attempt through, and reads the handler only at entry and
-// after each call of it.
+// Unlike the others it passes on a std::bad_alloc of the attempt, and reads the handler only at entry and after each
+// call of it.
 char* HString(const char* text) {
     constexpr std::size_t kEmptyBlockBytes = 16;
     const int length = text != nullptr ? static_cast<int>(std::strlen(text)) : 0;
     const std::size_t size = text != nullptr ? static_cast<std::size_t>(length) + 1 : kEmptyBlockBytes;
     Handler handler = gpfnOutOfMemoryHandler.load();
-    Patience patience;
+    RetryPauses pauses;
     for (;;) {
         if (char* copy = static_cast<char*>(kMalloc(size))) {
             if (text == nullptr) {
@@ -98,7 +105,7 @@ char* HString(const char* text) {
             handler();
             handler = gpfnOutOfMemoryHandler.load();
         } else {
-            patience.Use();
+            pauses.SleepOrAbort(size);
         }
     }
 }
