@@ -1,8 +1,8 @@
-// The allocation tracker. Under moMutex, from one operation to the next:
+// The allocation tracker. Invariants, whenever moMutex is free:
 //
-// - The three tables exist all or none.
-// - A recent site points to an entry of *mpoFileMap, or is null. The table keeps an entry where it is until
-//   the table is emptied or replaced, and whoever does that forgets the recent sites.
+// - All three tables exist, or none.
+// - A remembered bucket is only a guess: it is compared with the usage table at each use, so a derived class may
+//   change that table.
 // - A spare node belongs to no table, so no reader of the tables sees it.
 #include "zanbase/memory.h"
 
@@ -21,12 +21,12 @@ std::size_t HMemory::mnPeekMemory = 0;
 
 namespace {
 
-// What makes the tracker fast beside its tables, which stay plain: a look-up in the usage table is saved
-// where a site comes again soon, and a block that goes leaves its node to the next one. Together they take a
-// third off the time spent in the tables. All of it is guarded by moMutex.
+// The tables, and what makes them fast: most look-ups in the usage table start at a remembered bucket, which saves
+// the hash (a fifth of the time of an Alloc and Free), and the node of a freed block serves the next block, which
+// saves an allocation (another fifth). All of it is guarded by moMutex.
 class Tracker : public HMemory {
 public:
-    // All tables or none, should memory run out.
+    // If memory runs out, no table exists and the next call tries again.
     static void MakeTables() {
         auto file_map = std::make_unique<FileMap>();
         auto memory_map = std::make_unique<MemoryMap>();
@@ -35,22 +35,25 @@ public:
         mpoFileMap = file_map.release();
         mpoMemoryMap = memory_map.release();
         mpoMemoryStack = memory_stack.release();
-        ForgetSites();
     }
 
+    // The entry of a call site, made if there is none.
     static MemoryUsage& UsageOf(const char* file, int line) {
-        const auto address = reinterpret_cast<std::uintptr_t>(file);
-        const std::uint64_t mixed =
-            (address + std::uintptr_t{31} * static_cast<unsigned int>(line)) * kGoldenRatio;
-        FileMap::value_type*& recent = maRecentSites[mixed >> (64 - kRecentSiteBits)];
-        if (recent == nullptr || recent->first != CallSite(file, line))
-            recent = &*mpoFileMap->try_emplace(CallSite(file, line)).first;
-        return recent->second;
+        std::size_t& bucket = maSiteBuckets[GuessIndex(file, line)];
+        if (bucket < mpoFileMap->bucket_count()) {
+            const auto end = mpoFileMap->end(bucket);
+            for (auto entry = mpoFileMap->begin(bucket); entry != end; ++entry) {
+                auto& [site, usage] = *entry;
+                if (site.first == file && site.second == line) return usage;
+            }
+        }
+        const CallSite site(file, line);
+        MemoryUsage& usage = (*mpoFileMap)[site];
+        bucket = mpoFileMap->bucket(site);
+        return usage;
     }
 
-    static void ForgetSites() { maRecentSites.fill(nullptr); }
-
-    // Does nothing if there is a block at `ptr`.
+    // Does nothing if the table has a block at `ptr` already.
     static void AddBlock(void* ptr, const MemoryBlock& block) {
         SpareNodes& spare = *mpoSpareNodes;
         if (spare.mnCount == 0) {
@@ -61,7 +64,8 @@ public:
         node.key() = ptr;
         node.mapped() = block;
         mpoMemoryMap->insert(mpoMemoryMap->cend(), std::move(node));
-        if (node.empty()) --spare.mnCount;  // NOLINT(bugprone-use-after-move): a node not taken stays in it
+        if (node.empty())
+            --spare.mnCount;  // NOLINT(bugprone-use-after-move): a node that was not inserted stays in it
     }
 
     static void DropBlock(MemoryMap::const_iterator block) {
@@ -74,8 +78,15 @@ public:
     }
 
 private:
-    static constexpr int kRecentSiteBits = 8;
-    static constexpr std::uint64_t kGoldenRatio = 0x9e3779b97f4a7c15;  // 2^64 over it: spreads any input
+    static constexpr int kGuessBits = 8;
+
+    // Multiplication by 2^64 over the golden ratio spreads any input over the upper bits.
+    static std::size_t GuessIndex(const char* file, int line) {
+        constexpr std::uint64_t kGoldenRatio = 0x9e3779b97f4a7c15;
+        const auto address = reinterpret_cast<std::uintptr_t>(file);
+        return (address + std::uintptr_t{31} * static_cast<unsigned int>(line)) * kGoldenRatio >>
+               (64 - kGuessBits);
+    }
 
     struct SpareNodes {
         std::array<MemoryMap::node_type, 64> maNodes;  // the first mnCount of them hold a node
@@ -83,7 +94,7 @@ private:
     };
 
     static inline SpareNodes* mpoSpareNodes = nullptr;  // made with the tables
-    static inline std::array<FileMap::value_type*, 1U << kRecentSiteBits> maRecentSites{};
+    static inline std::array<std::size_t, 1U << kGuessBits> maSiteBuckets{};
 };
 
 }  // namespace
@@ -119,13 +130,12 @@ void HMemory::Push() {
     Reset();
 }
 
-// The saved tables go right after, so they are handed over rather than copied; this needs no memory and so
-// can't stop halfway.
+// The saved state is removed afterwards, so its tables are moved and not copied. This needs no memory and so can't
+// stop halfway.
 void HMemory::Pop() {
     const HMutexLock lock(&moMutex);
     if (mpoFileMap == nullptr || mpoMemoryStack->empty()) return;
     MemoryState& saved = mpoMemoryStack->back();
-    Tracker::ForgetSites();
     *mpoFileMap = std::move(saved.moFileMap);
     *mpoMemoryMap = std::move(saved.moMemoryMap);
     mnTotalMemory = saved.mnSavedTotal;
@@ -145,7 +155,6 @@ void HMemory::Reset() {
 void HMemory::UsageReset() {
     const HMutexLock lock(&moMutex);
     if (mpoFileMap == nullptr) return;
-    Tracker::ForgetSites();
     mpoFileMap->clear();
 }
 
