@@ -1,10 +1,72 @@
-// Every process-wide object that needs a constructor at load, in one file: within a file the order of
-// construction is the order of definition, and destruction runs the other way. Callers in other libraries are
-// linked against this one, so the loader builds these objects before any code of theirs runs.
+// Every process-wide object that needs a constructor at load, in one file: within a file the order of construction is
+// the order of definition. Callers in other libraries are linked against this one, so the loader builds these objects
+// before any code of theirs runs.
+//
+// None of them is ever destroyed: detached threads and destructors of other static objects may call the library while
+// the process exits, and the library is never unloaded.
+#include <algorithm>
+#include <array>
+#include <new>
+
+#include "diskio/ledger.h"
 #include "environment/message_catalogue.h"
+#include "locks/lasting_mutex.h"
+#include "platform/fork.h"
 #include "text/name_ring.h"
+#include "timing/row_table.h"
 #include "zanbase/memory.h"
 
+namespace {
+
+struct TrackerAccess : HMemory {
+    using HMemory::moMutex;
+};
+
+// Constructs the object in static storage, which outlives every static object.
+template <class T, int number = 0>
+T& BuildForever() {
+    alignas(T) static unsigned char storage[sizeof(T)];
+    return *new (storage) T;
+}
+
+}  // namespace
+
+const HMutex* const gpoLastingMutex = &TrackerAccess::moMutex;
 HMutex HMemory::moMutex;
-MessageCatalogue goMessageCatalogue;
-NameRing goNameRing;
+HMutex& goDiskIOMutex = BuildForever<HMutex, 0>();
+HMutex& goTimerGrowthMutex = BuildForever<HMutex, 1>();
+MessageCatalogue& goMessageCatalogue = BuildForever<MessageCatalogue>();
+NameRing& goNameRing = BuildForever<NameRing>();
+
+namespace {
+
+// A fork owns the mutex of every table, so that the child can use them all. Lock order: as listed; no other code owns
+// two of them.
+std::array<const HMutex*, 5> TableMutexes() {
+    return {&TrackerAccess::moMutex, &goDiskIOMutex, &goTimerGrowthMutex,
+            &goMessageCatalogue.moCatalogueMutex, &goNameRing.moRingMutex};
+}
+
+bool TryAcquireTables() {
+    const auto mutexes = TableMutexes();
+    const auto busy =
+        std::find_if(mutexes.begin(), mutexes.end(), [](const HMutex* m) { return !m->TryLock(); });
+    if (busy == mutexes.end()) return true;
+    std::for_each(mutexes.begin(), busy, [](const HMutex* mutex) { mutex->Unlock(); });
+    return false;
+}
+
+void AcquireTables() {
+    for (const HMutex* const mutex : TableMutexes()) mutex->Lock();
+}
+
+void ReleaseTables() {
+    for (const HMutex* const mutex : TableMutexes()) mutex->Unlock();
+}
+
+[[maybe_unused]] const bool gbForkHandled = [] {
+    HoldAroundFork(TryAcquireTables, AcquireTables, ReleaseTables);
+    return true;
+}();
+
+}  // namespace

@@ -2,100 +2,162 @@
 #include <gtest/gtest.h>
 
 #include <map>
-#include <thread>
 
 #include "support/failing_allocation.h"
-#include "support/written_text.h"
+#include "support/held_stream.h"
 #include "zanbase/memory_tables.h"
 #include "zanbase/string_makers.h"
 
 namespace {
 
-// In one array, so that the order of the pointers is known. The first and the third are the same text.
+// In one array, so that the order of the pointers is known. kTable and kTwin are the same text.
+enum File { kTable, kReader, kTwin, kDeep, kLong };
 const char kFiles[][60] = {"/project/src/core/table", "/project/src/io/reader", "/project/src/core/table",
                            "d/123456789/123456789/123456789/123456789/1234567",
                            "a_file_name_that_is_longer_than_all_of_the_column"};
+const char* const kNames[] = {"table", "reader", "twin"};
 char memory[600];  // the blocks
 
-void Add(int block, std::size_t n, int file, int line) {
-    HMemory::Alloc(memory + block, n, kFiles[file], line);
+void Add(int block, std::size_t size, File file, int line) {
+    HMemory::Alloc(memory + block, size, kFiles[file], line);
 }
-void Drop(int block) { HMemory::Free(&memory[block]); }
+void Drop(int block) { HMemory::Free(memory + block); }
+
+std::string SiteText(const char* file, int line) {
+    return MkString("%s:%d", kNames[(file - kFiles[0]) / static_cast<int>(sizeof kFiles[0])], line);
+}
 
 class Tracker : public HMemory, public testing::Test {
 public:
-    // Total/peak/saved states; blocks as number=size@site; sites as file.line+calls/bytes-calls/bytes.
-    static std::string State() {
-        if (mpoFileMap == nullptr && mpoMemoryMap == nullptr && mpoMemoryStack == nullptr) return "nothing";
-        std::string text = MkString("%zu/%zu/%zu", mnTotalMemory, mnPeekMemory, mpoMemoryStack->size());
-        for (const auto& [ptr, at] : std::map(mpoMemoryMap->begin(), mpoMemoryMap->end()))
-            text += MkString(" %td=%zu@%td.%d", static_cast<char*>(ptr) - memory, at.mnSize,
-                             (at.mpcFile - kFiles[0]) / 60, at.mnLine);
-        for (const auto& [site, use] : std::map(mpoFileMap->begin(), mpoFileMap->end()))
-            text += MkString(" %td.%d+%u/%zu-%u/%zu", (site.first - kFiles[0]) / 60, site.second,
-                             use.mnAllocCount, use.mnAllocated, use.mnFreeCount, use.mnFreed);
+    void TearDown() override {
+        while (mpoMemoryStack != nullptr && !mpoMemoryStack->empty()) Pop();
+        Reset();
+    }
+
+    static std::string Sums() { return MkString("total %zu peak %zu", mnTotalMemory, mnPeekMemory); }
+
+    static std::string Blocks() {
+        std::string text;
+        for (const auto& [ptr, block] : std::map(mpoMemoryMap->begin(), mpoMemoryMap->end()))
+            text += MkString("%d is %zu of %s; ", static_cast<int>(static_cast<char*>(ptr) - memory),
+                             block.mnSize, SiteText(block.mpcFile, block.mnLine).c_str());
+        return text;
+    }
+
+    static std::string Usage() {
+        std::string text;
+        for (const auto& [site, usage] : std::map(mpoFileMap->begin(), mpoFileMap->end()))
+            text += MkString("%s +%zu in %u -%zu in %u; ", SiteText(site.first, site.second).c_str(),
+                             usage.mnAllocated, usage.mnAllocCount, usage.mnFreed, usage.mnFreeCount);
         return text;
     }
 
     static std::string Reports() { return WrittenBy(LeakReport) + WrittenBy(UsageReport); }
 };
 
-TEST_F(Tracker, LeavesItsTablesAsTold) {
-    Drop(0), Pop(), Reset(), UsageReset(), Push();
-    EXPECT_EQ(State() + Reports(), "nothing");
-    const std::pair<void (*)(), const char*> cases[] = {
-        {[] { Add(1, 10, 0, 1), Pop(); }, "10/10/0 1=10@0.1 0.1+1/10-0/0"},  // the push above saved nothing
-        {[] { Add(0, 10, 0, 1), Add(2, 20, 0, 2), Drop(0), Drop(0), Add(3, 0, 2, 1); },
-         "20/30/0 2=20@0.2 3=0@2.1 0.1+1/10-1/10 0.2+1/20-0/0 2.1+1/0-0/0"},
-        {[] { Add(1, 10, 0, 1), Add(1, 30, 1, 2), Drop(1); }, "30/40/0 0.1+1/10-1/10 1.2+1/30-0/0"},
-        {[] { Add(1, 10, 0, 1), UsageReset(), Drop(1); }, "0/10/0 0.1+0/0-1/10"},
-        {[] { Add(1, 10, 0, 1), Push(), Add(1, 99, 0, 1), Reset(), Add(2, 9, 0, 1), Pop(), Add(3, 1, 0, 1); },
-         "11/11/0 1=10@0.1 3=1@0.1 0.1+2/11-0/0"},
-        {[] { Push(), Add(1, 10, 0, 1), Push(), Push(), Pop(), Pop(), Drop(1); }, "0/10/1 0.1+1/10-1/10"}};
-    for (const auto& [run, state] : cases) {
-        run();
-        EXPECT_EQ(State(), state);
-        Pop(), Reset();
-        EXPECT_EQ(State() + Reports(), "0/0/0");
-    }
+TEST_F(Tracker, DoesNothingBeforeTheFirstAlloc) {
+    Drop(0);
+    Pop();
+    Reset();
+    UsageReset();
+    Push();
+    EXPECT_EQ(Reports(), "");
+    EXPECT_EQ(mpoFileMap, nullptr);
+    Add(1, 10, kTable, 1);
+    Pop();  // the Push above saved nothing
+    EXPECT_EQ(Blocks(), "1 is 10 of table:1; ");
 }
 
-// In the second round the nodes of freed blocks serve again: only the growth of the table can fail.
+TEST_F(Tracker, TellsSitesApartByPointerAndLine) {
+    Add(1, 10, kTable, 1);
+    Add(2, 0, kTwin, 1);
+    Add(3, 20, kTable, 2);
+    Drop(1);
+    Drop(1);
+    EXPECT_EQ(Sums(), "total 20 peak 30");
+    EXPECT_EQ(Blocks(), "2 is 0 of twin:1; 3 is 20 of table:2; ");
+    EXPECT_EQ(Usage(), "table:1 +10 in 1 -10 in 1; table:2 +20 in 1 -0 in 0; twin:1 +0 in 1 -0 in 0; ");
+}
+
+TEST_F(Tracker, KeepsTheFirstRecordOfABlock) {
+    Add(1, 10, kTable, 1);
+    Add(1, 30, kReader, 2);
+    Drop(1);
+    EXPECT_EQ(Sums(), "total 30 peak 40");
+    EXPECT_EQ(Usage(), "table:1 +10 in 1 -10 in 1; reader:2 +30 in 1 -0 in 0; ");
+    UsageReset();
+    Reset();
+    EXPECT_EQ(Reports(), "");
+}
+
+TEST_F(Tracker, RestoresWhatWasPushed) {
+    Add(1, 10, kTable, 1);
+    Push();
+    Add(1, 99, kTable, 1);
+    Push();
+    Reset();
+    Pop();
+    Pop();
+    Add(3, 1, kTable, 1);
+    EXPECT_EQ(Sums(), "total 11 peak 11");
+    EXPECT_EQ(Blocks(), "1 is 10 of table:1; 3 is 1 of table:1; ");
+    EXPECT_EQ(Usage(), "table:1 +11 in 2 -0 in 0; ");
+}
+
+TEST_F(Tracker, FollowsADerivedClassThatChangesTheUsageTable) {
+    Add(1, 10, kTable, 1);
+    mpoFileMap->erase({kFiles[kTable], 1});
+    Drop(1);
+    EXPECT_EQ(Usage(), "table:1 +0 in 0 -10 in 1; ");
+    FileMap().swap(*mpoFileMap);
+    Add(1, 5, kTable, 1);
+    EXPECT_EQ(Usage(), "table:1 +5 in 1 -0 in 0; ");
+}
+
+// In the second round the nodes of freed blocks are used again: only the growth of the table can fail.
 TEST_F(Tracker, StaysSoundWhenItsMemoryRunsOut) {
     int blocks = 0;
-    const auto check = [&] {
-        const std::size_t count = blocks == 0 ? 0 : mpoMemoryMap->size();
-        EXPECT_EQ(MkString("%d %d", blocks, blocks), MkString("%zu %zu", count, mnTotalMemory));
-    };
-    for (int round = 0; round < 2; ++round, Reset()) {
-        for (blocks = 0; blocks < 60; ++blocks) FailAtEachNew([&] { Add(blocks, 1, 0, blocks); }, check);
+    const auto check = [&] { EXPECT_EQ(mnTotalMemory, blocks); };
+    for (int round = 0; round < 2; ++round) {
+        for (blocks = 0; blocks < 60; ++blocks) FailAtEachNew([&] { Add(blocks, 1, kTable, blocks); }, check);
         FailAtEachNew(Push, check);
         Pop();
-        for (check(); blocks > 0;) Drop(--blocks);
+        EXPECT_EQ(mpoMemoryMap->size(), 60);
+        while (blocks > 0) Drop(--blocks);
     }
 }
 
-// In bursts past what is kept of nodes and sites, with reports in between.
+// In bursts that use up the spare nodes and the remembered sites, with reports in between.
 TEST_F(Tracker, CountsWhatManyThreadsRecord) {
     const auto record = [](int first) {
         for (int round = 0; round < 20; ++round) {
-            for (int i = 0; i < 300; ++i) Add(first + i, 2, 0, i);
+            for (int i = 0; i < 300; ++i) Add(first + i, 2, kTable, i);
             EXPECT_NE(Reports(), "");
-            for (int i = round / 19; i < 300; ++i) Drop(first + i);
+            for (int i = 0; i < 300; ++i) Drop(first + i);
         }
     };
     std::thread other(record, 300);
     record(0);
     other.join();
-    EXPECT_NE(State().find(" 0=2@0.0 300=2@0.0 0.0+40/80-38/76 0.1+40/80-40/80 "), std::string::npos);
+    EXPECT_EQ(Blocks(), "");
+    for (int i = 0; i < 300; ++i) EXPECT_EQ(mpoFileMap->at({kFiles[kTable], i}).mnFreed, 80);
 }
 
-// Leaks by size, then by file pointer, then by line, which is signed; usage from 1229 bytes, a share of the
-// sum.
-TEST_F(Tracker, Reports) {
-    Reset(), Add(1, 1024, 4, 2), Add(2, 1024, 3, 123456789), Add(3, 1024, 0, 2), Add(4, 1024, 0, -3);
-    Add(5, 1229, 2, 2), Add(6, 1048576, 0, 57), Add(7, 89378, 1, 120), Add(8, 89378, 1, 120);
-    for (int i = 0; i < 1135; ++i) Add(9, 10000, 1, 120), Drop(9);
+TEST_F(Tracker, DoesNotHoldItsMutexWhileAReportWaitsForTheStream) {
+    Add(1, 10, kTable, 1);
+    EXPECT_NE(WrittenAfter([] { Add(2, 77, kTable, 1); }, LeakReport), "");
+    EXPECT_NE(WrittenAfter([] { Add(3, 77, kTable, 1); }, UsageReport), "");
+}
+
+// Ordered by size, then by file pointer, then by line, which is signed.
+TEST_F(Tracker, PrintsLeaks) {
+    Add(1, 1024, kLong, 2);
+    Add(2, 1024, kDeep, 123456789);
+    Add(3, 1024, kTable, 2);
+    Add(4, 1024, kTable, -3);
+    Add(5, 1048576, kTable, 57);
+    Add(6, 89378, kReader, 120);
+    Add(7, 89378, kReader, 120);
     EXPECT_EQ(WrittenBy(LeakReport), R"(Memory Leak Report:
  ______________________________________________________________________________ 
 |          |        |        |                                                 |
@@ -106,21 +168,31 @@ TEST_F(Tracker, Reports) {
 |     1024 |      1 |      2 | src/core/table                                  |
 |     1024 |      1 |123456789 | 123456789/123456789/123456789/123456789/1234567 |
 |     1024 |      1 |      2 | a_file_name_that_is_longer_than_all_of_the_column |
-|    1.20K |      1 |      2 | src/core/table                                  |
 |  174.57K |      2 |    120 | src/io/reader                                   |
 | 1024.00K |      1 |     57 | src/core/table                                  |
 |          |        |        |                                                 |
-|    1.18M |      8 |        |                                                 |
+|    1.17M |      7 |        |                                                 |
 |__________|________|________|_________________________________________________|
 
 )");
+}
+
+// 12,000 K in all: sites below 1,200 bytes are summed up.
+TEST_F(Tracker, PrintsUsage) {
+    Add(1, 1199, kTable, 1);
+    Add(2, 1200, kTable, 2);
+    Add(3, 1048576, kTable, 57);
+    for (int i = 0; i < 1124; ++i) {
+        Add(9, 10000, kReader, 120);
+        Drop(9);
+    }
     EXPECT_EQ(WrittenBy(UsageReport),
               "Memory Usage Report By File:\n\n"
-              "File: src/core/table, Line: 2\nAllocated (1): 1.20K\nFreed     (0):     0\n\n"
+              "File: src/core/table, Line: 2\nAllocated (1): 1.17K\nFreed     (0):     0\n\n"
               "File: src/core/table, Line: 57\nAllocated (1): 1024.00K\nFreed     (0):        0\n\n"
-              "File: src/io/reader, Line: 120\nAllocated (1137): 10.99M\nFreed     (1135): 10.82M\n\n"
-              "Total Below Threshold: 4.00K\n\n"
-              "Total Allocated:   12.00M\nTotal Freed:       10.82M\n\nPeek Allocated:     1.19M\n\n");
+              "File: src/io/reader, Line: 120\nAllocated (1124): 10.72M\nFreed     (1124): 10.72M\n\n"
+              "Total Below Threshold: 1.17K\n\n"
+              "Total Allocated:   11.72M\nTotal Freed:       10.72M\n\nPeek Allocated:     1.01M\n\n");
 }
 
 }  // namespace

@@ -1,4 +1,4 @@
-// Recording and queries of the disk ledger; ledger.h tells its invariants.
+// Recording and queries of the disk ledger. Its invariants are in ledger.h.
 #include "zanbase/disk_io.h"
 
 #include <memory>
@@ -6,85 +6,74 @@
 
 #include "diskio/ledger.h"
 
-std::atomic<const HMutex*> mpoDiskIOMutex{nullptr};
-DiskIOFileMap* mpoDiskIOFileMap = nullptr;
-DiskIOHandleMap* mpoDiskIOHandleMap = nullptr;
-std::list<DiskIOState>* mpoDiskIOStack = nullptr;
+DiskIOFileMap* gpoDiskIOFileMap = nullptr;
+DiskIOHandleMap* gpoDiskIOHandleMap = nullptr;
+std::list<DiskIOState>* gpoDiskIOStack = nullptr;
 
 namespace {
 
-// The entry of the handle that was used last: most often the next operation is on the same file. Guarded by
-// the ledger's mutex, and forgotten whenever the entries leave.
-DiskIOHandleMap::value_type* gpoLastEntry = nullptr;
-
-// The initialisation of a local static lets one thread in and makes others wait. If memory runs out it leaves
-// nothing behind, and the next call tries again.
-const HMutex* MakeLedger() {
-    static const HMutex* const ledger_mutex = [] {
-        auto mutex = std::make_unique<HMutex>();
-        auto file_map = std::make_unique<DiskIOFileMap>();
-        auto handle_map = std::make_unique<DiskIOHandleMap>();
-        auto stack = std::make_unique<std::list<DiskIOState>>();
-        mpoDiskIOFileMap = file_map.release();
-        mpoDiskIOHandleMap = handle_map.release();
-        mpoDiskIOStack = stack.release();
-        mpoDiskIOMutex.store(mutex.get(), std::memory_order_release);
-        return mutex.release();
-    }();
-    return ledger_mutex;
+// If memory runs out, no table exists and the next call tries again.
+void MakeTables() {
+    auto file_map = std::make_unique<DiskIOFileMap>();
+    auto handle_map = std::make_unique<DiskIOHandleMap>();
+    gpoDiskIOStack = new std::list<DiskIOState>;
+    gpoDiskIOFileMap = file_map.release();
+    gpoDiskIOHandleMap = handle_map.release();
 }
 
-// The mutex of the ledger, which is made if it is not there.
-const HMutex* LedgerMutex() {
-    const HMutex* const mutex = LedgerMutexIfMade();
-    return mutex != nullptr ? mutex : MakeLedger();
-}
+// Holds the ledger's mutex for a scope, in which the tables exist.
+class LedgerLock {
+public:
+    LedgerLock() : moLock(&goDiskIOMutex) {
+        if (gpoDiskIOFileMap == nullptr) MakeTables();
+    }
 
-// The next three are called with the mutex held.
+private:
+    const HMutexLock moLock;
+};
+
+// The next three require that goDiskIOMutex is held and the tables exist.
 
 DiskIOUsage* FindUsage(const std::string& name) {
-    const auto file = mpoDiskIOFileMap->find(name);
-    return file != mpoDiskIOFileMap->end() ? &file->second : nullptr;
+    const auto file = gpoDiskIOFileMap->find(name);
+    return file != gpoDiskIOFileMap->end() ? &file->second : nullptr;
 }
 
 // The record that an operation on `handle` is credited to, or null.
 DiskIOUsage* UsageOf(void* handle) {
-    if (gpoLastEntry == nullptr || gpoLastEntry->first != handle) {
-        const auto entry = mpoDiskIOHandleMap->find(handle);
-        if (entry == mpoDiskIOHandleMap->end()) return FindUsage({});
-        gpoLastEntry = &*entry;
-    }
-    DiskIOBinding& binding = gpoLastEntry->second;
+    const auto entry = gpoDiskIOHandleMap->find(handle);
+    if (entry == gpoDiskIOHandleMap->end()) return FindUsage({});
+    DiskIOBinding& binding = entry->second;
     if (binding.mpoUsage == nullptr) binding.mpoUsage = FindUsage(binding.moName);
     return binding.mpoUsage;
 }
 
-// Copies the name first, so that a lack of memory leaves the handle as it was.
+// The name is copied before the call, so that a lack of memory leaves the handle as it was.
 DiskIOBinding& Bind(void* handle, std::string name) {
-    DiskIOBinding& binding = (*mpoDiskIOHandleMap)[handle];
+    DiskIOBinding& binding = (*gpoDiskIOHandleMap)[handle];
     binding.moName = std::move(name);
     binding.mpoUsage = nullptr;
     return binding;
 }
 
 template <class Value>
-void Tell(Value* where, Value value) {
+void StoreIfWanted(Value* where, Value value) {
     if (where != nullptr) *where = value;
 }
 
 }  // namespace
 
 void HDiskIOOpen(const std::string& name, void* handle, double seconds) {
-    const HMutexLock lock(LedgerMutex());
+    const LedgerLock lock;
     DiskIOBinding& binding = Bind(handle, name);
-    DiskIOUsage& usage = (*mpoDiskIOFileMap)[name];
+    DiskIOUsage& usage = (*gpoDiskIOFileMap)[name];
     binding.mpoUsage = &usage;
     usage.mdOpenTime += seconds;
     ++usage.mnOpenCount;
 }
 
 void HDiskIOClose(void* handle, double seconds) {
-    const HMutexLock lock(LedgerMutex());
+    const LedgerLock lock;
     if (DiskIOUsage* const usage = UsageOf(handle)) {
         usage->mdCloseTime += seconds;
         ++usage->mnCloseCount;
@@ -92,7 +81,7 @@ void HDiskIOClose(void* handle, double seconds) {
 }
 
 void HDiskIOSeek(void* handle, double seconds) {
-    const HMutexLock lock(LedgerMutex());
+    const LedgerLock lock;
     if (DiskIOUsage* const usage = UsageOf(handle)) {
         usage->mdSeekTime += seconds;
         ++usage->mnSeekCount;
@@ -100,7 +89,7 @@ void HDiskIOSeek(void* handle, double seconds) {
 }
 
 void HDiskIORead(void* handle, unsigned long long bytes, double seconds) {
-    const HMutexLock lock(LedgerMutex());
+    const LedgerLock lock;
     if (DiskIOUsage* const usage = UsageOf(handle)) {
         usage->mdReadTime += seconds;
         ++usage->mnReadCount;
@@ -109,7 +98,7 @@ void HDiskIORead(void* handle, unsigned long long bytes, double seconds) {
 }
 
 void HDiskIOWrite(void* handle, unsigned long long bytes, double seconds) {
-    const HMutexLock lock(LedgerMutex());
+    const LedgerLock lock;
     if (DiskIOUsage* const usage = UsageOf(handle)) {
         usage->mdWriteTime += seconds;
         ++usage->mnWriteCount;
@@ -118,55 +107,53 @@ void HDiskIOWrite(void* handle, unsigned long long bytes, double seconds) {
 }
 
 void _HDiskIOMapFD(const std::string& name, void* handle) {
-    const HMutexLock lock(LedgerMutex());
+    const LedgerLock lock;
     Bind(handle, name);
 }
 
 std::string HDiskIOGetFilename(void* handle) {
-    const HMutexLock lock(LedgerMutex());
-    const auto entry = mpoDiskIOHandleMap->find(handle);
-    return entry != mpoDiskIOHandleMap->end() ? entry->second.moName : std::string();
+    const LedgerLock lock;
+    const auto entry = gpoDiskIOHandleMap->find(handle);
+    return entry != gpoDiskIOHandleMap->end() ? entry->second.moName : std::string();
 }
 
 // NOLINTNEXTLINE(performance-unnecessary-value-param): by value in the published form
 bool HDiskIOAccessFileData(std::string name, double* readTime, unsigned int* readCount,
                            unsigned long long* readSize, double* writeTime, unsigned int* writeCount,
                            unsigned long long* writeSize) {
-    const HMutexLock lock(LedgerMutexIfMade());
-    if (lock.GetMutex() == nullptr) return false;
+    const HMutexLock lock(&goDiskIOMutex);
+    if (gpoDiskIOFileMap == nullptr) return false;
     const DiskIOUsage* const usage = FindUsage(name);
     if (usage == nullptr) return false;
-    Tell(readTime, usage->mdReadTime);
-    Tell(readCount, usage->mnReadCount);
-    Tell(readSize, usage->mnReadSize);
-    Tell(writeTime, usage->mdWriteTime);
-    Tell(writeCount, usage->mnWriteCount);
-    Tell(writeSize, usage->mnWriteSize);
+    StoreIfWanted(readTime, usage->mdReadTime);
+    StoreIfWanted(readCount, usage->mnReadCount);
+    StoreIfWanted(readSize, usage->mnReadSize);
+    StoreIfWanted(writeTime, usage->mdWriteTime);
+    StoreIfWanted(writeCount, usage->mnWriteCount);
+    StoreIfWanted(writeSize, usage->mnWriteSize);
     return true;
 }
 
 void HDiskIOPush() {
     {
-        const HMutexLock lock(LedgerMutex());
-        mpoDiskIOStack->push_back({*mpoDiskIOFileMap, *mpoDiskIOHandleMap});
+        const LedgerLock lock;
+        gpoDiskIOStack->push_back({*gpoDiskIOFileMap, *gpoDiskIOHandleMap});
     }
     HDiskIOReset();
 }
 
-// The saved tables go right after, so they are handed over rather than copied; this needs no memory.
+// The saved state is removed afterwards, so its tables are moved and not copied. This needs no memory.
 void HDiskIOPop() {
-    const HMutexLock lock(LedgerMutex());
-    if (mpoDiskIOStack->empty()) return;
-    DiskIOState& saved = mpoDiskIOStack->back();
-    gpoLastEntry = nullptr;
-    *mpoDiskIOFileMap = std::move(saved.moFileMap);
-    *mpoDiskIOHandleMap = std::move(saved.moHandleMap);
-    mpoDiskIOStack->pop_back();
+    const LedgerLock lock;
+    if (gpoDiskIOStack->empty()) return;
+    DiskIOState& saved = gpoDiskIOStack->back();
+    *gpoDiskIOFileMap = std::move(saved.moFileMap);
+    *gpoDiskIOHandleMap = std::move(saved.moHandleMap);
+    gpoDiskIOStack->pop_back();
 }
 
 void HDiskIOReset() {
-    const HMutexLock lock(LedgerMutex());
-    gpoLastEntry = nullptr;
-    mpoDiskIOFileMap->clear();
-    mpoDiskIOHandleMap->clear();
+    const LedgerLock lock;
+    gpoDiskIOFileMap->clear();
+    gpoDiskIOHandleMap->clear();
 }

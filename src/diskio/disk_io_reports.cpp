@@ -6,6 +6,7 @@
 #include <map>
 
 #include "memory/report_text.h"
+#include "platform/stream.h"
 #include "zanbase/disk_io.h"
 #include "zanbase/string_makers.h"
 
@@ -33,7 +34,7 @@ DiskIOUsage SumOf(const DiskIOFileMap& files) {
     return sum;
 }
 
-// A figure stands one blank from the rule on its right; a cell without one is blank.
+// A figure has one blank between itself and the rule on its right. A cell without a figure is blank.
 std::string Cell(const std::string& text, unsigned int width) {
     return FitField(text.empty() ? text : text + " ", width, true);
 }
@@ -101,28 +102,31 @@ std::string DiskIOSummaryText(const DiskIOFileMap& files) {
            "\n";
 }
 
-// In each report the ledger is looked at under its mutex only: another thread may be filling or emptying it.
+// Each report owns the lock of its stream and then the ledger's mutex until it is written.
 
 bool HDiskIOReportFile(std::FILE* stream, const std::string& name) {
-    const HMutexLock lock(LedgerMutexIfMade());
-    if (lock.GetMutex() == nullptr) return false;
-    const auto file = mpoDiskIOFileMap->find(name);
-    if (file == mpoDiskIOFileMap->end()) return false;
+    const StreamLock stream_lock(stream);
+    const HMutexLock lock(&goDiskIOMutex);
+    if (gpoDiskIOFileMap == nullptr) return false;
+    const auto file = gpoDiskIOFileMap->find(name);
+    if (file == gpoDiskIOFileMap->end()) return false;
     WriteText(stream, DiskIOFileText(name, file->second));
     return true;
 }
 
 void HDiskIOSummaryReport(std::FILE* stream) {
-    const HMutexLock lock(LedgerMutexIfMade());
-    if (lock.GetMutex() == nullptr || mpoDiskIOFileMap->empty()) return;
-    WriteText(stream, DiskIOSummaryText(*mpoDiskIOFileMap));
+    const StreamLock stream_lock(stream);
+    const HMutexLock lock(&goDiskIOMutex);
+    if (gpoDiskIOFileMap == nullptr || gpoDiskIOFileMap->empty()) return;
+    WriteText(stream, DiskIOSummaryText(*gpoDiskIOFileMap));
 }
 
 void HDiskIOUsageReport(std::FILE* stream) {
-    const HMutexLock lock(LedgerMutexIfMade());
-    if (lock.GetMutex() == nullptr || mpoDiskIOFileMap->empty()) return;
+    const StreamLock stream_lock(stream);
+    const HMutexLock lock(&goDiskIOMutex);
+    if (gpoDiskIOFileMap == nullptr || gpoDiskIOFileMap->empty()) return;
     std::multimap<unsigned long long, const std::string*> by_size;
-    for (const auto& [name, usage] : *mpoDiskIOFileMap) {
+    for (const auto& [name, usage] : *gpoDiskIOFileMap) {
         const unsigned long long moved = usage.mnReadSize + usage.mnWriteSize;
         if (moved != 0) by_size.emplace(moved, &name);
     }

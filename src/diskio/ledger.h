@@ -1,13 +1,13 @@
 // The tables of the disk ledger. Invariants, whenever its mutex is free:
 //
-// - A binding's record is that of its name, or null if that was not looked for or not there. So a record
-//   found by the name of a binding is entered there, and never looked up by that binding again.
-// - Records and bindings leave together, and never singly: no binding outlives its record.
+// - All three tables exist, or none.
+// - The record of a binding is the one of its name, or null if the name has none or was not looked up yet.
+// - All records and all bindings are removed together. Neither is removed singly, so no binding has a pointer to
+//   a removed record.
 // - A saved state shares nothing with the live tables.
 #ifndef ZANBASE_DISKIO_LEDGER_H
 #define ZANBASE_DISKIO_LEDGER_H
 
-#include <atomic>
 #include <functional>
 #include <list>
 #include <map>
@@ -17,7 +17,7 @@
 
 #include "zanbase/mutex.h"
 
-// What was done with one file; times in seconds, sizes in bytes.
+// What was done with one file: times in seconds, sizes in bytes.
 struct DiskIOUsage {
     double mdOpenTime = 0;
     unsigned int mnOpenCount = 0;
@@ -33,7 +33,7 @@ struct DiskIOUsage {
     unsigned long long mnWriteSize = 0;
 };
 
-// What a handle stands for. A copy belongs to other tables, so it starts without the record.
+// What a handle is bound to. A copy is for other tables, so it starts without the record.
 struct DiskIOBinding {
     DiskIOBinding() = default;
     DiskIOBinding(const DiskIOBinding& other) : moName(other.moName) {}
@@ -44,11 +44,10 @@ struct DiskIOBinding {
     DiskIOUsage* mpoUsage = nullptr;  // not owned: an element of the file table
 };
 
-// Names compare byte by byte as unsigned bytes, and a name comes before its continuations. Elements stay
-// where they are as long as they live.
+// Ordered by unsigned bytes; a name comes before its continuations. An element never moves.
 using DiskIOFileMap = std::map<std::string, DiskIOUsage>;
 
-// Nothing walks over the handles, so they need no order.
+// Hashed: no code iterates over the handles, so their order is not needed.
 using DiskIOHandleMap = boost::unordered::unordered_map<void*, DiskIOBinding>;
 
 struct DiskIOState {
@@ -56,14 +55,11 @@ struct DiskIOState {
     DiskIOHandleMap moHandleMap;
 };
 
-// The four are made together at the first recording and never destroyed. The mutex is published last: who
-// sees it sees the tables too.
-extern std::atomic<const HMutex*> mpoDiskIOMutex;
-extern DiskIOFileMap* mpoDiskIOFileMap;  // guarded by *mpoDiskIOMutex, as are the next two
-extern DiskIOHandleMap* mpoDiskIOHandleMap;
-extern std::list<DiskIOState>* mpoDiskIOStack;  // newest at the back
+extern HMutex& goDiskIOMutex;  // built in load_time.cpp, never destroyed
 
-// The mutex, or null as long as there is no ledger.
-inline const HMutex* LedgerMutexIfMade() { return mpoDiskIOMutex.load(std::memory_order_acquire); }
+// Null until the first recording, then never destroyed. Guarded by goDiskIOMutex.
+extern DiskIOFileMap* gpoDiskIOFileMap;
+extern DiskIOHandleMap* gpoDiskIOHandleMap;
+extern std::list<DiskIOState>* gpoDiskIOStack;  // newest at the back
 
 #endif

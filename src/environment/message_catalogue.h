@@ -23,7 +23,7 @@ struct MessageCatalogue {
     std::atomic<bool> mbIntlTest{false};
 };
 
-extern MessageCatalogue goMessageCatalogue;  // defined in load_time.cpp
+extern MessageCatalogue& goMessageCatalogue;  // built in load_time.cpp, never destroyed
 
 // `message`, "#", and `message` with one more % behind each % whose next character is neither a % nor white
 // space. Each % is judged by itself: of two in a row the second one counts like any other.

@@ -3,6 +3,7 @@
 
 #include <cstdlib>
 
+#include "locks/lasting_mutex.h"
 #include "platform/lock.h"
 #include "zanbase/allocation.h"
 
@@ -11,6 +12,7 @@ HMutex::HMutex() : mpoCriticalSection(static_cast<HNativeLock*>(HMalloc(sizeof(H
 }
 
 HMutex::~HMutex() {
+    if (this == gpoLastingMutex) return;
     DestroyLock(mpoCriticalSection);
     std::free(mpoCriticalSection);
 }

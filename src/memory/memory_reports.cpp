@@ -1,4 +1,6 @@
-// The two reports over the tracker's tables: texts first, then the order in which they are written.
+// The two reports over the tracker's tables: the texts of their pieces, then the order of the pieces.
+//
+// Each report owns the lock of its stream and then the tracker's mutex until it is written.
 #include <algorithm>
 #include <cstdint>
 #include <map>
@@ -6,6 +8,7 @@
 #include <utility>
 
 #include "memory/report_text.h"
+#include "platform/stream.h"
 #include "zanbase/memory_tables.h"
 #include "zanbase/string_makers.h"
 
@@ -27,7 +30,7 @@ struct LeakGroup {
     int line = 0;
 };
 
-// A cell of the table with the rule on its right: `text` one blank from that rule.
+// A cell of the table: `text` right-aligned, one blank, the rule.
 std::string Cell(const std::string& text, unsigned int width) {
     return FitField(text + " ", width, true) + "|";
 }
@@ -36,7 +39,7 @@ std::string LeakCells(std::size_t size, int blocks) {
     return "|" + Cell(SizeText(size), 10) + Cell(MkString("%d", blocks), 8);
 }
 
-// The leading directories of a long path go first; a file name that is too long itself stays whole.
+// Drops leading directories until the path fits. A file name that is too long itself stays whole.
 std::string LeakPath(const char* file, std::size_t width) {
     std::string path = ShortSourcePath(file);
     for (std::size_t slash; path.size() > width && (slash = path.find('/')) != std::string::npos;)
@@ -64,8 +67,7 @@ struct UsageTotals {
 
 double Kilobytes(std::size_t bytes) { return static_cast<double>(bytes) / 1024; }
 
-// A tenth of the total's number of K is compared with numbers of bytes: the cut falls at 1/10240 of the
-// total.
+// The threshold mixes units: 10% of the total in KiB is compared with bytes, so the cut is total/10240.
 unsigned long long UsageThreshold(const UsageTotals& totals) {
     constexpr double kLargest = 18446744073709549568.0;  // the last double below 2^64
     return static_cast<unsigned long long>(std::min(totals.allocated * 0.1, kLargest));
@@ -78,7 +80,7 @@ std::string UsageFooter(const UsageTotals& totals, std::size_t peak) {
            "Peek Allocated:  " + FitField(SizeText(peak), 8, true) + "\n\n";
 }
 
-// Counts and sizes stand in two columns that are as wide as their longer text.
+// The counts form one column and the sizes another, each as wide as its longer text.
 template <class Usage>
 std::string UsageSection(const char* file, int line, const Usage& usage) {
     const std::string alloc_count = MkString("%d", static_cast<int>(usage.mnAllocCount));
@@ -96,6 +98,7 @@ std::string UsageSection(const char* file, int line, const Usage& usage) {
 }  // namespace
 
 void HMemory::LeakReport(std::FILE* stream) {
+    const StreamLock stream_lock(stream);
     const HMutexLock lock(&moMutex);
     if (mpoMemoryMap == nullptr || mpoMemoryMap->empty()) return;
 
@@ -119,6 +122,7 @@ void HMemory::LeakReport(std::FILE* stream) {
 }
 
 void HMemory::UsageReport(std::FILE* stream) {
+    const StreamLock stream_lock(stream);
     const HMutexLock lock(&moMutex);
     if (mpoFileMap == nullptr || mpoFileMap->empty()) return;
 

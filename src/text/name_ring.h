@@ -14,11 +14,12 @@ struct NameRing {
     // Takes the next slot: kTextBytes bytes.
     char* TakeSlot();
 
-    char maSlots[kSlots][kTextBytes];  // zero at load by being static: a page costs nothing until it is used
-    int mnLastSlot = -1;               // guarded by moRingMutex
+    char maSlots[kSlots]
+                [kTextBytes];  // in static storage, zero at load: a page costs nothing until it is used
+    int mnLastSlot = -1;       // guarded by moRingMutex
     HMutex moRingMutex;
 };
 
-extern NameRing goNameRing;  // built in load_time.cpp
+extern NameRing& goNameRing;  // built in load_time.cpp, never destroyed
 
 #endif

@@ -15,17 +15,10 @@
 
 #include "platform/clock.h"
 #include "timing/row_table.h"
-#include "zanbase/mutex.h"
 #include "zanbase/openmp.h"
 #include "zanbase/snapshot.h"
 
 namespace {
-
-// Held while rows are added in Toggle, and for nothing else.
-const HMutex& GrowthMutex() {
-    static const HMutex mutex;
-    return mutex;
-}
 
 // The value of GetMicroSeconds as a whole number, without the way through a double, which is exact for some
 // 285 years and makes a toggle a seventh slower. Differences are right modulo 2^64, also for a clock before
@@ -43,8 +36,7 @@ struct GlobalTimer::TimerSlot {
 };
 
 struct GlobalTimer::Impl {
-    // The growth mutex is made here, before the instance is, so that it is there as long as the timers are.
-    Impl() : moRows(static_cast<std::size_t>(OMPGetMaxThreads())) { GrowthMutex(); }
+    Impl() : moRows(static_cast<std::size_t>(OMPGetMaxThreads())) {}
 
     // At exit nobody is left to be told that the report could not be made.
     ~Impl() {
@@ -101,7 +93,7 @@ void GlobalTimer::Toggle(unsigned long long id) {
     RowTable<TimerSlot>& rows = mpoImpl->moRows;
     const auto thread = static_cast<std::size_t>(OMPGetThreadNum());
     if (thread >= rows.Rows().size()) {
-        const HMutexLock lock(&GrowthMutex());
+        const HMutexLock lock(&goTimerGrowthMutex);
         rows.GrowTo(thread + 1);
     }
     const unsigned long long now = ReadClock();

@@ -18,6 +18,11 @@
 #include <new>
 #include <vector>
 
+#include "zanbase/mutex.h"
+
+// Held while Toggle adds rows, and for nothing else.
+extern HMutex& goTimerGrowthMutex;  // built in load_time.cpp, never destroyed
+
 // Gives out whole pairs of cache lines.
 template <class T>
 struct LinePairs {

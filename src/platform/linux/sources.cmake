@@ -3,6 +3,7 @@ set(ZANBASE_PLATFORM_SOURCES
     clock.cpp
     condition.cpp
     console.cpp
+    fork.cpp
     futex.cpp
     guard.cpp
     lock.cpp
@@ -10,6 +11,7 @@ set(ZANBASE_PLATFORM_SOURCES
     processors.cpp
     semaphore.cpp
     standard_stream.cpp
+    stream.cpp
     terminal_window.cpp
     thread.cpp
     thread_block.cpp

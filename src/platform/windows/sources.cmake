@@ -3,11 +3,13 @@ set(ZANBASE_PLATFORM_SOURCES
     clock.cpp
     condition.cpp
     console.cpp
+    fork.cpp
     guard.cpp
     lock.cpp
     messages.cpp
     processors.cpp
     semaphore.cpp
+    stream.cpp
     thread.cpp)
 
 find_package(Intl REQUIRED)
