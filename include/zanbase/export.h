@@ -1,5 +1,5 @@
 /// @file
-/// Macros that every public header uses: what is exported, and what the compiler checks of a caller.
+/// Macros of every public header: which symbols are exported, and what the compiler checks at a call.
 /// This header and the platform layer are the only places that may test for a compiler or a system.
 #ifndef ZANBASE_EXPORT_H
 #define ZANBASE_EXPORT_H

@@ -1,6 +1,29 @@
 /// @file
 /// Scopes that change a setting of the OpenMP runtime for a block, the library's own thread limit, and the
-/// counts of the machine's processors.
+/// processor counts of the machine.
+///
+///     {
+///         OMPThreadCount scope(4);  // parallel regions that start here have 4 threads, if the limit allows
+///         …
+///     }
+///
+/// One rule holds for the three scope classes. The constructor records the current setting and the requested
+/// one; if they differ and no parallel region is active, it sets the requested one. The destructor compares
+/// the two recorded values, not the live setting; if they differ and no parallel region is active, it sets the
+/// previous value again. A region is active if its team has more than one thread: a scope inside an active
+/// region changes nothing, a scope inside a region of one thread works as outside.
+///
+/// Copies and assignments copy the recorded values, so the destructor of a copy restores the same setting.
+///
+/// Thread-safety: the settings belong to the calling thread inside the runtime. Scopes on different threads
+/// are independent; one scope object belongs to one thread. Requires: a scope ends on the thread that started
+/// it, and scopes end in reverse order. The functions are thread-safe, inside parallel regions too.
+///
+/// Not for the threads of a single region: its `num_threads` clause does that.
+///
+/// A process may have a second OpenMP runtime, if another library was built by another compiler. The scopes
+/// and functions here speak to the runtime that the library was built with, and don't see the teams of another
+/// one: `OMPGetThreadNum` returns 0 in every member of such a team.
 #ifndef ZANBASE_OPENMP_H
 #define ZANBASE_OPENMP_H
 
@@ -8,31 +31,17 @@
 
 #include "zanbase/export.h"
 
-// One rule holds for the three scope classes. The constructor notes the setting in force and the one asked
-// for; if they differ and no parallel region is active, it sets the one asked for. The destructor compares
-// the same two notes, not the live setting; if they differ and no parallel region is active, it sets the
-// noted one back. So a scope inside a parallel region changes nothing, at either end.
-//
-//     { OMPThreadCount scope(4);  /* parallel regions begun here have 4 threads, if the limit allows */ }
-//
-// The settings are the runtime's and belong to the calling thread there; a scope must end on the thread that
-// began it. Scopes end in reverse order of their beginning. To set the threads of a single region, its
-// `num_threads` clause is enough and no scope is needed. Copying and assigning hand on the notes, so the
-// destructor sets back what that of the source would; of these only an assignment to an `OMPNested` may call
-// the runtime, as told there.
-
-/// Sets the runtime's dynamic adjustment of team sizes for a scope. Not for use inside a parallel region,
-/// where it has no effect.
+/// Sets the runtime's dynamic adjustment of team sizes for a block. One object belongs to one thread.
 class ZANBASE_API OMPDynamic {
 public:
-    /// Asks for dynamic adjustment, or with false for none.
+    /// Requests dynamic adjustment, or with false none.
     OMPDynamic(bool enable);
     ~OMPDynamic();
 
-    /// Copies the notes of the other scope.
+    /// Copies the recorded values; calls nothing in the runtime.
     OMPDynamic(const OMPDynamic&) = default;
 
-    /// Takes over the notes of the other scope.
+    /// Copies the recorded values; calls nothing in the runtime.
     OMPDynamic& operator=(const OMPDynamic&);
 
 private:
@@ -40,18 +49,17 @@ private:
     bool mbPrevious;
 };
 
-/// Sets the number of threads of coming parallel regions for a scope. Not for use inside a parallel region,
-/// where it has no effect.
+/// Sets the number of threads of later parallel regions for a block. One object belongs to one thread.
 class ZANBASE_API OMPThreadCount {
 public:
-    /// `count` is clamped to the range from 1 to `OMPGetMaxThreads()`.
+    /// Requests `count` threads, clamped to the range from 1 to `OMPGetMaxThreads()`.
     OMPThreadCount(long long count);
     ~OMPThreadCount();
 
-    /// Copies the notes of the other scope.
+    /// Copies the recorded values; calls nothing in the runtime.
     OMPThreadCount(const OMPThreadCount&) = default;
 
-    /// Takes over the notes of the other scope.
+    /// Copies the recorded values; calls nothing in the runtime.
     OMPThreadCount& operator=(const OMPThreadCount&);
 
 private:
@@ -59,53 +67,51 @@ private:
     int mnPrevious;
 };
 
-/// Sets nested parallelism for a scope and, if `enable` is true, the thread count to `OMPGetMaxThreads()`;
-/// with false the thread count is left alone. Not for use inside a parallel region, where it has no effect.
+/// Sets nested parallelism for a block and, if `enable` is true, also the thread count to
+/// `OMPGetMaxThreads()`. With false it leaves the thread count alone. One object belongs to one thread.
 ///
-/// The thread count is a scope of its own. Objects that are copied or assigned share it, and the last of them
-/// ends it; an object that is assigned to first lets go of the one it had, which ends there if nobody shares
-/// it. `std::bad_alloc` out of the constructor leaves the settings as they were.
+/// The thread count has a scope of its own. Copies and assigned objects share it, and its last owner ends it.
+/// An assignment first gives up the scope that its target had, which ends if it has no other owner.
 class ZANBASE_API OMPNested {
 public:
-    /// Asks for nesting, or with false for none.
+    /// Requests nesting, or with false none. Throws `std::bad_alloc` and changes no setting if there is no
+    /// memory.
     OMPNested(bool enable);
     ~OMPNested();
 
-    /// Copies the notes of the other scope.
+    /// Copies the recorded values and shares the thread count; calls nothing in the runtime.
     OMPNested(const OMPNested&) = default;
 
-    /// Takes over the notes of the other scope.
+    /// Copies the recorded values and shares the thread count.
     OMPNested& operator=(const OMPNested&);
 
 private:
     bool mbRequested;
     bool mbPrevious;
-    std::shared_ptr<OMPThreadCount> mpoThreadCount;  // null if nesting was not asked for
+    std::shared_ptr<OMPThreadCount> mpoThreadCount;  // null if nesting was not requested
 };
 
-// The functions below may be called by any thread at any time, in parallel regions too.
-
-/// How many threads a scope of this library may ask for, 1 or more: what `OMPSetMaxThreads` set, else
-/// `OMP_NUM_THREADS` of the environment if that is a positive number, else the count of logical processors.
-/// It is settled at the first call, and the environment is not read again.
+/// Returns the thread limit of the library's scopes, at least 1: the value that `OMPSetMaxThreads` set, else
+/// the environment variable `OMP_NUM_THREADS` if it is a positive number, else the number of logical
+/// processors. The first call settles it; the environment is not read again. Thread-safe.
 [[nodiscard]] ZANBASE_API int OMPGetMaxThreads();
 
-/// Sets that limit, to 1 if `limit` is less. The runtime's own settings stay; scopes that begin later go by
-/// it.
+/// Sets that limit, to 1 if `limit` is less. Affects scopes that start later; calls nothing in the runtime.
+/// Thread-safe.
 ZANBASE_API void OMPSetMaxThreads(int limit);
 
-/// The number of threads in the current team, 1 outside a parallel region.
+/// Returns the number of threads in the current team, 1 outside a parallel region. Thread-safe.
 [[nodiscard]] ZANBASE_API int OMPGetNumThreads();
 
-/// The number of the calling thread in its team, from 0; 0 outside a parallel region.
+/// Returns the number of the calling thread in its team, from 0; 0 outside a parallel region. Thread-safe.
 [[nodiscard]] ZANBASE_API int OMPGetThreadNum();
 
-/// The number of logical processors that the system runs on, also those that this process may not use. Asked
-/// of the system once.
+/// Returns the number of logical processors that the system runs on, including those that this process may not
+/// use. Asks the system once. Thread-safe.
 [[nodiscard]] ZANBASE_API int GetLogicalProcessorCount();
 
-/// The number of processor cores, or what the OpenMP runtime counts where the system does not tell. Asked of
-/// the system once.
+/// Returns the number of processor cores, or the OpenMP runtime's processor count if the system doesn't tell.
+/// Asks the system once. Thread-safe.
 [[nodiscard]] ZANBASE_API int GetPhysicalProcessorCount();
 
 #endif

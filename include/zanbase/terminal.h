@@ -1,16 +1,16 @@
 /// @file
-/// What a program asks about its surroundings: terminal codes, the revision, a text console, screen measures.
+/// Services of the process's environment: terminal codes, the revision, a text console, screen measures.
 ///
-/// Any thread may call `IMPTerminal`, `IMPAutomaticTerm` and `IsWin32s` at any time. The rest shares state
-/// that no lock guards: the first call of `IMPGetMajorRev`, the console operations and `SetScreenSize` belong
-/// to one thread at a time, as a rule the one that starts the program.
+/// Thread-safety: `IMPTerminal`, `IMPAutomaticTerm` and `IsWin32s` are thread-safe. The other functions share
+/// state without a lock: the first call of `IMPGetMajorRev`, the console operations and `SetScreenSize` belong
+/// to one thread at a time, usually the main thread during start-up.
 #ifndef ZANBASE_TERMINAL_H
 #define ZANBASE_TERMINAL_H
 
 #include "zanbase/export.h"
 
-/// The code of the terminal called `name`, which is not null. A name counts by its beginning, letters of
-/// either case alike, so `vt100-w` is a VT100:
+/// Returns the code of the terminal `name`. The beginning of the name decides, and ASCII letters match in
+/// either case, so `vt100-w` is a VT100:
 ///
 /// | begins with | code |
 /// |---|---|
@@ -25,14 +25,15 @@
 /// | HP2621B | 8 |
 /// | IBM, DEFAULT, AUTO | 9 |
 ///
-/// Any other name, the empty one too, has code 0. What a code selects is the caller's affair.
+/// Any other name, including the empty one, has code 0. The caller decides what a code selects. Thread-safe.
+/// Requires: `name` is not null.
 ZANBASE_API int IMPTerminal(const char* name);
 
-/// The code for a program that is not told which terminal it has: 9.
+/// Returns 9, the code for an unknown terminal. Thread-safe.
 ZANBASE_API int IMPAutomaticTerm();
 
-/// The revision of the library as digits without dots, the same pointer at every call. The text belongs to
-/// the library and stays good until it is unloaded.
+/// Returns the revision of the library as digits without dots, the same pointer at every call. The text belongs
+/// to the library and is valid until the process ends. Thread-safe after the first call.
 ZANBASE_API const char* IMPGetMajorRev();
 
 /// Gives the process a text console, at most once in its life. Returns 1 if this call or an earlier one made
@@ -62,21 +63,21 @@ ZANBASE_API int CreateConsole();
 /// Thread-safety: as `CreateConsole`.
 ZANBASE_API int DestroyConsole();
 
-/// Shows (`show` not 0) or hides (0) the window of the console. On Linux it iconifies and restores a window
-/// of our own, whatever has become of the standard streams; without one it does nothing: the terminal that
-/// the process was started from belongs to the user.
+/// Shows the console's window if `show` is not 0, and hides it otherwise. On Linux it restores or iconifies a
+/// window of the library's own, wherever the standard streams lead; it does nothing to the terminal that the
+/// process was started from. Thread-safety: as `CreateConsole`.
 ZANBASE_API void ShowConsole(int show);
 
-/// 0: whether the process runs on the 32-bit extension of a 16-bit system, which none does any more.
+/// Returns 0: no supported system is the 32-bit extension of a 16-bit one. Thread-safe.
 ZANBASE_API int IsWin32s();
 
-/// Stores four measures of the screen for the life of the process, in whatever units the callers agree on.
-/// 1 if they were stored, 0 if an earlier call had stored its own, which stay.
+/// Stores four measures of the screen for the life of the process, in units that the callers agree on. Returns
+/// 1 if it stored them, 0 if an earlier call had; the earlier measures stay. Not thread-safe.
 ZANBASE_API int SetScreenSize(double first, double second, double third, double fourth);
 
-/// Hands out the measures that `SetScreenSize` stored, each to its own pointer; one that isn't wanted may be
-/// null. 1 if it did; 0, with nothing written, if all four are null or nothing was stored. After the measures
-/// were stored, any thread may call it.
+/// Writes the measures that `SetScreenSize` stored through those pointers that are not null, and returns 1.
+/// Returns 0 and writes nothing if all four are null or no measures are stored. Thread-safe after
+/// `SetScreenSize`.
 ZANBASE_API int GetScreenSize(double* first, double* second, double* third, double* fourth);
 
 #endif

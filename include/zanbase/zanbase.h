@@ -1,5 +1,5 @@
 /// @file
-/// The whole public interface in one include, and the version of the library that it belongs to.
+/// The whole public interface in one include, its subsystems, and the version of the library.
 #ifndef ZANBASE_ZANBASE_H
 #define ZANBASE_ZANBASE_H
 
@@ -25,10 +25,28 @@
 #include "zanbase/terminal.h"
 #include "zanbase/thread.h"
 
-/// The version of these headers, first part; the same numbers stand in the CMake package and in `zanbase.pc`.
+/// @defgroup locks Locks
+/// Mutex, condition variable, semaphore and read-write locks, with scoped holders.
+/// @defgroup threads Threads
+/// Thread objects that can be started again, contain faults and can be killed, and a worker that hibernates
+/// between passes.
+/// @defgroup memory Memory
+/// Allocators that retry instead of failing, and the allocation tracker with its reports.
+/// @defgroup diskio Disk I/O accounting
+/// A ledger of disk operations by file, which the caller's file layer records, with its reports.
+/// @defgroup timing Timing
+/// Clocks, a stopwatch, process-wide named timers, and a sleep that a caller can replace.
+/// @defgroup text Text
+/// Numbers, formats and token lists as text, and fixed-width text fields.
+/// @defgroup parallel Parallel support
+/// OpenMP settings for a block, the thread limit, processor counts, and the sort.
+/// @defgroup environment Environment
+/// Message catalogue, random numbers, terminal codes, and a text console.
+
+/// Major version of these headers. The CMake package and `zanbase.pc` have the same numbers.
 #define ZANBASE_VERSION_MAJOR 0
-#define ZANBASE_VERSION_MINOR 1  ///< second part
-#define ZANBASE_VERSION_PATCH 0  ///< third part
+#define ZANBASE_VERSION_MINOR 1  ///< minor version
+#define ZANBASE_VERSION_PATCH 0  ///< patch level
 /// The version as one number that can be compared: 0.1.0 is 100.
 #define ZANBASE_VERSION (ZANBASE_VERSION_MAJOR * 10000 + ZANBASE_VERSION_MINOR * 100 + ZANBASE_VERSION_PATCH)
 
