@@ -7,6 +7,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup memory
+/// @{
+
 // All blocks come from the runtime's general heap and go back through `std::free`. An attempt that fails
 // calls the installed handler once and is made again, without end; the handler can make memory available, end
 // the process, or throw, and what it throws reaches the allocator's caller. With no handler installed a
@@ -37,5 +40,7 @@ ZANBASE_API void HHandleOutOfMemory();
 /// Installs `handler` for the whole process in place of the one before; null takes it away. Threads that run
 /// out of memory at the same time call the handler at the same time, so it has to be safe for that.
 ZANBASE_API void HOutOfMemoryHandler(void (*handler)());
+
+/// @}
 
 #endif

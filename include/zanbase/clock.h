@@ -7,6 +7,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup timing
+/// @{
+
 // All times come from the system's wall clock at a resolution of one millisecond, counted from 1970-01-01
 // 00:00:00 UTC. The clock moves when the system time is set, so the difference of two readings can be wrong
 // or negative: where that matters, or where a millisecond is too coarse, use `std::chrono::steady_clock`. Any
@@ -60,5 +63,7 @@ protected:
 private:
     double mdStartTime;  // seconds since the epoch
 };
+
+/// @}
 
 #endif

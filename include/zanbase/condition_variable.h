@@ -6,6 +6,9 @@
 #include "zanbase/export.h"
 #include "zanbase/mutex.h"
 
+/// @addtogroup locks
+/// @{
+
 struct HNativeCondition;
 
 /// A condition variable that is waited for with a `HMutex`.
@@ -51,5 +54,7 @@ private:
 
     HNativeCondition* mpoCondition = nullptr;  // owned; set by the constructor and never changed
 };
+
+/// @}
 
 #endif

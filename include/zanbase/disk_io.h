@@ -8,6 +8,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup diskio
+/// @{
+
 // The ledger does no I/O. A file layer does it, measures each operation, and tells the ledger:
 //
 //     HDiskIOOpen("/data/run.dat", file, 0.004);   // the file's record; binds the handle to it
@@ -84,5 +87,7 @@ ZANBASE_API void HDiskIOSummaryReport(std::FILE* stream);
 /// Prints every file that moved bytes as `HDiskIOReportFile` does, fewest bytes first, and files that moved
 /// equally many in the order of their names; or that there is none. Prints nothing if there is no file.
 ZANBASE_API void HDiskIOUsageReport(std::FILE* stream);
+
+/// @}
 
 #endif

@@ -21,6 +21,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup text
+/// @{
+
 /// Writes the general text of `value` to `buffer` and returns it. A null `buffer` stands for a static area.
 /// Thread-safe with a buffer; with null, one call at a time. Requires: `buffer` is null or has 25 bytes.
 ///
@@ -51,8 +54,8 @@ ZANBASE_API void PrintInt(char* field, const char* format, long value) noexcept;
 [[nodiscard]] ZANBASE_API double ScanDouble(const char* field, int width) noexcept;
 
 /// Returns the decimal integer at the start of a field of `width` characters: blanks and tabs, at most one
-/// sign, digits up to the first other character. A `width` below 1 means 40. A field without a number gives 0.
-/// A number outside the range of the type wraps. Thread-safe.
+/// sign, digits up to the first other character. A `width` below 1 means 40. A field without a number gives
+/// 0. A number outside the range of the type wraps. Thread-safe.
 [[nodiscard]] ZANBASE_API int ScanInt(const char* field, int width) noexcept;
 
 /// As `ScanInt`, in 64 bits. Thread-safe.
@@ -77,5 +80,7 @@ ZANBASE_API void LCaseString(char* text) noexcept;
 /// Stores `value` truncated towards zero in `*whole` and returns `value` minus that. Unlike the runtime's
 /// `modf` it returns NaN for an infinity and +0.0 for a negative whole number. Thread-safe.
 ZANBASE_API double ZAN_modf(double value, double* whole) noexcept;
+
+/// @}
 
 #endif

@@ -7,6 +7,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup timing
+/// @{
+
 struct GlobalTimerSnapshot;
 
 /// The process's flat list of cumulative timers. There is one instance.
@@ -73,5 +76,7 @@ private:
 
     Impl* mpoImpl = nullptr;  // owned
 };
+
+/// @}
 
 #endif

@@ -10,6 +10,9 @@
 #include "zanbase/semaphore.h"
 #include "zanbase/thread.h"
 
+/// @addtogroup threads
+/// @{
+
 /// A worker. A subclass implements `Process`, one pass of work.
 ///
 ///     struct Saver : HHibernateThread {
@@ -74,5 +77,7 @@ private:
     HMutex moStateMutex;
     HSemaphore moWakeUp{1};  // one unit for each pass to make; the initial unit is the second pass
 };
+
+/// @}
 
 #endif

@@ -13,6 +13,9 @@
 #include "zanbase/export.h"
 #include "zanbase/mutex.h"
 
+/// @addtogroup memory
+/// @{
+
 // Boost's map header costs an including file about 90,000 lines, so it is not included here. Code that reads
 // the tables includes zanbase/memory_tables.h.
 namespace boost {
@@ -121,5 +124,7 @@ protected:
     static std::size_t mnPeekMemory;  ///< the highest total after an `Alloc` since the last clearing
     static HMutex moMutex;            ///< guards all of the above; built at load
 };
+
+/// @}
 
 #endif

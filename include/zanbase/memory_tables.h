@@ -14,6 +14,9 @@
 #include "zanbase/boost_version.h"
 #include "zanbase/memory.h"
 
+/// @addtogroup memory
+/// @{
+
 #if BOOST_VERSION != ZANBASE_BOOST_VERSION
 #error "zanbase was built with another version of Boost: see ZANBASE_BOOST_VERSION in zanbase/boost_version.h"
 #endif
@@ -25,5 +28,7 @@ struct HMemory::MemoryState {
     std::size_t mnSavedTotal;  ///< bytes
     std::size_t mnSavedPeek;   ///< bytes
 };
+
+/// @}
 
 #endif

@@ -8,8 +8,8 @@
 ///     std::printf(_("Cannot open %s"), name);
 ///
 /// Catalogues are those of GNU gettext, made by `msgfmt`; the text domain is "ZAN". A message keeps the text
-/// of its first look-up: a later call of a function that sets up affects only messages that were not looked up
-/// before. The texts are kept until the process ends. The library's own messages are not translated.
+/// of its first look-up: a later call of a function that sets up affects only messages that were not looked
+/// up before. The texts are kept until the process ends. The library's own messages are not translated.
 ///
 /// Thread-safety: `_` and `SetIntlTest` are thread-safe; `InitLocale` and `InitLocaleDir` are not.
 ///
@@ -18,6 +18,9 @@
 #define ZANBASE_MESSAGE_CATALOGUE_H
 
 #include "zanbase/export.h"
+
+/// @addtogroup environment
+/// @{
 
 /// Sets the locale of the process and of the message catalogue to `locale`, a name as `std::setlocale` takes
 /// it. Null or an empty text means the locale that the environment names. The category `LC_NUMERIC` becomes
@@ -41,10 +44,10 @@ ZANBASE_API void InitLocaleDir(const char* directory);
 /// Printed with its arguments, that shows the filled-in message, the mark, and the codes.
 ZANBASE_API void SetIntlTest(bool on);
 
-/// Returns the display text of `message`: its translation, or the same text if there is none. Equal texts give
-/// the same pointer, from whatever buffers they come. The text is valid until the process ends; the caller
-/// must not free or change it. The empty text gives the catalogue's entry for it, usually a description of the
-/// catalogue. Works without any setting up. Thread-safe.
+/// Returns the display text of `message`: its translation, or the same text if there is none. Equal texts
+/// give the same pointer, from whatever buffers they come. The text is valid until the process ends; the
+/// caller must not free or change it. The empty text gives the catalogue's entry for it, usually a description of
+/// the catalogue. Works without any setting up. Thread-safe.
 ///
 /// Requires: `message` is not null. Throws `std::bad_alloc` if there is no memory for a new text; the message
 /// is then looked up again by the next call.
@@ -57,5 +60,7 @@ ZANBASE_API void SetIntlTest(bool on);
 ///     ::_("text")       // after such a using-declaration
 ///     (::_)("text")     // anywhere
 ZANBASE_API ZANBASE_FORMAT_ARGUMENT(1) char*(_)(const char* message);
+
+/// @}
 
 #endif

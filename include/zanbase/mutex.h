@@ -7,6 +7,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup locks
+/// @{
+
 struct HNativeLock;
 
 /// A re-entrant mutex: the thread that owns it may take it again without blocking, and it becomes free once
@@ -77,5 +80,7 @@ private:
 
     const HMutex* mpoMutex;  // not owned; non-null exactly while this object owes it one Unlock
 };
+
+/// @}
 
 #endif

@@ -8,6 +8,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup text
+/// @{
+
 // The text lies in one of 256 slots of the process, which are taken in turn:
 //
 //     std::printf("%s of %s\n", MkName(3), MkName(2.5, 1));    // 3 of 2.5
@@ -60,5 +63,7 @@ extern "C" ZANBASE_API char* MkNameC(const char* format, ...) ZANBASE_PRINTF_FOR
 /// compiler still asks for the null at the end). No separator goes before the first string that isn't empty;
 /// every string behind that one has its own, empty or not ("a||b").
 ZANBASE_API char* MkTokenName(const char* first, ...) ZANBASE_NULL_TERMINATED;
+
+/// @}
 
 #endif

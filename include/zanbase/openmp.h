@@ -9,9 +9,9 @@
 ///
 /// One rule holds for the three scope classes. The constructor records the current setting and the requested
 /// one; if they differ and no parallel region is active, it sets the requested one. The destructor compares
-/// the two recorded values, not the live setting; if they differ and no parallel region is active, it sets the
-/// previous value again. A region is active if its team has more than one thread: a scope inside an active
-/// region changes nothing, a scope inside a region of one thread works as outside.
+/// the two recorded values, not the live setting; if they differ and no parallel region is active, it sets
+/// the previous value again. A region is active if its team has more than one thread: a scope inside an
+/// active region changes nothing, a scope inside a region of one thread works as outside.
 ///
 /// Copies and assignments copy the recorded values, so the destructor of a copy restores the same setting.
 ///
@@ -22,14 +22,17 @@
 /// Not for the threads of a single region: its `num_threads` clause does that.
 ///
 /// A process may have a second OpenMP runtime, if another library was built by another compiler. The scopes
-/// and functions here speak to the runtime that the library was built with, and don't see the teams of another
-/// one: `OMPGetThreadNum` returns 0 in every member of such a team.
+/// and functions here speak to the runtime that the library was built with, and don't see the teams of
+/// another one: `OMPGetThreadNum` returns 0 in every member of such a team.
 #ifndef ZANBASE_OPENMP_H
 #define ZANBASE_OPENMP_H
 
 #include <memory>
 
 #include "zanbase/export.h"
+
+/// @addtogroup parallel
+/// @{
 
 /// Sets the runtime's dynamic adjustment of team sizes for a block. One object belongs to one thread.
 class ZANBASE_API OMPDynamic {
@@ -106,12 +109,14 @@ ZANBASE_API void OMPSetMaxThreads(int limit);
 /// Returns the number of the calling thread in its team, from 0; 0 outside a parallel region. Thread-safe.
 [[nodiscard]] ZANBASE_API int OMPGetThreadNum();
 
-/// Returns the number of logical processors that the system runs on, including those that this process may not
-/// use. Asks the system once. Thread-safe.
+/// Returns the number of logical processors that the system runs on, including those that this process may
+/// not use. Asks the system once. Thread-safe.
 [[nodiscard]] ZANBASE_API int GetLogicalProcessorCount();
 
 /// Returns the number of processor cores, or the OpenMP runtime's processor count if the system doesn't tell.
 /// Asks the system once. Thread-safe.
 [[nodiscard]] ZANBASE_API int GetPhysicalProcessorCount();
+
+/// @}
 
 #endif

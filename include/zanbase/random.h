@@ -22,12 +22,15 @@
 
 #include "zanbase/export.h"
 
-/// Starts the sequence of `seed` and returns the seed. Store the result to repeat a run. The state becomes one
-/// step from the seed, so the first draw is two steps from it.
+/// @addtogroup environment
+/// @{
+
+/// Starts the sequence of `seed` and returns the seed. Store the result to repeat a run. The state becomes
+/// one step from the seed, so the first draw is two steps from it.
 ///
-/// A `seed` of 0 takes the seed from the wall clock: its microseconds modulo 2^31. Every seed is accepted. The
-/// seeds 2147483647 and -2147483647, and a clock seed of 0, lead to a state that never changes: `IMPRandInt`
-/// then returns 2147483647 and `IMPRandom` 1.0 until the next seeding. Not thread-safe.
+/// A `seed` of 0 takes the seed from the wall clock: its microseconds modulo 2^31. Every seed is accepted.
+/// The seeds 2147483647 and -2147483647, and a clock seed of 0, lead to a state that never changes:
+/// `IMPRandInt` then returns 2147483647 and `IMPRandom` 1.0 until the next seeding. Not thread-safe.
 ZANBASE_API int IMPInitRandom(int seed);
 
 /// Returns the next number of the sequence, from 1 to 2147483646. Not thread-safe.
@@ -41,5 +44,7 @@ ZANBASE_API double IMPRandom();
 /// uniform numbers minus 6, times `sigma`. Its magnitude is at most 6 times that of `sigma`. Takes exactly
 /// twelve steps of the sequence. Not thread-safe.
 ZANBASE_API double IMPRandNorm(double sigma);
+
+/// @}
 
 #endif

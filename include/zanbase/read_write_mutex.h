@@ -15,6 +15,9 @@
 #include "zanbase/mutex.h"
 #include "zanbase/semaphore.h"
 
+/// @addtogroup locks
+/// @{
+
 /// A lock that many readers or one writer can hold: the interface of both kinds.
 ///
 ///     HWritePrefMutex mutex;
@@ -207,5 +210,7 @@ private:
 
     const HReadWriteMutex* mpoMutex;  // not owned; non-null exactly while this object owes it one WriteUnlock
 };
+
+/// @}
 
 #endif

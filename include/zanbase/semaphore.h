@@ -7,6 +7,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup locks
+/// @{
+
 struct HNativeSemaphore;
 
 /// A counting semaphore: `Lock` takes a unit and waits while there is none, `Unlock` gives one.
@@ -78,5 +81,7 @@ private:
 
     HSemaphore* mpoSemaphore;  // not owned; non-null exactly while this object owes it one Unlock
 };
+
+/// @}
 
 #endif

@@ -5,6 +5,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup timing
+/// @{
+
 /// Calls the current sleep routine with `microseconds` on the calling thread; 0 and negative values return at
 /// once and never reach it. Any thread may call it, and the routine runs concurrently with other calls.
 ///
@@ -22,5 +25,7 @@ ZANBASE_API void USleep(int microseconds);
 /// routine is neither returned nor called. May be called at any time, on any thread; calls of `USleep` that
 /// are under way finish in the routine that they started.
 ZANBASE_API void InstallUSleepHook(void (*hook)(int));
+
+/// @}
 
 #endif

@@ -9,6 +9,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup snapshots
+/// @{
+
 // A snapshot is a plain value: it owns its texts, shares nothing with the account, and any code may fill one.
 //
 //     const HMemorySnapshot before = HMemorySnapshot::Take();
@@ -105,5 +108,7 @@ struct GlobalTimerSnapshot {
     /// Adds `other` to this snapshot; see above.
     ZANBASE_API void Merge(const GlobalTimerSnapshot& other);
 };
+
+/// @}
 
 #endif

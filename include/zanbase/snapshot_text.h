@@ -8,6 +8,9 @@
 #include "zanbase/export.h"
 #include "zanbase/snapshot.h"
 
+/// @addtogroup snapshots
+/// @{
+
 // Every writer flushes the stream and returns true if the stream took the whole text. It returns false if the
 // stream failed, unless the stream is set to throw; then that exception reaches the caller. Writers use neither
 // the stream's number format nor its locale, and write rows in the order of the snapshot. They are thread-safe
@@ -67,5 +70,7 @@ ZANBASE_API bool HWriteFoldedStacks(std::ostream& stream, const HMemorySnapshot&
 /// no moments, so each thread shows its timers one after the other, from 0, each as long as its sum; those
 /// of 0, below 0 or not finite are left out. Names are as in `HWriteJson`, `name_hex` is in `args`.
 ZANBASE_API bool HWriteChromeTrace(std::ostream& stream, const GlobalTimerSnapshot& timers);
+
+/// @}
 
 #endif

@@ -5,6 +5,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup parallel
+/// @{
+
 /// Sorts an array of `count` elements of `size` bytes each into ascending order, in place.
 ///
 ///     int numbers[] = {3, 1, 2};
@@ -15,8 +18,8 @@
 /// place of each equal element, depends on the results of `compare` alone: every build gives the same
 /// permutation.
 ///
-/// The sort allocates nothing and keeps no element outside the array: whenever `compare` runs, the array holds
-/// all its elements in some order. So `compare` may throw or leave by `longjmp`; the elements are then
+/// The sort allocates nothing and keeps no element outside the array: whenever `compare` runs, the array
+/// holds all its elements in some order. So `compare` may throw or leave by `longjmp`; the elements are then
 /// complete and unsorted. If `compare` contradicts itself (for numbers that are NaN, for example), the order
 /// is unspecified, and nothing outside the array is touched.
 ///
@@ -29,5 +32,7 @@
 /// `compare` too.
 ZANBASE_API void ZAN_qsort(void* base, unsigned long long count, unsigned long long size,
                            int (*compare)(const void*, const void*));
+
+/// @}
 
 #endif

@@ -11,8 +11,8 @@
 /// Thread-safety: every function is thread-safe; they share no state.
 ///
 /// Memory and errors: a function works in an area on the stack (about 4 kB for the format and token forms)
-/// and allocates nothing but the result, so it throws only what `std::string` throws. Text that doesn't fit in
-/// the area is cut without notice.
+/// and allocates nothing but the result, so it throws only what `std::string` throws. Text that doesn't fit
+/// in the area is cut without notice.
 ///
 /// Not for texts longer than the limits below: build a `std::string`. For a text that is used only until the
 /// next calls, `MkName` is faster.
@@ -23,6 +23,9 @@
 #include <string>
 
 #include "zanbase/export.h"
+
+/// @addtogroup text
+/// @{
 
 /// Returns the exact decimal text of `value`: digits, with a leading `-` if it is negative. Thread-safe.
 [[nodiscard]] ZANBASE_API std::string MkString(short value);
@@ -65,5 +68,7 @@
 /// a separator: "a", "", "b" gives "a||b". The result is cut to its first 4095 characters. A null `first` is
 /// the empty list; the compiler still asks for the null pointer at the end.
 [[nodiscard]] ZANBASE_API std::string MkTokenString(const char* first, ...) ZANBASE_NULL_TERMINATED;
+
+/// @}
 
 #endif

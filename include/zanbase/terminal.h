@@ -2,12 +2,15 @@
 /// Services of the process's environment: terminal codes, the revision, a text console, screen measures.
 ///
 /// Thread-safety: `IMPTerminal`, `IMPAutomaticTerm` and `IsWin32s` are thread-safe. The other functions share
-/// state without a lock: the first call of `IMPGetMajorRev`, the console operations and `SetScreenSize` belong
-/// to one thread at a time, usually the main thread during start-up.
+/// state without a lock: the first call of `IMPGetMajorRev`, the console operations and `SetScreenSize`
+/// belong to one thread at a time, usually the main thread during start-up.
 #ifndef ZANBASE_TERMINAL_H
 #define ZANBASE_TERMINAL_H
 
 #include "zanbase/export.h"
+
+/// @addtogroup environment
+/// @{
 
 /// Returns the code of the terminal `name`. The beginning of the name decides, and ASCII letters match in
 /// either case, so `vt100-w` is a VT100:
@@ -32,8 +35,8 @@ ZANBASE_API int IMPTerminal(const char* name);
 /// Returns 9, the code for an unknown terminal. Thread-safe.
 ZANBASE_API int IMPAutomaticTerm();
 
-/// Returns the revision of the library as digits without dots, the same pointer at every call. The text belongs
-/// to the library and is valid until the process ends. Thread-safe after the first call.
+/// Returns the revision of the library as digits without dots, the same pointer at every call. The text
+/// belongs to the library and is valid until the process ends. Thread-safe after the first call.
 ZANBASE_API const char* IMPGetMajorRev();
 
 /// Gives the process a text console, at most once in its life. Returns 1 if this call or an earlier one made
@@ -44,9 +47,9 @@ ZANBASE_API const char* IMPGetMajorRev();
 /// calls leave the streams alone.
 ///
 /// The call waits for a bounded time. It drops pending output that the old file does not accept within a
-/// second (a full pipe, or one without a reader, which raises no SIGPIPE). If another thread is using a stream
-/// for longer than a tenth of a second, because it waits for input for example, the stream uses the console
-/// from its next system call on, but stays buffered. A wide-oriented stream loses its orientation.
+/// second (a full pipe, or one without a reader, which raises no SIGPIPE). If another thread is using a
+/// stream for longer than a tenth of a second, because it waits for input for example, the stream uses the
+/// console from its next system call on, but stays buffered. A wide-oriented stream loses its orientation.
 ///
 /// On Linux the console is the controlling terminal of the process. Without one it is a window of the program
 /// `xterm` on the display that the environment variable `DISPLAY` names; the call waits for the window for
@@ -58,8 +61,8 @@ ZANBASE_API const char* IMPGetMajorRev();
 ZANBASE_API int CreateConsole();
 
 /// Removes the console that `CreateConsole` made: the standard streams that use it are connected to the null
-/// device, unbuffered, by the same rules, and a window of the library's own closes. Returns 1 on success, 0 if
-/// there is no such console, or no null device (then nothing changes). The console can't be made again.
+/// device, unbuffered, by the same rules, and a window of the library's own closes. Returns 1 on success, 0
+/// if there is no such console, or no null device (then nothing changes). The console can't be made again.
 /// Thread-safety: as `CreateConsole`.
 ZANBASE_API int DestroyConsole();
 
@@ -71,13 +74,15 @@ ZANBASE_API void ShowConsole(int show);
 /// Returns 0: no supported system is the 32-bit extension of a 16-bit one. Thread-safe.
 ZANBASE_API int IsWin32s();
 
-/// Stores four measures of the screen for the life of the process, in units that the callers agree on. Returns
-/// 1 if it stored them, 0 if an earlier call had; the earlier measures stay. Not thread-safe.
+/// Stores four measures of the screen for the life of the process, in units that the callers agree on.
+/// Returns 1 if it stored them, 0 if an earlier call had; the earlier measures stay. Not thread-safe.
 ZANBASE_API int SetScreenSize(double first, double second, double third, double fourth);
 
 /// Writes the measures that `SetScreenSize` stored through those pointers that are not null, and returns 1.
 /// Returns 0 and writes nothing if all four are null or no measures are stored. Thread-safe after
 /// `SetScreenSize`.
 ZANBASE_API int GetScreenSize(double* first, double* second, double* third, double* fourth);
+
+/// @}
 
 #endif

@@ -7,6 +7,9 @@
 
 #include "zanbase/export.h"
 
+/// @addtogroup threads
+/// @{
+
 struct HNativeThread;
 
 /// How much of a busy processor a thread gets, from least to most. Normal is the priority of the process; a
@@ -140,5 +143,7 @@ private:
     std::atomic<HNativeThread*> mpoThread{nullptr};  // null while idle; the thread clears it at its end
     std::atomic<HThreadPriority> mnPriority;
 };
+
+/// @}
 
 #endif

@@ -40,6 +40,8 @@
 /// Numbers, formats and token lists as text, and fixed-width text fields.
 /// @defgroup parallel Parallel support
 /// OpenMP settings for a block, the thread limit, processor counts, and the sort.
+/// @defgroup snapshots Snapshots
+/// The accounts of memory, disk and timers as values that can be compared, added up and written.
 /// @defgroup environment Environment
 /// Message catalogue, random numbers, terminal codes, and a text console.
 
