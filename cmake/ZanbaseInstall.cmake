@@ -4,7 +4,12 @@
 include(GNUInstallDirs)
 include(CMakePackageConfigHelpers)
 
-install(TARGETS zanbase EXPORT zanbaseTargets)
+# What programs need at run time is a component of its own; all else is for building them.
+set(CMAKE_INSTALL_DEFAULT_COMPONENT_NAME development)
+install(TARGETS zanbase EXPORT zanbaseTargets
+    RUNTIME COMPONENT runtime
+    LIBRARY COMPONENT runtime NAMELINK_COMPONENT development
+    ARCHIVE COMPONENT development)
 install(DIRECTORY include/zanbase ${CMAKE_CURRENT_BINARY_DIR}/include/zanbase DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
 install(EXPORT zanbaseTargets NAMESPACE zanbase:: DESTINATION ${CMAKE_INSTALL_LIBDIR}/cmake/zanbase)
 
