@@ -95,7 +95,7 @@ void CopyWithinLimit(int from, int to) noexcept {
 void DropWideBuffer(std::FILE* stream) noexcept {
     if (std::fwide(stream, 0) <= 0) return;
     if (Descriptor(OpenAboveStreams("/dev/null")).Get() < 0) return;
-    static_cast<void>(std::freopen("/dev/null", "r+", stream));
+    [[maybe_unused]] std::FILE* const same = std::freopen("/dev/null", "r+", stream);
 }
 
 }  // namespace

@@ -1,0 +1,27 @@
+# What the compiler and the linker add so that a fault in the library is harder to exploit. docs/benchmarks.md has the
+# cost of each; scripts/hardened looks for their traces in the built file. Not with sanitizers, which check the same
+# more closely.
+
+set(ZANBASE_HARDENING fortify stack-protector assertions control-flow CACHE STRING
+    "Protections that are compiled in, of: fortify stack-protector assertions control-flow")
+
+set(fortify -U_FORTIFY_SOURCE -D_FORTIFY_SOURCE=2)
+set(stack-protector -fstack-protector-strong)
+set(assertions -D_GLIBCXX_ASSERTIONS)
+set(control-flow -fcf-protection=full)
+if(CMAKE_SYSTEM_PROCESSOR STREQUAL aarch64)
+    set(control-flow -mbranch-protection=standard)
+endif()
+
+# Compiles the objects of `objects` with the protections, and links `library` without writable tables of addresses,
+# relocations in its code, or code on the stack.
+function(zanbase_harden objects library)
+    if(CMAKE_CXX_FLAGS MATCHES -fsanitize OR NOT UNIX)
+        return()
+    endif()
+    foreach(protection IN LISTS ZANBASE_HARDENING)
+        # The C library's checks need an optimised build.
+        target_compile_options(${objects} PRIVATE "$<$<CONFIG:Release,RelWithDebInfo,MinSizeRel>:${${protection}}>")
+    endforeach()
+    target_link_options(${library} PRIVATE -Wl,-z,relro -Wl,-z,now -Wl,-z,text -Wl,-z,noexecstack)
+endfunction()
