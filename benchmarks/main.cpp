@@ -1,10 +1,12 @@
-// Runs the benchmarks in a shuffled order, several times each, and prints the ratio table. The fastest of the
-// repetitions counts: on a busy machine it is the one least disturbed.
+// Runs the benchmarks in a shuffled order, several times each, and prints the ratio table; if ZANBASE_RATIOS of the
+// environment names a file, the rows are written there too. The fastest of the repetitions counts: on a busy
+// machine it is the one least disturbed.
 #include <benchmark/benchmark.h>
 
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
+#include <cstdlib>
 #include <map>
 #include <string>
 #include <thread>
@@ -19,6 +21,7 @@ struct Row {
     std::string peer;
     std::vector<Ratio> ratios;  // the row shows their geometric mean
     double goal;
+    std::string family;
 };
 
 std::vector<Row>& Rows() {
@@ -57,6 +60,19 @@ public:
         }
     }
 
+    // One row a line, its fields with tabs between: family, ours, peer, ratio, goal (0 for none).
+    void WriteRatios(const char* path) const {
+        std::FILE* const file = std::fopen(path, "w");
+        if (file == nullptr) return std::perror(path);
+        for (const Row& row : Rows()) {
+            const double ratio = MeanOf(row.ratios);
+            if (std::isnan(ratio)) continue;
+            std::fprintf(file, "%s\t%s\t%s\t%.3f\t%.2f\n", row.family.c_str(), row.ours.c_str(),
+                         row.peer.c_str(), ratio, row.goal);
+        }
+        std::fclose(file);
+    }
+
 private:
     // NaN if one of them was not measured.
     double MeanOf(const std::vector<Ratio>& ratios) const {
@@ -75,13 +91,16 @@ private:
 
 }  // namespace
 
-bool AddRatio(const std::string& ours, const std::string& peer, double goal) {
-    return AddMeanRatio(ours, peer, {{ours, peer}}, goal);
+bool AddRatio(const std::string& ours, const std::string& peer, double goal, const char* file) {
+    return AddMeanRatio(ours, peer, {{ours, peer}}, goal, file);
 }
 
 bool AddMeanRatio(const std::string& ours, const std::string& peer, const std::vector<Ratio>& ratios,
-                  double goal) {
-    Rows().push_back({ours, peer, ratios, goal});
+                  double goal, const char* file) {
+    std::string family = file;
+    family.erase(0, family.rfind('/') + 1);
+    family.erase(family.find("_bench"));
+    Rows().push_back({ours, peer, ratios, goal, family});
     return true;
 }
 
@@ -105,5 +124,6 @@ int main(int argc, char** argv) {
     if (filter != "WithoutThreads") std::thread([] {}).join();
     benchmark::RunSpecifiedBenchmarks(&times, filter);
     times.PrintRatios();
+    if (const char* const path = std::getenv("ZANBASE_RATIOS"); path != nullptr) times.WriteRatios(path);
     return 0;
 }

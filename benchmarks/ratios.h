@@ -9,7 +9,9 @@
 // Adds a row: the time of the benchmark named `ours` over that of the one named `peer` (full names as the run
 // prints them, arguments and thread counts included). `goal` is the highest ratio aimed at; 0 means none.
 // Returns true, so that it can stand at namespace scope.
-bool AddRatio(const std::string& ours, const std::string& peer, double goal);
+// `file` gives the row its family.
+bool AddRatio(const std::string& ours, const std::string& peer, double goal,
+              const char* file = __builtin_FILE());
 
 // Two benchmarks of the run, by their full names.
 struct Ratio {
@@ -20,6 +22,6 @@ struct Ratio {
 // Adds a row with the geometric mean of `ratios`; `ours` and `peer` say what they are of. It is left out
 // unless all of them were measured.
 bool AddMeanRatio(const std::string& ours, const std::string& peer, const std::vector<Ratio>& ratios,
-                  double goal);
+                  double goal, const char* file = __builtin_FILE());
 
 #endif

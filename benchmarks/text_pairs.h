@@ -49,10 +49,11 @@ public:
 
     // Measures a peer, with a row for the ratio.
     template <class Function>
-    const Ours& Beside(const std::string& peer, Function function, double goal) const {
+    const Ours& Beside(const std::string& peer, Function function, double goal,
+                       const char* file = __builtin_FILE()) const {
         const std::string name = peer + " for " + mName;
         Measure(name, function);
-        AddRatio(mName, name, goal);
+        AddRatio(mName, name, goal, file);
         return *this;
     }
 
