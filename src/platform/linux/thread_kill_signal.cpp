@@ -21,12 +21,23 @@ bool HasHandler(int signal) noexcept {
     return (action.sa_flags & SA_SIGINFO) != 0 || action.sa_handler != SIG_DFL;
 }
 
+// False for a signal that the system can't deliver: user-mode emulators accept a handler for SIGRTMAX - 1,
+// but can neither send nor block that signal.
+bool IsDeliverable(int signal) noexcept {
+    sigset_t one, before, with_it;
+    sigemptyset(&one);
+    sigaddset(&one, signal);
+    pthread_sigmask(SIG_BLOCK, &one, &before);
+    pthread_sigmask(SIG_SETMASK, &before, &with_it);
+    return sigismember(&with_it, signal) == 1;
+}
+
 // The highest signal but one without a handler; 0 if there is none. A signal in `excluded` is taken only if
 // all others have a handler.
 int FindUnusedSignal(const sigset_t& excluded) noexcept {
     int excluded_choice = 0;
     for (int signal = SIGRTMAX - 1; signal >= SIGRTMIN; --signal) {
-        if (HasHandler(signal)) continue;
+        if (HasHandler(signal) || !IsDeliverable(signal)) continue;
         if (sigismember(&excluded, signal) == 0) return signal;
         if (excluded_choice == 0) excluded_choice = signal;
     }
