@@ -1,4 +1,4 @@
-// Field text beside the C library's formatter and readers.
+// Field text beside the C library's formatter and scanners.
 #include "zanbase/field_text.h"
 
 #include <cstdio>

@@ -1,4 +1,4 @@
-// A message that was asked for before, beside a standard map under the standard library's re-entrant mutex.
+// Repeated look-ups of messages, beside a standard map under the standard library's re-entrant mutex.
 #include <benchmark/benchmark.h>
 
 #include <mutex>
@@ -21,7 +21,7 @@ char* PeerText(const char* message) {
     return entry->second.data();
 }
 
-// Messages of about `length` characters, as many as a program of middle size has.
+// Messages of `length` characters, in the number that a medium-sized program has.
 std::vector<std::string> Messages(std::size_t length) {
     std::vector<std::string> messages;
     for (int i = 0; i < 1000; ++i) {

@@ -79,7 +79,7 @@ void SortArray(benchmark::State& state, Pattern pattern) {
     const std::vector<Element> unsorted = Elements<Element>(pattern);
     std::vector<Element> elements(kCount);
     int (*compare)(const void*, const void*) = CompareElements<Element>;
-    benchmark::DoNotOptimize(compare);  // called through the pointer by all
+    benchmark::DoNotOptimize(compare);  // all sorts call it through the pointer
     for (auto _ : state) {
         std::copy(unsorted.begin(), unsorted.end(), elements.begin());
         kSort(elements.data(), kCount, sizeof(Element), compare);
@@ -87,8 +87,8 @@ void SortArray(benchmark::State& state, Pattern pattern) {
     }
 }
 
-// Ratios by order. The C library merges: on sorted and reversed arrays that takes half the comparisons that
-// ours has to make, so only arrays in random order have a goal there.
+// Ratios by order. The C library's merge sort makes half the comparisons on sorted and reversed arrays; only
+// arrays in random order have a goal there.
 std::vector<Ratio> random_beside_c, ordered_beside_c, beside_std;
 
 template <class Element>

@@ -1,4 +1,4 @@
-// String makers beside the ways of the standard library.
+// String makers beside the standard library.
 #include "zanbase/string_makers.h"
 
 #include <charconv>

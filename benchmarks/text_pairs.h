@@ -1,4 +1,4 @@
-// Small functions of one value, ours beside their peers, on the same values in turn.
+// Benchmarks small functions of one value beside their peers, on the same values.
 #ifndef ZANBASE_BENCHMARKS_TEXT_PAIRS_H
 #define ZANBASE_BENCHMARKS_TEXT_PAIRS_H
 
@@ -12,7 +12,7 @@
 
 #include "ratios.h"
 
-constexpr std::size_t kValues = 256;  // more than a branch predictor learns by heart
+constexpr std::size_t kValues = 256;  // more than a branch predictor can memorise
 
 // Numbers of all lengths and both signs.
 template <class Integer>
@@ -37,7 +37,7 @@ inline std::vector<double> Reals(int decimals) {
     return values;
 }
 
-// One of our functions over `values`, and its peers over the same.
+// One function of the library over `values`, and its peers over the same.
 template <class Value>
 class Ours {
 public:

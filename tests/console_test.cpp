@@ -1,5 +1,5 @@
-// The console on real terminals: that of the session, a window, and none. Streams and sessions belong to a
-// process, so each test works in a child.
+// The console on the terminal of the session, in a window, and on streams in use. Streams and sessions belong to a
+// process, so each test uses a child.
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <pty.h>
@@ -12,7 +12,7 @@
 
 namespace {
 
-// Ends the child, with the number of a line whose claim doesn't hold; nothing is flushed.
+// Exits the child with the line number of a false claim; flushes nothing.
 #define CLAIM(claim) \
     if (!(claim)) std::_Exit(__LINE__)
 
@@ -120,7 +120,7 @@ TEST(Console, IsAWindowWhereThereIsNoTerminal) {
     });
     EXPECT_EQ(child.exit_code, 0);
     EXPECT_EQ(child.out, "earlier");
-    pclose(server);  // it ends with its last client, the xterm
+    pclose(server);  // waits for Xvfb, which exits after its last client, xterm
     EXPECT_EQ(TextUntilTheEnd(open(log, O_RDONLY)), "text\r\n\033[2t\033[1t");
     std::remove(log);
 }

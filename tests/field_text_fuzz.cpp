@@ -1,4 +1,5 @@
-// Any field and width for the readers and TextFieldFill, under the sanitizers: a field is a block of its own.
+// Fuzzes the scanners and TextFieldFill with any field and width. Each field is a block of its own, so that the
+// address sanitizer reports an access outside it.
 #include "zanbase/field_text.h"
 
 #include <algorithm>
@@ -20,6 +21,6 @@ extern "C" int LLVMFuzzerTestOneInput(const unsigned char* data, std::size_t siz
     for (char& c : text) c = c == 'D' ? 'E' : c == 'd' ? 'e' : c;
     double expected = 0, real = ScanDouble(field.data(), width);
     if (std::sscanf(text.c_str(), "%lE", &expected) == 0) expected = std::atof(text.c_str());
-    if (real != expected && (real == real || expected == expected)) std::abort();  // NaN is as good as NaN
+    if (real != expected && (real == real || expected == expected)) std::abort();  // any NaN equals any NaN
     return 0;
 }

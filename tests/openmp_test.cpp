@@ -1,4 +1,4 @@
-// The scopes, by the calls of the runtime that they make, and the thread limit and counts with their sources.
+// The calls of the OpenMP runtime that the scopes make, and the sources of the thread limit and the counts.
 #include "zanbase/openmp.h"
 
 #include <gtest/gtest.h>
@@ -8,7 +8,7 @@
 #include "support/environment.h"
 #include "support/run_in_child.h"
 
-int logical = 0, cores = 0, asked = 0;  // what the system tells, and how often it was asked
+int logical = 0, cores = 0, asked = 0;  // the system's answers, and the number of questions
 
 int Answer(int count) noexcept {
     ++asked;
@@ -33,7 +33,7 @@ void __wrap_omp_set_num_threads(int count) { __real_omp_set_num_threads(Record('
 int __wrap_omp_get_num_procs() { return 7; }
 }
 
-// With children, so it comes first: nothing is settled yet, and the runtime has no threads.
+// First in the file: the children need a process in which no number is set and no thread runs.
 TEST(OpenMPNumbers, AreSettledOnceByTheFirstSource) {
     struct {
         const char* environment;
@@ -60,7 +60,7 @@ TEST(OpenMPNumbers, AreSettledOnceByTheFirstSource) {
     }
 }
 
-// What `scopes` call, with a limit of 8 threads; before them all is off and the thread count is 5.
+// Returns the calls that `scopes` makes, with a limit of 8 threads, all settings off and a thread count of 5.
 std::string CallsOf(void (*scopes)()) {
     OMPSetMaxThreads(8);
     __real_omp_set_dynamic(0);

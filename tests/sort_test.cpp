@@ -21,7 +21,7 @@ int Compare(const void* left, const void* right) {
 
 int AlwaysAbove(const void* element, const void*) { return *static_cast<const char*>(element) % 2 + 2; }
 
-char* At(std::size_t number) { return &array[number * size]; }  // the model counts in elements
+char* At(std::size_t number) { return &array[number * size]; }  // the model uses element numbers
 int Compare(std::size_t a, std::size_t b) { return Compare(At(a), At(b)); }
 void Swap(std::size_t a, std::size_t b) { std::swap_ranges(At(a), At(a) + size, At(b)); }
 

@@ -1,11 +1,11 @@
-// The console's flag logic; what a console is, the platform knows.
+// The console's state; the platform layer makes the console itself.
 #include "platform/console.h"
 
 #include "zanbase/terminal.h"
 
 namespace {
 
-int mnConsoleCreated = 0;  // 1 from the first console on, for the life of the process
+int mnConsoleCreated = 0;  // 1 once a console was made; never cleared
 
 }  // namespace
 

@@ -31,7 +31,7 @@ char*(_)(const char* message) {
     const HMutexLock lock(&catalogue.moCatalogueMutex);
     auto entry = catalogue.moMessageMap.find(key, MessageMap::hasher(), std::equal_to<>());
     if (entry == catalogue.moMessageMap.end()) {
-        // The text comes before the entry, so that a lack of memory leaves no entry without its text.
+        // The text is made before the entry: if memory runs out, no entry without a text remains.
         std::string text =
             catalogue.mbIntlTest.load(std::memory_order_relaxed) ? IntlTestText(key) : Translate(message);
         entry = catalogue.moMessageMap.emplace(key, std::move(text)).first;

@@ -13,7 +13,7 @@ constexpr int kQuotient = 127773;  // kModulus / kMultiplier
 
 int gnRandomState = -1;  // the last number drawn
 
-// The products wrap, and so does their difference; it fits an int for every state.
+// The products wrap in unsigned arithmetic; their difference is in the range of int for every state.
 int StepFrom(int state) {
     const int quotient = state / kQuotient;
     const int next =

@@ -13,7 +13,7 @@ struct Terminal {
 
 constexpr int kAutomaticTerm = 9;
 
-// In the order of search. A name that another one begins with stands for readers only: both have one code.
+// In search order. The longer name of a family is never reached; it documents that both have one code.
 constexpr Terminal kTerminals[] = {
     {"HARD", 0},
     {"HARDCOPY", 0},
@@ -45,11 +45,11 @@ constexpr char UpperCase(char letter) {
     return letter >= 'a' && letter <= 'z' ? static_cast<char>(letter - 'a' + 'A') : letter;
 }
 
-// Whether `text` begins with `upper`, which has no small letters; ASCII letters of either case are alike, in
-// every locale.
+// Returns whether `text` begins with `upper`, ignoring the case of ASCII letters in every locale. Requires:
+// `upper` has no lower-case letters.
 bool BeginsWith(const char* text, std::string_view upper) {
     for (const char letter : upper) {
-        if (UpperCase(*text++) != letter) return false;  // the end of `text` differs from every letter
+        if (UpperCase(*text++) != letter) return false;  // the terminator of `text` matches no letter
     }
     return true;
 }

@@ -1,4 +1,4 @@
-// The OpenMP scopes, and three numbers that are worked out once.
+// The OpenMP scopes, and three cached numbers.
 #include "zanbase/openmp.h"
 
 #include <omp.h>
@@ -12,11 +12,11 @@
 
 namespace {
 
-// Each is one word that stands for itself, so relaxed order is enough; two threads on a first call may both
-// work it out.
+// Each number is independent of other memory, so relaxed order is enough. Two threads may compute it at once
+// on the first call; both store the same value.
 std::atomic<int> gnPhysicalProcessors{-1};  // valid above 0
 std::atomic<int> gnLogicalProcessors{-1};   // valid above 0
-std::atomic<int> gnMaxThreads{-1};          // -1: not settled yet
+std::atomic<int> gnMaxThreads{-1};          // -1: not set yet
 
 constexpr auto kRelaxed = std::memory_order_relaxed;
 
@@ -25,14 +25,14 @@ int Keep(std::atomic<int>& number, int value) {
     return value;
 }
 
-// OpenMP 5.0 has a count of active levels in their place; runtimes keep both and may warn.
+// OpenMP 5.0 deprecates these two for a count of active levels. All runtimes still have them; some warn.
 #pragma GCC diagnostic push
 #pragma GCC diagnostic ignored "-Wdeprecated-declarations"
 bool IsNested() { return omp_get_nested() != 0; }
 void SetNested(int enable) { omp_set_nested(enable); }
 #pragma GCC diagnostic pop
 
-// The one rule by which the scopes write a setting.
+// The rule of all scopes: writes a setting only if it changes and no parallel region is active.
 template <class Value>
 void Change(Value from, Value to, void (*set)(int)) {
     if (from != to && omp_in_parallel() == 0) set(to);
@@ -69,7 +69,7 @@ OMPNested::OMPNested(bool enable) : mbRequested(enable), mbPrevious(IsNested()) 
     }
 }
 
-// The scope of the thread count ends behind the body, with its member.
+// The destructor of the member, which runs after this body, ends the scope of the thread count.
 OMPNested::~OMPNested() { Change(mbRequested, mbPrevious, SetNested); }
 
 OMPNested& OMPNested::operator=(const OMPNested&) = default;
@@ -78,11 +78,11 @@ int OMPGetMaxThreads() {
     int settled = gnMaxThreads.load(kRelaxed);
     if (settled != -1) return settled;
     const char* const text = std::getenv("OMP_NUM_THREADS");
-    // Not atoi, which promises nothing about a number beyond an int; here that is the largest int.
+    // strtol, because atoi is undefined for a number out of range; such a number counts as the largest int.
     const long number = text != nullptr ? std::strtol(text, nullptr, 10) : 0;
     const int limit =
         number > 0 ? static_cast<int>(std::min<long>(number, INT_MAX)) : GetLogicalProcessorCount();
-    // A limit that was set meanwhile stays.
+    // If another thread has set the limit meanwhile, its value counts.
     return gnMaxThreads.compare_exchange_strong(settled, limit, kRelaxed) ? limit : settled;
 }
 

@@ -1,7 +1,6 @@
-// A quicksort that leaves small partitions to one insertion pass. The order of its comparisons is a promise:
-// it decides where elements land that compare level, so no step may be left out, added or turned round. How
-// bytes are moved between two comparisons is free, and they are moved in blocks as wide as the element
-// allows.
+// A quicksort that leaves small partitions to one insertion pass. The sequence of its comparisons is frozen:
+// it determines the place of equal elements, so no step may be added, removed or swapped. How bytes move
+// between two comparisons is free; they move in the widest blocks that the element allows.
 //
 // Invariant: at every comparison the array is a permutation of its elements.
 #include "zanbase/sort.h"
@@ -19,7 +18,7 @@ struct Block {
     unsigned char bytes[32];
 };
 
-// Exchanges what is left of two elements behind `offset` in whole words; returns where it stopped.
+// Swaps two elements from `offset` on in whole words; returns the offset of the rest.
 template <class Word>
 std::size_t SwapWords(char* a, char* b, std::size_t offset, std::size_t size) {
     for (; size - offset >= sizeof(Word); offset += sizeof(Word)) {
@@ -33,7 +32,7 @@ std::size_t SwapWords(char* a, char* b, std::size_t offset, std::size_t size) {
     return offset;
 }
 
-// Moves the element at `from` down to `to` and those between one place up, in the same way.
+// Moves the element at `from` down to `to`, and those in between up by one place, in the same way.
 template <class Word>
 std::size_t RotateWords(char* to, char* from, std::size_t offset, std::size_t size) {
     for (; size - offset >= sizeof(Word); offset += sizeof(Word)) {
@@ -46,8 +45,8 @@ std::size_t RotateWords(char* to, char* from, std::size_t offset, std::size_t si
     return offset;
 }
 
-// One sort. `Size` is the type of the element size: a constant, so that moves of common sizes are a load and
-// a store, or a number.
+// One sort. `Size` is a constant for the common element sizes, so that a move is a load and a store; else a
+// number.
 template <class Size>
 class Sort {
 public:
@@ -66,7 +65,7 @@ public:
     }
 
 private:
-    // The smallest element is among the first few, since partitions below mnInsertionBytes are left alone.
+    // The smallest element is among the first four: partitions of three or fewer are not split.
     void PlaceSentinel(char* base, const char* limit) const {
         char* smallest = base;
         for (char* element = base + mnElementSize; element < limit; element += mnElementSize)
@@ -74,8 +73,8 @@ private:
         if (smallest != base) Swap(smallest, base);
     }
 
-    // Every element walks back to its place. With a consistent order the smallest one, at base, ends each
-    // walk; with another, base does.
+    // Moves each element back to its place. The smallest element, at `base`, ends each loop; the comparison
+    // with `base` keeps a contradictory `compare` inside the array.
     void InsertAll(char* base, const char* end) const {
         for (char* element = base + mnElementSize; element < end; element += mnElementSize) {
             char* place = element;
@@ -84,8 +83,8 @@ private:
         }
     }
 
-    // Partitions [lo, hi) until what is left of it is small: calls itself for the smaller side and goes on
-    // with the larger, so the depth stays below log2 of the count.
+    // Partitions [lo, hi) until the rest is small. Recurses into the smaller side and loops on the larger, so
+    // the depth is below log2 of the count.
     void Partition(char* lo, char* hi) const {
         std::size_t bytes;
         do {
@@ -105,7 +104,8 @@ private:
         } while (bytes >= mnInsertionBytes);
     }
 
-    // The middle element, which is made the median of the first, itself and the last if there are enough.
+    // Returns the middle element. In a partition of six elements or more it first becomes the median of
+    // three.
     char* ChoosePivot(char* lo, char* hi) const {
         const auto bytes = static_cast<std::size_t>(hi - lo);
         char* const mid = lo + mnElementSize * (bytes / mnElementSize / 2);
@@ -121,8 +121,8 @@ private:
         return mid;
     }
 
-    // Brings what sorts before the pivot to its left and the rest to its right, exchanging the pivot along
-    // with the others; returns its final place. Elements in [lo, i) and (j, hi) are on their side.
+    // Moves smaller elements to the left of the pivot and larger ones to the right, and returns its final
+    // place. Swaps may move the pivot. Invariant: elements in [lo, i) and (j, hi) are on their side.
     char* Split(char* lo, char* hi, char* mid) const {
         char* i = lo;
         char* j = hi - mnElementSize;
@@ -159,8 +159,8 @@ private:
     }
 
     const Size mnElementSize;
-    const std::size_t mnInsertionBytes;  // a smaller partition is left to the insertion pass
-    const std::size_t mnMedianBytes;     // from here on the pivot is a median of three
+    const std::size_t mnInsertionBytes;  // smaller partitions are left to the insertion pass
+    const std::size_t mnMedianBytes;     // from this size on the pivot is a median of three
     const Compare mpfnCompare;
 };
 

@@ -2,16 +2,16 @@
 #ifndef ZANBASE_PLATFORM_MESSAGES_H
 #define ZANBASE_PLATFORM_MESSAGES_H
 
-// Makes `locale` the locale of the C runtime and of the catalogues, for all categories, and then "C" that of
-// numbers. An empty name stands for the environment's choice; an unknown one changes numbers alone.
+// Sets all categories of the C runtime and of the catalogues to `locale`, and then numbers to "C". An empty
+// name means the locale that the environment names; an unknown name changes numbers only. Not thread-safe.
 void SetMessageLocale(const char* locale) noexcept;
 
-// Makes `domain` the text domain that Translate asks, with its catalogues below `directory`; a null
-// `directory` leaves the one before. Both texts are copied.
+// Sets the text domain of Translate to `domain`, with its catalogues below `directory`; a null `directory`
+// keeps the current one. Both texts are copied. Not thread-safe.
 void BindMessages(const char* domain, const char* directory) noexcept;
 
-// The translation of `message`, or `message` itself where there is none. To be copied at once: nothing is
-// promised about how long it lasts. Any thread may call it.
+// Returns the translation of `message`, or `message` if there is none. The caller copies it at once: its
+// lifetime is not defined. Thread-safe.
 const char* Translate(const char* message) noexcept;
 
 #endif

@@ -1,4 +1,4 @@
-// Numbers into and out of text fields.
+// Printing and scanning numbers in text fields.
 #include "zanbase/field_text.h"
 
 #include <algorithm>
@@ -13,23 +13,23 @@
 
 namespace {
 
-constexpr int kDefaultWidth = 40;         // of a field whose reader gives none
-constexpr std::size_t kLongestText = 64;  // that PrintDouble and its like put into a field
+constexpr int kDefaultWidth = 40;         // width of a field if the caller gives none
+constexpr std::size_t kLongestText = 64;  // limit of PrintDouble, PrintFloat and PrintInt
 
 char gacDoubleText[80];
 char gacInt64Text[22];
 
-// The pointer carries no format attribute: the format is the caller's, and nothing here can check it.
+// A pointer has no format attribute: only the caller of the library knows the format.
 int (*const kPrint)(char*, std::size_t, const char*, ...) = std::snprintf;
 
-// Prints to `area` and returns the length of the text, which is 0 where the runtime can't print.
+// Prints to `area` and returns the length of the text, 0 if the runtime fails.
 template <class Value>
 std::size_t Print(char (&area)[kLongestText + 1], const char* format, Value value) noexcept {
     const int length = kPrint(area, sizeof area, format, value);
     return std::min(static_cast<std::size_t>(std::max(length, 0)), kLongestText);
 }
 
-// Counts down what is left of the field: a pointer to its end may be one that no array has.
+// Counts the remaining characters: with a large width, a pointer to the end of the field would overflow.
 template <class Integer>
 Integer ScanInteger(const char* field, int width) noexcept {
     int left = width < 1 ? kDefaultWidth : width;
@@ -45,7 +45,7 @@ Integer ScanInteger(const char* field, int width) noexcept {
     return static_cast<Integer>(is_negative ? 0 - magnitude : magnitude);
 }
 
-// Moves the letters from `first` to `last` by `distance`.
+// Adds `distance` to each letter from `first` to `last`.
 void ShiftLetters(char* text, char first, char last, int distance) noexcept {
     for (; *text != '\0'; ++text) {
         if (first <= *text && *text <= last) *text = static_cast<char>(*text + distance);
@@ -97,8 +97,8 @@ const char* PrintInt64(long long value) noexcept {
     return WriteDecimal(value, terminator);
 }
 
-// strtod reads what "%lE" of sscanf reads, and where that finds no number it gives what atof would: one call
-// has the result of both. (They differ in the payload of a "nan(…)".)
+// One strtod gives the result of sscanf with "%lE" and, where that finds no number, of atof. They differ only
+// in the payload of a "nan(…)".
 double ScanDouble(const char* field, int width) noexcept {
     constexpr int kLongestField = 63;
     char copy[kLongestField + 1];
@@ -121,7 +121,7 @@ long long ScanInt64(const char* field, int width) noexcept { return ScanInteger<
 void TextFieldFill(char* field, const char* text, int width) noexcept {
     if (width <= 0) return;
     const auto size = static_cast<std::size_t>(width);
-    const void* const terminator = std::memchr(text, '\0', size);  // looks no further than it must
+    const void* const terminator = std::memchr(text, '\0', size);  // reads at most `size` bytes
     const std::size_t length =
         terminator != nullptr ? static_cast<std::size_t>(static_cast<const char*>(terminator) - text) : size;
     std::memmove(field, text, length);
@@ -133,8 +133,8 @@ void UCaseString(char* text) noexcept { ShiftLetters(text, 'a', 'z', 'A' - 'a');
 void LCaseString(char* text) noexcept { ShiftLetters(text, 'A', 'Z', 'a' - 'A'); }
 
 int NextMult(int value, int multiple) noexcept {
-    // The sum wraps in unsigned arithmetic. Its product with the quotient then stays in range, except that
-    // the least int has no quotient by -1; but a number divided and multiplied by -1 is itself.
+    // The sum wraps in unsigned arithmetic. INT_MIN / -1 overflows, so -1 is a case of its own: dividing and
+    // multiplying by -1 gives the sum again. All other quotients and products are in range.
     const auto sum =
         static_cast<int>(static_cast<unsigned int>(value) + static_cast<unsigned int>(multiple) - 1u);
     return multiple == -1 ? sum : sum / multiple * multiple;

@@ -1,4 +1,4 @@
-// The text rules on an area of the call's own.
+// The text rules applied to an area on the stack of each call.
 #include "zanbase/string_makers.h"
 
 #include "text/text_rules.h"
@@ -29,7 +29,7 @@ std::string MkString(double value, int decimals) {
     return {area, length};
 }
 
-// The areas are left as the stack has them: clearing 4096 bytes would slow a short text down.
+// The areas are not initialised: clearing 4096 bytes would slow down short texts.
 
 std::string MkString(const char* format, ...) {
     va_list arguments;

@@ -7,7 +7,7 @@
 
 namespace {
 
-constexpr int kSignificantDigits = 14;  // of a number whose count of decimals is automatic
+constexpr int kSignificantDigits = 14;  // if the number of decimal places is automatic
 constexpr char kSeparator = '|';
 
 int AutomaticDecimals(double value) noexcept {
@@ -18,10 +18,10 @@ int AutomaticDecimals(double value) noexcept {
 
 }  // namespace
 
-// An infinity or a NaN is the runtime's text of it, whatever the count: "inf", "-inf", "nan".
+// An infinity or a NaN is printed by the runtime: "inf", "-inf", "nan".
 std::size_t WriteFixedPoint(double value, int decimals, char* area, std::size_t bytes) noexcept {
-    // The digits of a double end at the latest 1074 places behind the point. More places would only be zeros,
-    // which are removed again, at the cost of a runtime that allocates for them.
+    // A double has at most 1074 decimal places. More would be zeros, which are removed below, and the runtime
+    // would allocate memory for them.
     constexpr int kMostDecimals = 1074;
     const int count = decimals < 0 ? AutomaticDecimals(value) : std::min(decimals, kMostDecimals);
     const int printed = std::snprintf(area, bytes, "%.*f", count, value);

@@ -1,4 +1,4 @@
-// The console of a POSIX process: the terminal it was started from, or else a terminal window of its own.
+// The console of a Linux process: its controlling terminal, or else a terminal window of its own.
 #include "platform/console.h"
 
 #include <array>
@@ -14,8 +14,8 @@
 
 namespace {
 
-int gnConsole = -1;        // descriptor on the open console, -1 if none; kept, since the streams may move on
-bool gbOwnWindow = false;  // whether it is a window that we started
+int gnConsole = -1;        // descriptor of the open console, -1 if none; the streams may be moved elsewhere
+bool gbOwnWindow = false;  // whether the console is a window of the library's own
 
 std::array<std::FILE*, 3> StandardStreams() noexcept { return {stdin, stdout, stderr}; }
 
@@ -50,7 +50,7 @@ bool CloseConsole() noexcept {
         if (UsesConsole(fileno(stream))) RedirectStream(stream, null_device);
     }
     close(null_device);
-    close(gnConsole);  // a window of our own ends once nothing uses it
+    close(gnConsole);  // the library's own window closes when no descriptor uses it
     gnConsole = -1;
     return true;
 }

@@ -1,4 +1,4 @@
-// GNU gettext where it is part of the C library: the runtime's locale is the catalogues' locale too.
+// Message catalogues by the gettext functions of the C library, which use the runtime's locale.
 #include "platform/messages.h"
 
 #include <clocale>

@@ -11,8 +11,8 @@ namespace {
 
 constexpr int kNumberLimit = 8192;  // what the largest kernels are built for
 
-// The lowest-numbered processor of the core that processor `number` belongs to; -1 if unknown. Processors
-// that are offline have no topology and stand in no other's list.
+// Returns the lowest processor number in the core of processor `number`, -1 if unknown. An offline processor
+// has no topology and is in no list.
 int FirstOfCore(int number) noexcept {
     for (const char* const list : {"core_cpus_list", "thread_siblings_list"}) {  // the newer name first
         char path[96];
@@ -31,8 +31,8 @@ int CountLogicalProcessors() noexcept {
     return static_cast<int>(std::max(sysconf(_SC_NPROCESSORS_ONLN), 0L));
 }
 
-// A core is counted at its first processor. Numbers may have gaps, so the search ends when all processors
-// have been met; if some are described nowhere, a count of the others would be wrong.
+// Counts each core at its first processor. Numbers may have gaps, so the loop ends when it has found all
+// processors. If some have no description, the number of cores is unknown.
 int CountProcessorCores() noexcept {
     int unmet = CountLogicalProcessors();
     int cores = 0;

@@ -1,8 +1,9 @@
-// Starting an xterm for a terminal that this process has open.
+// Starts an xterm for a terminal that this process has open.
 //
-// The pseudo-terminal has two ends. We keep the terminal, xterm alone gets the other one. So whatever goes
-// wrong on its side, closes that end and wakes us; and when we close the terminal, xterm sees the end and
-// goes. Once it has a window, xterm types a line with the window's number into the terminal.
+// A pseudo-terminal has two ends. This process keeps the terminal, xterm alone has the other end. If xterm
+// fails or exits, its end closes and a read of the terminal returns. If this process closes the terminal,
+// xterm gets end-of-file and exits. Once it has a window, xterm writes a line with the window's number to the
+// terminal.
 #include "platform/linux/terminal_window.h"
 
 #include <cerrno>
@@ -25,34 +26,34 @@ namespace {
 
 constexpr unsigned int kStartLimitMs = 30000;
 
-// Where xterm finds its end.
+// The descriptor of xterm's end in the process of xterm.
 constexpr int kXtermEnd = 3;
 
-// Window operations for xterm to refuse: its usual list without restoring and iconifying.
+// Window operations that xterm refuses: its default list without restoring and iconifying.
 char gaResources[] =
     "*disallowedWindowOps: 3,4,5,6,7,8,9,11,13,14,18,19,20,21,GetSelection,SetSelection,SetWinLines,SetXprop";
 
 using TerminalPath = char[64];
 
-// Opens the terminal of the pseudo-terminal whose other end is `end`, and tells its path.
+// Opens the terminal of the pseudo-terminal whose other end is `end`, and writes its path to `path`.
 int OpenTerminalOf(int end, TerminalPath& path) noexcept {
     const bool named = grantpt(end) == 0 && unlockpt(end) == 0 && ptsname_r(end, path, sizeof(path)) == 0;
     return named ? OpenAboveStreams(path) : -1;
 }
 
-// Copies this process; 0 in the copy. Nobody hears of it as of a fork: no handler hung onto forks runs, the
-// end of the copy raises no SIGCHLD, and no wait of the program meets it, except one for just such copies.
+// fork() by the raw clone system call without an exit signal: no pthread_atfork handlers, no SIGCHLD; waitpid
+// sees the child only with __WALL or __WCLONE. Returns 0 in the child.
 pid_t CopyProcess() noexcept { return static_cast<pid_t>(syscall(SYS_clone, 0L, 0L, 0L, 0L, 0L)); }
 
-// Ends a copy of this process at once. The raw call: some tools hang work onto _exit, the flushing of streams
-// for one, and what waits in our streams is ours to write.
+// Exits a child by the raw system call: tools that intercept _exit could flush the streams, whose pending
+// output belongs to the parent.
 [[noreturn]] void LeaveCopy() noexcept {
     for (;;) syscall(SYS_exit_group, 0);
 }
 
-// Becomes xterm, with `end` and the null device as its only descriptors and a session of its own, so that no
-// signal to our process group reaches it. Runs in a copy of a process that may have had other threads, with
-// all signals blocked: calls nothing that takes a lock, and lets no handler of the program run.
+// Executes xterm in a new session, so that signals to the program's process group don't reach it. Its only
+// descriptors are `end` and the null device. Runs in a child of a process with threads: calls only functions
+// that are async-signal-safe. Requires: all signals are blocked, so that no handler of the program runs.
 [[noreturn]] void BecomeXterm(char* option, int end) noexcept {
     setsid();
     for (int number = 1; number <= SIGRTMAX; ++number) std::signal(number, SIG_DFL);
@@ -66,7 +67,7 @@ pid_t CopyProcess() noexcept { return static_cast<pid_t>(syscall(SYS_clone, 0L, 
     }
     close_range(STDIN_FILENO, STDERR_FILENO, 0);
     close_range(kXtermEnd + 1, ~0U, 0);
-    const int null_device = open("/dev/null", O_RDWR);  // gets the lowest free number, the standard input's
+    const int null_device = open("/dev/null", O_RDWR);  // gets descriptor 0, the lowest free one
     dup2(null_device, STDOUT_FILENO);
     dup2(null_device, STDERR_FILENO);
     char name[] = "xterm";
@@ -76,7 +77,7 @@ pid_t CopyProcess() noexcept { return static_cast<pid_t>(syscall(SYS_clone, 0L, 
     LeaveCopy();
 }
 
-// Starts xterm as a process that isn't our child, so that no wait of the program ever meets it.
+// Starts xterm as a grandchild, whose parent exits at once: no wait call of the program can return it.
 void StartXterm(const char* terminal_name, int end) noexcept {
     char option[sizeof(TerminalPath) + 16];
     std::snprintf(option, sizeof(option), "-S%s/%d", terminal_name, kXtermEnd);
@@ -93,15 +94,16 @@ void StartXterm(const char* terminal_name, int end) noexcept {
     pthread_sigmask(SIG_SETMASK, &before, nullptr);
 }
 
-// Waits for the line that says that the window is there; false if the other end was closed before.
+// Waits for the line that xterm writes once it has a window. Returns false if its end is closed before, or at
+// the timeout.
 bool WaitForWindow(int terminal) noexcept {
     const unsigned int start = ReadTicks();
-    pollfd news{terminal, POLLIN, 0};
+    pollfd readable{terminal, POLLIN, 0};
     int ready = 0;
     do {
         const unsigned int waited = ReadTicks() - start;
         if (waited >= kStartLimitMs) return false;
-        ready = poll(&news, 1, static_cast<int>(kStartLimitMs - waited));
+        ready = poll(&readable, 1, static_cast<int>(kStartLimitMs - waited));
     } while (ready < 0 && errno == EINTR);
     char line[64];
     return ready > 0 && read(terminal, line, sizeof(line)) > 0;
@@ -120,12 +122,12 @@ int OpenTerminalWindow() noexcept {
     termios modes{};
     tcgetattr(terminal.Get(), &modes);
     termios silent = modes;
-    silent.c_lflag &= ~static_cast<tcflag_t>(ECHO);  // or the window would show the line that xterm types
+    silent.c_lflag &= ~static_cast<tcflag_t>(ECHO);  // keeps the line that xterm writes out of the window
     tcsetattr(terminal.Get(), TCSANOW, &silent);
     StartXterm(std::strrchr(path, '/') + 1, end.Get());
     end.Close();
     if (!WaitForWindow(terminal.Get())) return -1;
-    modes.c_iflag |= IUTF8;  // the erase key takes whole characters
+    modes.c_iflag |= IUTF8;  // the erase key removes whole UTF-8 characters
     tcsetattr(terminal.Get(), TCSANOW, &modes);
     return terminal.Release();
 }

@@ -1,12 +1,12 @@
-// A program that takes the library as a stranger would: one header, and a call into every corner that could
-// miss a dependency at compile, link or load time.
+// A program of another project: one header, and a call of each family that could miss a dependency at compile,
+// link or load time.
 #include <zanbase/zanbase.h>
 
 #include <cstring>
 
 static_assert(ZANBASE_VERSION >= 100, "version macros");
 
-// A static initialiser may call in: every object behind these calls must stand.
+// Static initialisers may call the library: the objects that these calls need are already built.
 static const bool worked_at_load = [] {
     static int block;
     HMemory::Alloc(&block, sizeof block, __FILE__, __LINE__);
