@@ -21,7 +21,8 @@ TEST(MessageCatalogue, KeepsTheTextOfTheFirstLookUp) {
         SetEnvironment("LANGUAGE", "de");
         SetEnvironment("LC_ALL", "de_DE.UTF-8");
         if (std::setlocale(LC_ALL, "") == nullptr) SetEnvironment("LOCPATH", ZANBASE_TEST_LOCALE_FOLDER);
-        if (std::setlocale(LC_ALL, "") == nullptr) SetEnvironment("LC_ALL", "C.UTF-8");  // has no decimal comma
+        if (std::setlocale(LC_ALL, "") == nullptr)
+            SetEnvironment("LC_ALL", "C.UTF-8");  // has no decimal comma
         std::setlocale(LC_ALL, "C");
         InitLocale(nullptr);
         InitLocaleDir(ZANBASE_TEST_LOCALE_FOLDER);
