@@ -1,9 +1,9 @@
-// Every process-wide object that needs a constructor at load, in one file: within a file the order of construction is
-// the order of definition. Callers in other libraries are linked against this one, so the loader builds these objects
-// before any code of theirs runs.
+// Every process-wide object that needs a constructor at load, in one file: within a file the order of
+// construction is the order of definition. Callers in other libraries are linked against this one, so the
+// loader builds these objects before any code of theirs runs.
 //
-// None of them is ever destroyed: detached threads and destructors of other static objects may call the library while
-// the process exits, and the library is never unloaded.
+// None of them is ever destroyed: detached threads and destructors of other static objects may call the
+// library while the process exits, and the library is never unloaded.
 #include <algorithm>
 #include <array>
 #include <new>
@@ -40,8 +40,8 @@ NameRing& goNameRing = BuildForever<NameRing>();
 
 namespace {
 
-// A fork owns the mutex of every table, so that the child can use them all. Lock order: as listed; no other code owns
-// two of them.
+// A fork owns the mutex of every table, so that the child can use them all. Lock order: as listed; no other
+// code owns two of them.
 std::array<const HMutex*, 5> TableMutexes() {
     return {&TrackerAccess::moMutex, &goDiskIOMutex, &goTimerGrowthMutex,
             &goMessageCatalogue.moCatalogueMutex, &goNameRing.moRingMutex};

@@ -66,8 +66,8 @@ TEST(DiskIO, MakesTheLedgerAtTheFirstCallThatNeedsIt) {
     }
 }
 
-// A binding may exist before the record, and then seeks are dropped. The other thread would block for ever if the
-// mutex stayed locked.
+// A binding may exist before the record, and then seeks are dropped. The other thread would block for ever if
+// the mutex stayed locked.
 TEST(DiskIO, StaysSoundWhenMemoryRunsOut) {
     const auto seek = [] { std::thread(Play, "s1").join(); };
     FailAtEachNew([] { HDiskIOOpen("a", At('1'), 1); }, seek);

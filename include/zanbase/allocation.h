@@ -1,5 +1,15 @@
 /// @file
-/// Allocators that give a block or do not come back, and the handler that they call when memory runs out.
+/// Allocators that return a block or do not return, and the handler that they call when memory is exhausted.
+///
+/// All blocks come from the runtime's general heap; release them with `std::free`. A failed attempt calls the
+/// installed handler once and is then repeated, without limit. The handler can free memory, end the process,
+/// or throw; its exception reaches the caller of the allocator. With no handler installed, a failed attempt
+/// is repeated a bounded number of times with growing pauses, about a second in all; then one line with the
+/// requested size is written to standard error and the process is aborted.
+///
+/// None of these functions records anything in the allocation tracker; see `HMemory::Alloc`.
+///
+/// Thread-safety: all functions are thread-safe and acquire no lock of the library.
 #ifndef ZANBASE_ALLOCATION_H
 #define ZANBASE_ALLOCATION_H
 
@@ -10,35 +20,30 @@
 /// @addtogroup memory
 /// @{
 
-// All blocks come from the runtime's general heap and go back through `std::free`. An attempt that fails
-// calls the installed handler once and is made again, without end; the handler can make memory available, end
-// the process, or throw, and what it throws reaches the allocator's caller. With no handler installed a
-// failed attempt is made again a bounded number of times with growing pauses (about a second in all); then
-// one line goes to standard error and the process aborts. Any thread may call any of these functions at any
-// time. None of them tells the allocation tracker anything: a caller that wants a block tracked calls
-// `HMemory::Alloc`.
-
-/// A block of `size` bytes, never null. A `size` of 0 is a request like any other: should the runtime answer
-/// it with null, that counts as a failed attempt.
+/// Returns a block of `size` bytes, never null. A `size` of 0 is a request like any other: if the runtime
+/// answers it with null, that is a failed attempt. Thread-safe.
 [[nodiscard]] ZANBASE_API void* HMalloc(std::size_t size);
 
-/// A zero-filled block of `count` elements of `size` bytes each, never null.
+/// Returns a zero-filled block of `count` elements of `size` bytes each, never null. Thread-safe.
 [[nodiscard]] ZANBASE_API void* HCalloc(std::size_t count, std::size_t size);
 
-/// `ptr` resized to `size` bytes, possibly moved; a null `ptr` asks for a fresh block. `ptr` stays valid
-/// until an attempt succeeds. With a `size` of 0 exactly one attempt is made, its answer is returned, which
-/// may be null, and the handler is not called; otherwise the result is never null.
-[[nodiscard]] ZANBASE_API void* HRealloc(void* ptr, std::size_t size);
+/// Resizes the block `ptr` to `size` bytes and returns it, possibly moved; a null `ptr` requests a new block.
+/// `ptr` stays valid until an attempt succeeds. If `size` is not 0, the result is never null.
+///
+/// If `size` is 0, exactly one attempt is made, the handler is not called, and the runtime's answer is
+/// returned: on most systems the block is released and the result is null. Release blocks with `std::free`
+/// instead. Thread-safe for different blocks.
+ZANBASE_API void* HRealloc(void* ptr, std::size_t size);
 
-/// A copy of the zero-terminated `text`, terminator included, never null. `text` is shorter than 2^31 - 1
-/// bytes. A null `text` gives a block of 16 bytes that holds an empty text.
+/// Returns a copy of the zero-terminated `text` with its terminator, never null. A null `text` gives a block
+/// of 16 bytes that holds an empty text. Requires: `text` is shorter than 2^31 - 1 bytes. Thread-safe.
 [[nodiscard]] ZANBASE_API char* HString(const char* text);
 
-/// Calls the installed handler and returns when it returns; does nothing if none is installed.
+/// Calls the installed handler; does nothing if none is installed. Thread-safe.
 ZANBASE_API void HHandleOutOfMemory();
 
-/// Installs `handler` for the whole process in place of the one before; null takes it away. Threads that run
-/// out of memory at the same time call the handler at the same time, so it has to be safe for that.
+/// Installs `handler` for the whole process and replaces the previous one; null removes it. Thread-safe.
+/// Requires: `handler` is thread-safe, since threads that run out of memory at once call it at once.
 ZANBASE_API void HOutOfMemoryHandler(void (*handler)());
 
 /// @}

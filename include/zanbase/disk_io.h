@@ -1,5 +1,27 @@
 /// @file
 /// A process-wide account of disk operations, kept by file name, and the reports over it.
+///
+/// The ledger does no I/O. A file layer does it, measures each operation, and records it here:
+///
+///     HDiskIOOpen("/data/run.dat", &file, 0.004);  // creates the record; binds the handle to it
+///     HDiskIORead(&file, 65536, 0.0002);
+///     HDiskIOClose(&file, 0.001);
+///     HDiskIOUsageReport(stdout);
+///
+/// **Handles.** A handle is only compared. Requires: it is unique among the files in use until the close is
+/// recorded. The address of the caller's own object for the open file is; a `FILE*` or a descriptor is not,
+/// because another thread can get the same one between the close and its record.
+///
+/// **Units.** Names are kept as spelled: two spellings of one path are two files. Times are seconds as the
+/// caller measured them, of any sign, and are not checked. Counts wrap at 32 bits, byte sums at 64.
+///
+/// **Threads.** All functions are thread-safe; one mutex makes each of them atomic. They may be called until
+/// the process has ended. A fork waits until no other thread is inside the ledger, so the child can use it.
+///
+/// **Errors.** The first call creates the ledger's tables, which live as long as the process;
+/// `HDiskIOAccessFileData` and the reports never create them and treat missing tables as no files. No
+/// function reports a failure: what can't be credited is dropped. If memory is exhausted, `std::bad_alloc`
+/// reaches the caller and the ledger stays sound; `HDiskIOOpen` describes what is kept.
 #ifndef ZANBASE_DISK_IO_H
 #define ZANBASE_DISK_IO_H
 
@@ -11,81 +33,68 @@
 /// @addtogroup diskio
 /// @{
 
-// The ledger does no I/O. A file layer does it, measures each operation, and tells the ledger:
-//
-//     HDiskIOOpen("/data/run.dat", file, 0.004);   // the file's record; binds the handle to it
-//     HDiskIORead(file, 65536, 0.0002);
-//     HDiskIOClose(file, 0.001);
-//     HDiskIOUsageReport(stdout);
-//
-// A handle is any value that is unique among the open files, such as a `FILE*` or a descriptor cast to a
-// pointer; it is only compared. Names are kept as spelled: two spellings of one path are two files. Times are
-// seconds as the caller measured them, of any sign; nothing is checked. Counts wrap at 32 bits, byte sums at
-// 64.
-//
-// Any thread may call any of these functions; one mutex makes each of them one step for the others. The first
-// call makes the ledger, and it lives as long as the process; `HDiskIOAccessFileData` and the reports never
-// make it, and take a missing one for one without files. Nothing reports a failure: what can't be credited is
-// dropped. If memory runs out, `std::bad_alloc` goes to the caller and the ledger stays sound; for what is
-// then kept see `HDiskIOOpen`.
-
-/// Binds `handle` to `name`, in place of any name it was bound to, and counts an open in the record of
-/// `name`, which is made if there is none. No other function makes a record. If memory runs out, the binding
-/// may have been made without the open having been counted.
+/// Binds `handle` to `name`, replaces any earlier binding, and counts an open in the record of `name`, which
+/// is created if there is none. No other function creates a record. If memory is exhausted, the binding may
+/// have been made without the open having been counted. Thread-safe.
 ZANBASE_API void HDiskIOOpen(const std::string& name, void* handle, double seconds);
 
 /// Counts a close of the file that `handle` is bound to. The handle stays bound, so operations after the
-/// close are still credited, until the handle is bound anew.
+/// close are still credited, until the handle is bound again. Thread-safe.
 ///
-/// This and the next three do nothing if the handle's name has no record. A handle that was never bound
-/// stands for the empty name.
+/// This function and the next three do nothing if the name of the handle has no record. A handle that was
+/// never bound has the empty name.
 ZANBASE_API void HDiskIOClose(void* handle, double seconds);
 
-/// Counts a seek; see `HDiskIOClose`.
+/// Counts a seek; see `HDiskIOClose`. Thread-safe.
 ZANBASE_API void HDiskIOSeek(void* handle, double seconds);
 
-/// Counts a read of `bytes` bytes, which may be 0; see `HDiskIOClose`.
+/// Counts a read of `bytes` bytes, which may be 0; see `HDiskIOClose`. Thread-safe.
 ZANBASE_API void HDiskIORead(void* handle, unsigned long long bytes, double seconds);
 
-/// Counts a write of `bytes` bytes, which may be 0; see `HDiskIOClose`.
+/// Counts a write of `bytes` bytes, which may be 0; see `HDiskIOClose`. Thread-safe.
 ZANBASE_API void HDiskIOWrite(void* handle, unsigned long long bytes, double seconds);
 
-/// Binds a further handle to `name` without counting an open and without making a record. Operations on it
-/// are dropped until `HDiskIOOpen` has made the record.
+/// Binds a further handle to `name` without counting an open and without creating a record. Operations on it
+/// are dropped until `HDiskIOOpen` has created the record. Thread-safe.
 ZANBASE_API void _HDiskIOMapFD(const std::string& name, void* handle);
 
-/// The name that `handle` is bound to, or an empty text.
+/// Returns the name that `handle` is bound to, or an empty text. Thread-safe.
 ZANBASE_API std::string HDiskIOGetFilename(void* handle);
 
-/// True if `name` has a record; then its read and write sums go to those of the pointers that are not null.
-/// Otherwise false, and nothing is written.
+/// Returns true if `name` has a record, and stores its read and write sums through those pointers that are
+/// not null. Otherwise returns false and stores nothing. Thread-safe.
 ZANBASE_API bool HDiskIOAccessFileData(std::string name, double* readTime, unsigned int* readCount,
                                        unsigned long long* readSize, double* writeTime,
                                        unsigned int* writeCount, unsigned long long* writeSize);
 
-/// Saves a copy of all records and bindings and then, as a step of its own, empties the ledger. What another
-/// thread records between the two steps is lost. Calls nest to any depth.
+/// Saves a copy of all records and bindings and then, as a separate step, empties the ledger. What another
+/// thread records between the two steps is lost. Calls nest to any depth. Thread-safe.
 ZANBASE_API void HDiskIOPush();
 
-/// Brings back what the newest `HDiskIOPush` saved, in place of all recorded since. Does nothing if nothing
-/// is saved.
+/// Restores what the newest `HDiskIOPush` saved and discards all recorded since. Does nothing if nothing is
+/// saved. Thread-safe.
 ZANBASE_API void HDiskIOPop();
 
-/// Removes all records and bindings. What was saved stays.
+/// Removes all records and bindings. Saved states stay. Thread-safe.
 ZANBASE_API void HDiskIOReset();
 
-// The reports write to `stream`, which must be open for writing and is neither checked nor flushed. Recording
-// waits until a report is written, so that what it shows is one state of the ledger.
-
-/// Prints the counts, times and sizes of one file. True if `name` has a record; otherwise false, and nothing
-/// is printed. Lines longer than 4095 characters are cut.
+/// Prints the counts, times and sizes of one file. Returns true if `name` has a record; otherwise returns
+/// false and prints nothing. Lines longer than 4095 characters are cut. The stream is not flushed. Requires:
+/// `stream` is open for writing, and its own write functions don't call `HDiskIOPush`, `HDiskIOPop` or
+/// `HDiskIOReset`.
+///
+/// Thread-safe, like the other reports. The calling thread owns the stream's lock (`flockfile`) and then the
+/// ledger's mutex until the report is written: no other output gets into it, recording waits, and a thread
+/// that owns the stream may record.
 ZANBASE_API bool HDiskIOReportFile(std::FILE* stream, const std::string& name);
 
-/// Prints a table of sums over all files, or nothing if there is no file.
+/// Prints a table of sums over all files, or nothing if there is no file. `stream`, locks and threads as for
+/// `HDiskIOReportFile`.
 ZANBASE_API void HDiskIOSummaryReport(std::FILE* stream);
 
-/// Prints every file that moved bytes as `HDiskIOReportFile` does, fewest bytes first, and files that moved
-/// equally many in the order of their names; or that there is none. Prints nothing if there is no file.
+/// Prints every file that moved bytes as `HDiskIOReportFile` does, fewest bytes first, equal numbers in the
+/// order of the names; if no file moved bytes, one line says so. Prints nothing if there is no file.
+/// `stream`, locks and threads as for `HDiskIOReportFile`.
 ZANBASE_API void HDiskIOUsageReport(std::FILE* stream);
 
 /// @}

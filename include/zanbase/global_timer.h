@@ -14,50 +14,61 @@ struct GlobalTimerSnapshot;
 
 /// The process's flat list of cumulative timers. There is one instance.
 ///
-///     static const auto load = GlobalTimer::GetInstance().RegisterNewTimer("load");
-///     GlobalTimer::GetInstance().Toggle(load);   // starts it on this thread
-///     Load();
-///     GlobalTimer::GetInstance().Toggle(load);   // stops it
+///     const auto load = GlobalTimer::GetInstance().RegisterNewTimer("load");  // before any parallel region
+///     #pragma omp parallel
+///     {
+///         GlobalTimer::GetInstance().Toggle(load);   // starts it on this thread
+///         Load();
+///         GlobalTimer::GetInstance().Toggle(load);   // stops it
+///     }
 ///
 /// Each timer has a slot for each OpenMP thread number, stopped or running, and a report adds the slots up.
 /// Timers overlap freely. The clock is that of `GetMicroSeconds`: intervals within one millisecond add 0, and
-/// setting the system time shows in the totals.
+/// setting the system time changes the totals.
 ///
-/// When the process exits, or calls `exit`, the report is printed once more on `std::cout`, also if `Report`
-/// was called before; a process that never asked for the instance prints nothing. The timers are gone then:
-/// threads that toggle have to be through by that time, and an object with static storage that uses the
-/// timers in its destructor asks for the instance in its constructor, so that they outlive it.
+/// **Exit.** When the process returns from `main` or calls `exit`, the report is printed once more on
+/// `std::cout`, even if `Report` was called before; a process that never asked for the instance prints
+/// nothing. A child made by `fork` that calls `exit` prints it too, with the totals of its parent: end such a
+/// child with `_exit`. The instance is destroyed with that report. Requires: no thread toggles by then.
+/// Destructors of static objects and `atexit` handlers may use the timers only if they were constructed or
+/// registered after the first `GetInstance`.
 ///
-/// Not for threads that OpenMP gives the same number: outside parallel regions that is 0 for every thread,
-/// and nested teams number theirs from 0 again. Such threads have to toggle one after the other. Not for
-/// short code either: a pair of toggles costs about two clock readings.
+/// **Thread numbers.** Threads with the same OpenMP number share slots and must toggle one after the other:
+/// outside parallel regions every thread has number 0, and nested teams number theirs from 0 again. The same
+/// holds in a process with two OpenMP runtimes (libgomp of g++ and libomp of clang): members of a team of the
+/// runtime that this library was not linked with all have number 0 here. Build all parts with one runtime. In
+/// a parallel region of the caller, `OMPGetThreadNum() != omp_get_thread_num()` on some member shows two
+/// runtimes.
+///
+/// Not for short code: a pair of toggles costs about two clock readings.
 class ZANBASE_API GlobalTimer {
 public:
-    /// The one instance, built at the first call; any thread may make that. `std::bad_alloc` leaves it to the
-    /// next call.
+    /// The one instance, created by the first call. Thread-safe. After a `std::bad_alloc` the next call tries
+    /// again. Requires: no other thread is in the first call while the process forks.
     static GlobalTimer& GetInstance();
 
-    /// Adds a timer and returns its identifier; identifiers count up from 0. Names need not differ;
-    /// each registration is a timer of its own. No other call may be in progress, so as a rule it is made
-    /// outside parallel regions. `std::bad_alloc` leaves the timers as they were.
+    /// Adds a timer and returns its identifier; identifiers count up from 0. Names need not differ: each
+    /// registration is a timer of its own. `std::bad_alloc` leaves the timers as they were. Not thread-safe.
+    /// Requires: no other call is in progress. A static variable of a function that a team calls is
+    /// initialised inside the team: register outside.
     unsigned long long RegisterNewTimer(std::string name);
 
-    /// Starts timer `id` on the calling thread's number if it is stopped there, else stops it and adds the
-    /// interval. What other threads started is not touched. `id` must come from `RegisterNewTimer`; it is not
-    /// tested.
+    /// Starts timer `id` on the calling thread's number if it is stopped there; otherwise stops it and adds
+    /// the interval. Slots of other threads are not changed. Requires: `id` comes from `RegisterNewTimer`; it
+    /// is not checked.
     ///
-    /// Threads that OpenMP numbers differently may toggle at the same time: no lock is taken, no memory
-    /// allocated and no shared word written, except once for a number at or above `OMPGetMaxThreads()` as it
-    /// was when the instance was built. There `std::bad_alloc` leaves the timers as they were.
+    /// Thread-safe for threads with different OpenMP numbers. No lock is acquired, no memory allocated and no
+    /// shared word written, except once for a number at or above `OMPGetMaxThreads()` as it was when the
+    /// instance was created. There `std::bad_alloc` leaves the timers as they were.
     void Toggle(unsigned long long id);
 
-    /// Prints a line "name: seconds" for each timer on `std::cout`, in the number format that the stream is
-    /// set to, from the smallest total to the largest, and flushes it. Open intervals count for nothing and
-    /// go on. Prints nothing if no timer is registered. No other call may be in progress.
+    /// Prints a line "name: seconds" for each timer on `std::cout`, in the number format of the stream, from
+    /// the smallest total to the largest, and flushes it. Open intervals count for nothing and continue.
+    /// Prints nothing if no timer is registered. Not thread-safe. Requires: no other call is in progress.
     void Report() const;
 
     /// Stops every timer on every thread, drops open intervals and sets all totals to 0. Names and
-    /// identifiers stay. No other call may be in progress.
+    /// identifiers stay. Not thread-safe. Requires: no other call is in progress.
     void ResetAll();
 
     /// Prints the report.

@@ -16,8 +16,8 @@
 /// @addtogroup memory
 /// @{
 
-// Boost's map header costs an including file about 90,000 lines, so it is not included here. Code that reads
-// the tables includes zanbase/memory_tables.h.
+// Boost's map header adds about 90,000 lines to each including file, so it is not included here. Code that
+// reads the tables includes zanbase/memory_tables.h.
 namespace boost {
 template <class T>
 struct hash;
@@ -27,8 +27,8 @@ class unordered_map;
 }
 }  // namespace boost
 
-/// A process-wide ledger of memory blocks. It allocates nothing for its callers: whoever takes a block tells
-/// the tracker, and tells it again when the block goes.
+/// A process-wide ledger of memory blocks. It allocates nothing for its callers: a caller that takes a block
+/// records it here, and records its release.
 ///
 ///     void* block = std::malloc(64);
 ///     HMemory::Alloc(block, 64, __FILE__, __LINE__);
@@ -36,50 +36,78 @@ class unordered_map;
 ///     HMemory::Free(block);
 ///     std::free(block);
 ///
-/// Any thread may call any operation; each holds the one mutex from start to end. The tables come into being
-/// at the first `Alloc` and live as long as the process: before it, every other operation does nothing. No
-/// operation reports a failure. If the tracker's own memory runs out, `std::bad_alloc` goes to the caller,
-/// the tables stay sound, and `Alloc` has added nothing to the total and the peak. The tracker can't be used
-/// once the library's static objects are destroyed.
+/// Record the release before the block is freed, as above: afterwards another thread can get the same
+/// address.
 ///
-/// A call site is the value of the file pointer and the line. The text is neither compared nor copied: the
-/// same text at two addresses makes two sites. The pointer must not be null, and the text must stay readable
-/// as long as the tables or a saved state hold the pointer; string literals and `__FILE__` do.
+/// **Threads.** All operations are thread-safe; each holds one mutex from start to end. They may be called
+/// until the process has ended, also by detached threads and destructors of static objects. A fork waits
+/// until no other thread is inside the tracker, so the child can use it.
 ///
-/// The class has static members only and is not made to be instantiated. It finds no faults by itself: a
-/// block freed twice, or never announced, goes unnoticed. To find those, take a sanitizer.
+/// **Call sites.** A call site is the value of the file pointer and the line. The text is neither compared
+/// nor copied: the same text at two addresses makes two sites. Requires: the pointer is not null, and the
+/// text is readable and unchanged as long as the tables or a saved state hold the pointer. The usage table
+/// holds it after all blocks are freed. A string literal and `__FILE__` of a shared object end with
+/// `dlclose`: free its blocks and call `UsageReset` before, and leave no saved state that has its sites. A
+/// result of `MkName` is overwritten and must not be used as file text.
+///
+/// **Errors.** The tables are created by the first `Alloc` and live as long as the process; before it, every
+/// other operation does nothing. No operation reports a failure. If the tracker's own memory is exhausted,
+/// `std::bad_alloc` reaches the caller and the tables stay sound. An `Alloc` that throws has not changed the
+/// total and the peak, but may have counted the usage of its site.
+///
+/// **Calls from an allocator.** The tracker and its reports use `operator new` and `malloc` themselves. A
+/// program that calls the tracker from its own `operator new` or `malloc` makes every call through a guard,
+/// the reports too:
+///
+///     thread_local bool in_tracker = false;
+///     template <class Call> void CallTracker(Call call) {
+///         if (in_tracker) return;
+///         in_tracker = true;
+///         call();  // [=] { HMemory::Alloc(block, size, "operator new", 0); }
+///         in_tracker = false;
+///     }
+///
+/// The class has static members only and is not made to be instantiated. It detects no faults: a block freed
+/// twice or never recorded is not noticed. Use a sanitizer to find those.
 class ZANBASE_API HMemory {
 public:
-    /// Records the block of `size` bytes at `ptr`, taken at `line` of `file`. Neither `ptr` nor `size` is
-    /// tested: null and 0 are recorded like any other. If the tracker holds a block at `ptr` already, that
-    /// record stays as it is; the usage of the given site and the total grow all the same.
+    /// Records the block of `size` bytes at `ptr`, allocated at `line` of `file`. Neither `ptr` nor `size` is
+    /// checked: null and 0 are recorded like any other value. If the tracker has a block at `ptr` already,
+    /// that record stays unchanged; the usage of the given site and the total grow all the same. Thread-safe.
     static void Alloc(void* ptr, std::size_t size, const char* file, int line);
 
-    /// Drops the block at `ptr` and counts its recorded size as freed at the site that recorded it. Does
-    /// nothing if the tracker holds no such block.
+    /// Removes the block at `ptr` and counts its recorded size as freed at the site that recorded it. Does
+    /// nothing if the tracker has no such block. Thread-safe.
     static void Free(void* ptr);
 
-    /// Saves all that is recorded and starts afresh. Calls nest to any depth. Costs a copy of both tables.
+    /// Saves all that is recorded and starts from empty. Calls nest to any depth. Copies both tables.
+    /// Thread-safe.
     static void Push();
 
-    /// Returns to the state of the newest `Push`; all that was recorded since is forgotten, the peak too.
-    /// Does nothing if no state is saved.
+    /// Restores the state saved by the newest `Push`; all that was recorded since is lost, the peak too. Does
+    /// nothing if no state is saved. Thread-safe.
     static void Pop();
 
-    /// Empties both tables and sets the total and the peak to 0. Saved states stay.
+    /// Empties both tables and sets the total and the peak to 0. Saved states stay. Thread-safe.
     static void Reset();
 
     /// Empties the usage table only: the live blocks, the total, the peak and the saved states stay.
+    /// Thread-safe.
     static void UsageReset();
 
     /// Prints a table of the live blocks on `stream`: a row for each call site, the one that holds most bytes
-    /// last, then the totals. Prints nothing if no block is live. `stream` must be open for writing; it is
-    /// neither tested nor flushed. The tracker stands still until the table is written.
+    /// last, then the totals. Prints nothing if no block is live. The stream is not flushed. Requires:
+    /// `stream` is open for writing, and its own write functions don't call `Push`, `Pop`, `Reset` or
+    /// `UsageReset`.
+    ///
+    /// Thread-safe. The calling thread owns the stream's lock (`flockfile`) and then the tracker's mutex
+    /// until the table is written: no other output gets into it, `Alloc` and `Free` wait, and a thread that
+    /// owns the stream may call the tracker.
     static void LeakReport(std::FILE* stream);
 
     /// Prints on `stream` what each call site allocated and freed, smallest first, then the totals in K and
-    /// the peak. Sites below a small share of the total are printed as one sum. Prints nothing if the usage
-    /// table is empty. `stream` is as for `LeakReport`.
+    /// the peak. Prints nothing if the usage table is empty. Sites below 1/10240 of the total bytes are
+    /// printed as one sum. `stream`, locks and threads as for `LeakReport`.
     static void UsageReport(std::FILE* stream);
 
     /// Does nothing: there is no state to copy.
@@ -88,8 +116,8 @@ public:
 protected:
     /// What one call site did.
     struct MemoryUsage {
-        std::size_t mnAllocated = 0;    ///< bytes announced by `Alloc`
-        std::size_t mnFreed = 0;        ///< bytes of this site's blocks dropped by `Free`
+        std::size_t mnAllocated = 0;    ///< bytes recorded by `Alloc`
+        std::size_t mnFreed = 0;        ///< bytes of blocks of this site that `Free` removed
         unsigned int mnAllocCount = 0;  ///< calls of `Alloc`
         unsigned int mnFreeCount = 0;   ///< calls of `Free` that found a block of this site
     };
@@ -115,14 +143,14 @@ protected:
         boost::unordered::unordered_map<void*, MemoryBlock, boost::hash<void*>, std::equal_to<void*>,
                                         std::allocator<std::pair<void* const, MemoryBlock>>>;
 
-    // For classes derived from this one to read, with moMutex held; only the operations above change them.
-    // The three tables are created together and never destroyed.
+    // For derived classes, with moMutex held. They may change the tables' contents, but must keep the
+    // pointers. The three tables are created together and never destroyed.
     static FileMap* mpoFileMap;                     ///< usage of each site; null until the first `Alloc`
     static MemoryMap* mpoMemoryMap;                 ///< live blocks by address; null until then
     static std::list<MemoryState>* mpoMemoryStack;  ///< saved states, newest at the back; null until then
-    static std::size_t mnTotalMemory;               ///< bytes announced and not yet freed
+    static std::size_t mnTotalMemory;               ///< bytes recorded and not yet freed
     static std::size_t mnPeekMemory;  ///< the highest total after an `Alloc` since the last clearing
-    static HMutex moMutex;            ///< guards all of the above; built at load
+    static HMutex moMutex;            ///< guards all of the above; built at load, never destroyed
 };
 
 /// @}

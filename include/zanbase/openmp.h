@@ -15,6 +15,11 @@
 ///
 /// Copies and assignments copy the recorded values, so the destructor of a copy restores the same setting.
 ///
+/// Two OpenMP runtimes in one process (libgomp of g++ and libomp of clang) know nothing of each other:
+/// members of a team of the runtime that this library was not linked with all have thread number 0 here, and
+/// its settings are not changed by these scopes. Build all parts with one runtime. In a parallel region of
+/// the caller, `OMPGetThreadNum() != omp_get_thread_num()` on some member shows two runtimes.
+///
 /// Thread-safety: the settings belong to the calling thread inside the runtime. Scopes on different threads
 /// are independent; one scope object belongs to one thread. Requires: a scope ends on the thread that started
 /// it, and scopes end in reverse order. The functions are thread-safe, inside parallel regions too.

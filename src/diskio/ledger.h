@@ -2,7 +2,7 @@
 //
 // - All three tables exist, or none.
 // - The record of a binding is the one of its name, or null if the name has none or was not looked up yet.
-// - All records and all bindings are removed together. Neither is removed singly, so no binding has a pointer to
+// - All records and all bindings are removed together. Neither is removed singly, so no binding points to
 //   a removed record.
 // - A saved state shares nothing with the live tables.
 #ifndef ZANBASE_DISKIO_LEDGER_H

@@ -16,15 +16,16 @@ using Handler = void (*)();
 
 std::atomic<Handler> gpfnOutOfMemoryHandler{nullptr};
 
-// The C library declares its allocators not to throw, and a compiler then drops a `catch` around a call. An allocator
-// that a program put in their place may throw. The compiler assumes nothing about a call through a volatile pointer.
+// The C library declares its allocators not to throw, and a compiler then drops a `catch` around a call. An
+// allocator that a program put in their place may throw. The compiler assumes nothing about a call through a
+// volatile pointer.
 void* (*const volatile kMalloc)(std::size_t) = std::malloc;
 void* (*const volatile kCalloc)(std::size_t, std::size_t) = std::calloc;
 void* (*const volatile kRealloc)(void*, std::size_t) = std::realloc;
 
-// The pauses between attempts while no handler is installed. Memory may be freed while other threads or processes end,
-// so the attempt is repeated after 1, 2, 4, … ms. A caller that requires its block must not continue without it, so
-// after the last pause the process is aborted.
+// The pauses between attempts while no handler is installed. Memory may be freed while other threads or
+// processes end, so the attempt is repeated after 1, 2, 4, … ms. A caller that requires its block must not
+// continue without it, so after the last pause the process is aborted.
 class RetryPauses {
 public:
     // Sleeps for the next pause; aborts after the last one. `bytes` is the size that was requested.
@@ -85,8 +86,8 @@ void* HRealloc(void* ptr, std::size_t size) {
     }
 }
 
-// Unlike the others it passes on a std::bad_alloc of the attempt, and reads the handler only at entry and after each
-// call of it.
+// Unlike the others it passes on a std::bad_alloc of the attempt, and reads the handler only at entry and
+// after each call of it.
 char* HString(const char* text) {
     constexpr std::size_t kEmptyBlockBytes = 16;
     const int length = text != nullptr ? static_cast<int>(std::strlen(text)) : 0;

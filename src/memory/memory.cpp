@@ -1,8 +1,8 @@
 // The allocation tracker. Invariants, whenever moMutex is free:
 //
 // - All three tables exist, or none.
-// - A remembered bucket is only a guess: it is compared with the usage table at each use, so a derived class may
-//   change that table.
+// - A remembered bucket is only a guess: it is compared with the usage table at each use, so a derived class
+//   may change that table.
 // - A spare node belongs to no table, so no reader of the tables sees it.
 #include "zanbase/memory.h"
 
@@ -21,9 +21,9 @@ std::size_t HMemory::mnPeekMemory = 0;
 
 namespace {
 
-// The tables, and what makes them fast: most look-ups in the usage table start at a remembered bucket, which saves
-// the hash (a fifth of the time of an Alloc and Free), and the node of a freed block serves the next block, which
-// saves an allocation (another fifth). All of it is guarded by moMutex.
+// The tables, and what makes them fast: most look-ups in the usage table start at a remembered bucket, which
+// saves the hash (a fifth of the time of an Alloc and Free), and the node of a freed block serves the next
+// block, which saves an allocation (another fifth). All of it is guarded by moMutex.
 class Tracker : public HMemory {
 public:
     // If memory runs out, no table exists and the next call tries again.
@@ -130,8 +130,8 @@ void HMemory::Push() {
     Reset();
 }
 
-// The saved state is removed afterwards, so its tables are moved and not copied. This needs no memory and so can't
-// stop halfway.
+// The saved state is removed afterwards, so its tables are moved and not copied. This needs no memory and so
+// can't stop halfway.
 void HMemory::Pop() {
     const HMutexLock lock(&moMutex);
     if (mpoFileMap == nullptr || mpoMemoryStack->empty()) return;

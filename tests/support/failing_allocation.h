@@ -1,5 +1,5 @@
-// Makes attempts at memory fail on demand, on the thread that asks for it: those of `operator new`, which is replaced
-// here, and those of any allocator that a test leads through AttemptFails. For a test of one source.
+// Makes attempts at memory fail on demand, on the thread that asks for it: those of `operator new`, which is
+// replaced here, and those of any allocator that a test leads through AttemptFails. For a test of one source.
 #ifndef ZANBASE_TESTS_FAILING_ALLOCATION_H
 #define ZANBASE_TESTS_FAILING_ALLOCATION_H
 
@@ -43,8 +43,8 @@ void operator delete(void* part, std::size_t, std::align_val_t) noexcept {
     std::free(static_cast<void**>(part)[-1]);
 }
 
-// Runs `body` with its first attempt failing, then with the second, and so on until all succeed; `check` after each
-// failure. Returns the number of failures.
+// Runs `body` with its first attempt failing, then with the second, and so on until all succeed; `check`
+// after each failure. Returns the number of failures.
 template <class Body, class Check>
 int FailAtEachNew(Body body, Check check) {
     for (int failures = 0;; ++failures) {

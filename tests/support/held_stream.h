@@ -11,8 +11,8 @@
 #include "support/written_text.h"
 #include "zanbase/thread.h"
 
-// Owns a stream, calls `record` once `report` waits for it on another thread, and returns the report's text. A report
-// that holds a mutex of `record` while it waits is a deadlock.
+// Owns a stream, calls `record` once `report` waits for it on another thread, and returns the report's text.
+// A report that holds a mutex of `record` while it waits is a deadlock.
 template <class Report>
 std::string WrittenAfter(void (*record)(), Report report) {
     std::FILE* const stream = std::tmpfile();

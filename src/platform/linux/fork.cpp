@@ -1,10 +1,10 @@
 // Handlers around fork().
 //
-// After its handlers, fork() waits for the C library's list of streams. fflush(nullptr) owns that list while it waits
-// for a stream, and the owner of a stream may wait for one of our locks: so we must not own a lock and wait for the
-// list. A thread with one of our locks may open a file, which waits for the list: so we must not own the list and
-// wait for a lock. Hence the list is acquired first and the locks are only tried; fork() then acquires the list once
-// more, which is re-entrant.
+// After its handlers, fork() waits for the C library's list of streams. fflush(nullptr) owns that list while
+// it waits for a stream, and the owner of a stream may wait for one of our locks: so we must not own a lock
+// and wait for the list. A thread with one of our locks may open a file, which waits for the list: so we must
+// not own the list and wait for a lock. Hence the list is acquired first and the locks are only tried; fork()
+// then acquires the list once more, which is re-entrant.
 #include "platform/fork.h"
 
 #include <pthread.h>
