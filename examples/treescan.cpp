@@ -1,20 +1,21 @@
 // treescan [--threads N] [--top N] [--leak] DIR
 //
 // Reads every regular file below DIR on several threads and prints files, bytes and lines by extension, the
-// largest files, and then what the library recorded meanwhile: disk operations, memory and time. It measures
-// each disk operation itself and tells the ledger, and it tells the tracker about each block that it takes;
-// --leak leaves some of those behind, so that the leak report has rows.
+// largest files, and then what the library recorded meanwhile: disk operations, memory and time. The adapters
+// do all the recording. --leak leaves some blocks behind, so that the leak report has rows.
+#include <zanbase/adapters/recorded_file.h>
+#include <zanbase/adapters/scope_timer.h>
+#include <zanbase/adapters/tracked_memory.h>
 #include <zanbase/zanbase.h>
 
 #include <algorithm>
+#include <array>
 #include <atomic>
-#include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <map>
-#include <new>
 #include <string>
 #include <vector>
 
@@ -24,42 +25,31 @@ namespace fs = std::filesystem;
 
 namespace {
 
-// Takes a block that never is null and tells the tracker who took it; GiveBack tells it that the block went.
-#define TAKE(size) Told(HMalloc(size), (size), __FILE__, __LINE__)
-#define TAKE_TEXT(text) static_cast<char*>(Told(HString(text), std::strlen(text) + 1, __FILE__, __LINE__))
-
-void* Told(void* block, std::size_t size, const char* file, int line) {
-    HMemory::Alloc(block, size, file, line);
-    return block;
-}
-
-void GiveBack(void* block) {
-    HMemory::Free(block);
-    std::free(block);
-}
-
 struct Options {
     int threads = OMPGetMaxThreads();
-    int top = 10;
+    int top = 10;  // rows of the tables by size
     bool leak = false;
     const char* dir = nullptr;
 };
 
+using Text = std::basic_string<char, std::char_traits<char>, HTrackedAllocator<char>>;
+
 struct File {
-    char* path;  // owned
-    unsigned long long bytes, lines;
+    explicit File(Text name) : path(std::move(name)) {}
+    Text path;
+    unsigned long long bytes = 0, lines = 0;
 };
+
+using Files = std::vector<HTrackedPtr<File>>;
 
 struct Counts {
     unsigned long long files = 0, bytes = 0, lines = 0;
-    void Add(const File& file) { ++files, bytes += file.bytes, lines += file.lines; }
-};
-
-// One timer a phase; each thread adds to a row of its own.
-struct Phase {
-    explicit Phase(unsigned long long id) : timer(id) { GlobalTimer::GetInstance().Toggle(timer); }
-    ~Phase() { GlobalTimer::GetInstance().Toggle(timer); }
-    const unsigned long long timer;
+    void Add(const File& file) { Add({1, file.bytes, file.lines}); }
+    void Add(const Counts& other) {
+        files += other.files;
+        bytes += other.bytes;
+        lines += other.lines;
+    }
 };
 
 std::atomic<unsigned long long> unreadable{0};
@@ -70,7 +60,7 @@ void TellUnreadable(const fs::path& path) {
 }
 
 // Collects the regular files below `dir` into `files`; symbolic links are not followed.
-void Walk(const fs::path& dir, std::vector<File*>& files) {
+void Walk(const fs::path& dir, Files& files) {
     std::error_code error;
     for (fs::directory_iterator entry(dir, error), end; !error && entry != end; entry.increment(error)) {
         const fs::file_status status = entry->symlink_status(error);
@@ -81,19 +71,10 @@ void Walk(const fs::path& dir, std::vector<File*>& files) {
             Walk(entry->path(), files);
         } else if (fs::is_regular_file(status)) {
             const std::string path = entry->path().string();
-            files.push_back(new (TAKE(sizeof(File))) File{TAKE_TEXT(path.c_str()), 0, 0});
+            files.push_back(HMakeTracked<File>(HCallSite::Here(), Text(path.c_str(), HCallSite::Here())));
         }
     }
     if (error) TellUnreadable(dir);
-}
-
-// Runs a disk operation and passes the seconds that it took to `record`.
-template <class Operation, class Record>
-auto Measured(Operation operation, Record record) {
-    const auto start = std::chrono::steady_clock::now();
-    const auto result = operation();
-    record(result, std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count());
-    return result;
 }
 
 unsigned long long CountLines(const char* text, std::size_t size) {
@@ -105,27 +86,21 @@ unsigned long long CountLines(const char* text, std::size_t size) {
     return lines;
 }
 
-constexpr std::size_t kBlockBytes = 256 * 1024;
+using Block = std::array<char, 256 * 1024>;
 
-// Reads one file to its end through `block`, tells the ledger, and fills in what was found. The handle in the
-// ledger is the record's address: unlike the stream's, no other thread can get the same while this one still
-// tells.
-void Read(File& file, char* block) {
-    std::FILE* const stream = Measured([&] { return std::fopen(file.path, "rb"); },
-                                       [&](std::FILE* opened, double seconds) {
-                                           if (opened != nullptr) HDiskIOOpen(file.path, &file, seconds);
-                                       });
-    if (stream == nullptr) return TellUnreadable(file.path);
-    std::setvbuf(stream, nullptr, _IONBF, 0);
-    std::size_t size = kBlockBytes;
-    while (size == kBlockBytes) {
-        size = Measured([&] { return std::fread(block, 1, kBlockBytes, stream); },
-                        [&](std::size_t got, double seconds) { HDiskIORead(&file, got, seconds); });
+// Reads one file to its end through `block` and fills in what was found.
+void Read(File& file, Block& block) {
+    std::error_code error;
+    HRecordedFile stream = HRecordedFile::Open(file.path.c_str(), "rb", error);
+    if (error) return TellUnreadable(file.path.c_str());
+    std::setvbuf(stream.GetNative(), nullptr, _IONBF, 0);
+    std::size_t size = block.size();
+    while (size == block.size()) {
+        size = stream.Read(block.data(), block.size(), error);
         file.bytes += size;
-        file.lines += CountLines(block, size);
+        file.lines += CountLines(block.data(), size);
     }
-    if (std::ferror(stream) != 0) TellUnreadable(file.path);
-    Measured([&] { return std::fclose(stream); }, [&](int, double seconds) { HDiskIOClose(&file, seconds); });
+    if (error) TellUnreadable(file.path.c_str());
 }
 
 void ShowProgress(std::size_t done, std::size_t all) {
@@ -134,49 +109,52 @@ void ShowProgress(std::size_t done, std::size_t all) {
     std::fprintf(stderr, "\r%zu of %zu files%s", done, all, done == all ? "\n" : "");
 }
 
-void ReadAll(const std::vector<File*>& files, const Options& options, unsigned long long timer) {
+void ReadAll(const Files& files, const Options& options) {
     const OMPThreadCount team(options.threads);
     std::atomic<std::size_t> next{0};
 #pragma omp parallel
     {
-        const Phase phase(timer);
-        char* const block = static_cast<char*>(TAKE(kBlockBytes));
+        HTimedRegion("read");
+        HTrackedPtr<Block> block = HMakeTracked<Block>(HCallSite::Here());
         for (std::size_t i = next++; i < files.size(); i = next++) {
-            Read(*files[i], block);
+            Read(*files[i], *block);
             if (OMPGetThreadNum() == 0) ShowProgress(i, files.size());
         }
-        if (!options.leak) GiveBack(block);
+        if (options.leak) static_cast<void>(block.release());
     }
     ShowProgress(files.size(), files.size());
 }
 
-// Files, bytes and lines by extension; as in the library's reports the largest comes last.
-void PrintExtensions(const std::vector<File*>& files) {
+void PrintExtension(const std::string& extension, const Counts& counts) {
+    std::printf("%-20s %12llu %16llu %14llu\n", extension.empty() ? "(none)" : extension.c_str(),
+                counts.files, counts.bytes, counts.lines);
+}
+
+// Files, bytes and lines of the `top` largest extensions and of all others together; as in the library's
+// reports the largest comes last.
+void PrintExtensions(const Files& files, std::size_t top) {
     std::map<std::string, Counts> table;
-    for (const File* file : files) table[fs::path(file->path).extension().string()].Add(*file);
+    for (const auto& file : files) table[fs::path(file->path.c_str()).extension().string()].Add(*file);
     std::vector<std::pair<std::string, Counts>> rows(table.begin(), table.end());
     std::stable_sort(rows.begin(), rows.end(), [](const auto& one, const auto& other) {
         return one.second.bytes < other.second.bytes;
     });
+    const std::size_t others = rows.size() - std::min(top, rows.size());
+    Counts rest;
+    for (std::size_t row = 0; row < others; ++row) rest.Add(rows[row].second);
     std::printf("%-20s %12s %16s %14s\n", "Extension", "Files", "Bytes", "Lines");
-    for (const auto& [extension, counts] : rows) {
-        std::printf("%-20s %12llu %16llu %14llu\n", extension.empty() ? "(none)" : extension.c_str(),
-                    counts.files, counts.bytes, counts.lines);
-    }
+    if (others != 0) PrintExtension("(" + std::to_string(others) + " others)", rest);
+    for (std::size_t row = others; row < rows.size(); ++row)
+        PrintExtension(rows[row].first, rows[row].second);
 }
 
-// The `count` files with the most bytes, the largest last.
-std::vector<File*> TakeLargest(std::vector<File*> files, std::ptrdiff_t count) {
-    std::stable_sort(files.begin(), files.end(),
-                     [](const File* one, const File* other) { return one->bytes < other->bytes; });
-    return {files.end() - std::min(count, files.end() - files.begin()), files.end()};
-}
-
-void PrintTotals(const std::vector<File*>& files, const std::vector<File*>& largest) {
+void PrintTotals(const Files& files, std::size_t first_of_largest) {
     std::printf("\nLargest files:\n");
-    for (const File* file : largest) std::printf("%16llu %s\n", file->bytes, file->path);
     Counts total;
-    for (const File* file : files) total.Add(*file);
+    for (std::size_t i = 0; i < files.size(); ++i) {
+        total.Add(*files[i]);
+        if (i >= first_of_largest) std::printf("%16llu %s\n", files[i]->bytes, files[i]->path.c_str());
+    }
     std::printf("\nfiles: %llu\nbytes: %llu\nlines: %llu\n\n", total.files, total.bytes, total.lines);
 }
 
@@ -219,28 +197,28 @@ int main(int, char** argv) {
         return 1;
     }
     OMPSetMaxThreads(options.threads);
-    GlobalTimer& timers = GlobalTimer::GetInstance();
     const HTimer stopwatch;
-    std::vector<File*> files;
+    Files files;
     {
-        const Phase phase(timers.RegisterNewTimer("walk"));
+        HTimedRegion("walk");
         Walk(options.dir, files);
     }
-    ReadAll(files, options, timers.RegisterNewTimer("read"));
+    ReadAll(files, options);
 
-    PrintExtensions(files);
-    const std::vector<File*> largest = TakeLargest(files, options.top);
+    std::stable_sort(files.begin(), files.end(),
+                     [](const auto& one, const auto& other) { return one->bytes < other->bytes; });
+    const auto top = static_cast<std::size_t>(options.top);
+    const std::size_t largest = files.size() - std::min(top, files.size());
+    PrintExtensions(files, top);
     PrintTotals(files, largest);
     std::fprintf(stderr, "treescan: %s, %llu entries could not be read\n",
                  stopwatch.GetTimeAsString().c_str(), unreadable.load());
 
     HDiskIOSummaryReport(stdout);
-    for (const File* file : largest) HDiskIOReportFile(stdout, file->path);
-    for (File* file : files) {
-        if (options.leak && std::find(largest.begin(), largest.end(), file) != largest.end()) continue;
-        GiveBack(file->path);
-        GiveBack(file);
-    }
+    for (std::size_t i = largest; i < files.size(); ++i) HDiskIOReportFile(stdout, files[i]->path.c_str());
+    for (std::size_t i = largest; options.leak && i < files.size(); ++i)
+        static_cast<void>(files[i].release());
+    files.clear();
     HMemory::UsageReport(stdout);
     HMemory::LeakReport(stdout);
     std::printf(
