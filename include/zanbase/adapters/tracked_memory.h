@@ -95,21 +95,29 @@ inline void HTrackFree(void* ptr) noexcept {
 }
 
 /// Calls `allocate`, records its block of `size` bytes and returns it. If that can't be recorded, calls
-/// `deallocate` with the block and passes the exception on. For code that wraps another allocator.
+/// `deallocate` with the block and passes the exception on. For code that wraps another allocator, which may
+/// be an `operator new` that records: it is called within a pause.
 template <class Allocate, class Deallocate>
 auto HTrackedAllocation(std::size_t size, const HCallSite& site, Allocate allocate, Deallocate deallocate) {
-    const auto unrecorded = [](auto call, auto... block) {
-        const HTrackerPause pause;  // what is below may be an operator new that records
-        return call(block...);
-    };
-    const auto block = unrecorded(allocate);
+    const bool is_recorded = !HTrackerPause::IsActive();
+    const HTrackerPause pause;
+    const auto block = allocate();
+    if (!is_recorded) return block;
     try {
-        HTrackAlloc(block, size, site);
+        HMemory::Alloc(block, size, site.mpcFile, site.mnLine);
     } catch (...) {
-        unrecorded(deallocate, block);
+        deallocate(block);
         throw;
     }
     return block;
+}
+
+/// Records that `block` is given back, then calls `deallocate` with it within a pause.
+template <class Block, class Deallocate>
+void HTrackedDeallocation(Block block, Deallocate deallocate) {
+    HTrackFree(block);
+    const HTrackerPause pause;
+    deallocate(block);
 }
 
 /// A memory resource that takes blocks from `upstream` and records them at one call site, by default the line
@@ -131,9 +139,7 @@ private:
     }
 
     void do_deallocate(void* block, std::size_t bytes, std::size_t alignment) override {
-        HTrackFree(block);
-        const HTrackerPause pause;
-        mpoUpstream->deallocate(block, bytes, alignment);
+        HTrackedDeallocation(block, [&](void* given) { mpoUpstream->deallocate(given, bytes, alignment); });
     }
 
     bool do_is_equal(const std::pmr::memory_resource& other) const noexcept override {
@@ -181,9 +187,7 @@ public:
     }
     /// Gives the room back.
     void deallocate(T* block, std::size_t count) {
-        HTrackFree(block);
-        const HTrackerPause pause;
-        Traits::deallocate(moUpstream, block, count);
+        HTrackedDeallocation(block, [&](T* given) { Traits::deallocate(moUpstream, given, count); });
     }
 
     /// What it takes from.
@@ -218,9 +222,7 @@ struct HTrackedDelete {
         void* block = object;
         if constexpr (std::is_polymorphic_v<T>) block = dynamic_cast<void*>(object);  // the whole object
         object->~T();
-        HTrackFree(block);
-        const HTrackerPause pause;
-        ::operator delete(block);
+        HTrackedDeallocation(block, [](void* given) { ::operator delete(given); });
     }
 };
 
@@ -233,13 +235,11 @@ template <class T, class... Arguments>
 [[nodiscard]] HTrackedPtr<T> HMakeTracked(const HCallSite& site, Arguments&&... arguments) {
     static_assert(alignof(T) <= __STDCPP_DEFAULT_NEW_ALIGNMENT__, "for a stricter alignment use a container");
     using Block = std::unique_ptr<void, void (*)(void*)>;
-    Block block(HTrackedAllocation(
-                    sizeof(T), site, [] { return ::operator new(sizeof(T)); },
-                    [](void* failed) { ::operator delete(failed); }),
-                [](void* unused) {
-                    HTrackFree(unused);
-                    ::operator delete(unused);
-                });
+    Block block(
+        HTrackedAllocation(
+            sizeof(T), site, [] { return ::operator new(sizeof(T)); },
+            [](void* failed) { ::operator delete(failed); }),
+        [](void* unused) { HTrackedDeallocation(unused, [](void* given) { ::operator delete(given); }); });
     HTrackedPtr<T> object(::new (block.get()) T(std::forward<Arguments>(arguments)...));
     block.release();
     return object;
