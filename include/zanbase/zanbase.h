@@ -42,6 +42,8 @@
 /// OpenMP settings for a block, the thread limit, processor counts, and the sort.
 /// @defgroup snapshots Snapshots
 /// The accounts of memory, disk and timers as values that can be compared, added up and written.
+/// @defgroup adapters Adapters
+/// Header-only helpers that feed the accounts and lend the locks to the standard library's holders.
 /// @defgroup environment Environment
 /// Message catalogue, random numbers, terminal codes, and a text console.
 

@@ -10,6 +10,9 @@
 #include <cstddef>
 #include <cstdio>
 
+/// @addtogroup adapters
+/// @{
+
 // A type like these two can stand for any other file layer below `HRecorded`: `Open` gives `kClosed` after a
 // failure and the other functions -1, with the reason in `errno`. They are called with an open file only.
 
@@ -79,5 +82,7 @@ private:
         return size < kLargest ? static_cast<unsigned int>(size) : kLargest;
     }
 };
+
+/// @}
 
 #endif

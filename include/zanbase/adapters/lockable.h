@@ -7,6 +7,9 @@
 #include "zanbase/read_write_mutex.h"
 #include "zanbase/thread_annotations.h"
 
+/// @addtogroup adapters
+/// @{
+
 // Operations have the names and the case that the standard asks for, so std::unique_lock, std::scoped_lock,
 // std::shared_lock and std::condition_variable_any take these locks:
 //
@@ -110,5 +113,7 @@ public:
 private:
     Lock& moLock;
 };
+
+/// @}
 
 #endif

@@ -15,6 +15,9 @@
 #include "zanbase/adapters/file_calls.h"
 #include "zanbase/disk_io.h"
 
+/// @addtogroup adapters
+/// @{
+
 //     std::error_code error;
 //     HRecordedFile file = HRecordedFile::Open("run.dat", "rb", error);
 //     char block[4096];
@@ -191,5 +194,7 @@ using HRecordedFile = HRecorded<HStdioCalls>;
 
 /// Owns a descriptor.
 using HRecordedDescriptor = HRecorded<HDescriptorCalls>;
+
+/// @}
 
 #endif

@@ -12,6 +12,9 @@
 
 #include "zanbase/adapters/recorded_file.h"
 
+/// @addtogroup adapters
+/// @{
+
 /// Reads and writes an `HRecordedDescriptor` through a buffer of its own; the ledger counts the calls below.
 ///
 ///     std::error_code error;
@@ -121,5 +124,7 @@ private:
     std::unique_ptr<char[]> maBuffer;
     std::error_code moError;
 };
+
+/// @}
 
 #endif

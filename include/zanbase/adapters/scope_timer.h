@@ -9,6 +9,9 @@
 #include "zanbase/global_timer.h"
 #include "zanbase/mutex.h"
 
+/// @addtogroup adapters
+/// @{
+
 //     void Load() {
 //         HTimedRegion("load");     // until the end of the scope
 //         …
@@ -66,5 +69,7 @@ inline unsigned long long HTimerNamed(const std::string& name) {
 #define HTimedRegion(name)                                                                      \
     static const unsigned long long ZANBASE_JOIN(knZanbaseTimer, __LINE__) = HTimerNamed(name); \
     const HTimerScope ZANBASE_JOIN(zanbase_timer_scope_, __LINE__)(ZANBASE_JOIN(knZanbaseTimer, __LINE__))
+
+/// @}
 
 #endif

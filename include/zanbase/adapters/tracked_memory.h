@@ -20,6 +20,9 @@
 #include <source_location>
 #endif
 
+/// @addtogroup adapters
+/// @{
+
 //     HTrackedResource memory;                          // blocks are recorded at this file and line
 //     std::pmr::vector<int> numbers(&memory);
 //
@@ -244,5 +247,7 @@ template <class T, class... Arguments>
     block.release();
     return object;
 }
+
+/// @}
 
 #endif
