@@ -6,7 +6,7 @@
 #include <cmath>
 #include <sstream>
 
-#include "diskio/disk_io_reports.h"
+#include "diskio/disk_io_report_text.h"
 #include "support/failing_allocation.h"
 #include "support/held_stream.h"
 #include "support/run_in_child.h"

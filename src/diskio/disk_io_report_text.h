@@ -1,6 +1,6 @@
 // Texts of the disk reports, as functions of what they show.
-#ifndef ZANBASE_DISKIO_DISK_IO_REPORTS_H
-#define ZANBASE_DISKIO_DISK_IO_REPORTS_H
+#ifndef ZANBASE_DISKIO_DISK_IO_REPORT_TEXT_H
+#define ZANBASE_DISKIO_DISK_IO_REPORT_TEXT_H
 
 #include <string>
 
@@ -17,5 +17,8 @@ std::string DiskIOFileText(const std::string& name, const DiskIOUsage& usage);
 
 // The table of sums over `files`.
 std::string DiskIOSummaryText(const DiskIOFileMap& files);
+
+// The blocks of all files that moved bytes, fewest first, or a line that there are none.
+std::string DiskIOUsageText(const DiskIOFileMap& files);
 
 #endif

@@ -1,0 +1,116 @@
+// Reading an ELF file. A file that is cut or wrong gives fewer findings, never a bad access.
+#include "elf_file.h"
+
+#include <cstring>
+
+#include <fcntl.h>
+#include <sys/mman.h>
+#include <sys/stat.h>
+#include <sys/syscall.h>
+#include <unistd.h>
+
+namespace recorder {
+
+// By system calls of its own: the preload library must not record them.
+ElfFile::ElfFile(const char* path) {
+    const auto file = static_cast<int>(syscall(SYS_openat, AT_FDCWD, path, O_RDONLY | O_CLOEXEC));
+    if (file < 0) return;
+    struct stat status {};
+    if (fstat(file, &status) == 0 && S_ISREG(status.st_mode) && status.st_size > 0) {
+        const auto size = static_cast<std::size_t>(status.st_size);
+        void* const image = mmap(nullptr, size, PROT_READ | PROT_WRITE, MAP_PRIVATE, file, 0);
+        if (image != MAP_FAILED) {
+            mpcImage = static_cast<char*>(image);
+            mnImageBytes = size;
+        }
+    }
+    syscall(SYS_close, file);
+    const auto* const header = At<Elf64_Ehdr>(0);
+    if (header == nullptr || std::memcmp(header->e_ident, ELFMAG, SELFMAG) != 0 ||
+        header->e_ident[EI_CLASS] != ELFCLASS64 || header->e_shentsize != sizeof(Elf64_Shdr))
+        return;
+    mpoHeader = header;
+}
+
+ElfFile::~ElfFile() {
+    if (mpcImage != nullptr) munmap(mpcImage, mnImageBytes);
+}
+
+template <class Object>
+const Object* ElfFile::At(std::uint64_t offset, std::uint64_t count) const {
+    if (offset > mnImageBytes || count > (mnImageBytes - offset) / sizeof(Object)) return nullptr;
+    return reinterpret_cast<const Object*>(mpcImage + offset);
+}
+
+const Elf64_Phdr* ElfFile::Segments() const { return At<Elf64_Phdr>(mpoHeader->e_phoff, mpoHeader->e_phnum); }
+
+const Elf64_Shdr* ElfFile::Sections() const { return At<Elf64_Shdr>(mpoHeader->e_shoff, mpoHeader->e_shnum); }
+
+const Elf64_Shdr* ElfFile::FindSection(std::uint32_t type) const {
+    const Elf64_Shdr* const sections = Sections();
+    if (sections == nullptr) return nullptr;
+    for (unsigned int i = 0; i < mpoHeader->e_shnum; ++i)
+        if (sections[i].sh_type == type) return &sections[i];
+    return nullptr;
+}
+
+const char* ElfFile::TextAt(const Elf64_Shdr& strings, std::uint64_t offset) const {
+    if (offset >= strings.sh_size || At<char>(strings.sh_offset, strings.sh_size) == nullptr) return "";
+    const char* const text = At<char>(strings.sh_offset + offset);
+    return std::memchr(text, 0, strings.sh_size - offset) != nullptr ? text : "";
+}
+
+bool ElfFile::HasInterpreter() const {
+    const Elf64_Phdr* const segments = Segments();
+    for (unsigned int i = 0; segments != nullptr && i < mpoHeader->e_phnum; ++i)
+        if (segments[i].p_type == PT_INTERP) return true;
+    return false;
+}
+
+bool ElfFile::HasSection(const char* name) const {
+    const Elf64_Shdr* const sections = Sections();
+    if (sections == nullptr || mpoHeader->e_shstrndx >= mpoHeader->e_shnum) return false;
+    for (unsigned int i = 0; i < mpoHeader->e_shnum; ++i)
+        if (std::strcmp(TextAt(sections[mpoHeader->e_shstrndx], sections[i].sh_name), name) == 0) return true;
+    return false;
+}
+
+std::vector<std::string> ElfFile::NeededLibraries() const {
+    std::vector<std::string> libraries;
+    const Elf64_Shdr* const dynamic = FindSection(SHT_DYNAMIC);
+    if (dynamic == nullptr || dynamic->sh_link >= mpoHeader->e_shnum) return libraries;
+    const std::uint64_t count = dynamic->sh_size / sizeof(Elf64_Dyn);
+    const auto* const entries = At<Elf64_Dyn>(dynamic->sh_offset, count);
+    for (std::uint64_t i = 0; entries != nullptr && i < count; ++i)
+        if (entries[i].d_tag == DT_NEEDED)
+            libraries.emplace_back(TextAt(Sections()[dynamic->sh_link], entries[i].d_un.d_val));
+    return libraries;
+}
+
+void ElfFile::ForEachFunction(
+    bool dynamicOnly, const std::function<void(const char*, std::uint64_t, std::uint64_t)>& use) const {
+    const Elf64_Shdr* symbols = dynamicOnly ? nullptr : FindSection(SHT_SYMTAB);
+    if (symbols == nullptr) symbols = FindSection(SHT_DYNSYM);
+    if (symbols == nullptr || symbols->sh_link >= mpoHeader->e_shnum) return;
+    const std::uint64_t count = symbols->sh_size / sizeof(Elf64_Sym);
+    const auto* const all = At<Elf64_Sym>(symbols->sh_offset, count);
+    for (std::uint64_t i = 0; all != nullptr && i < count; ++i) {
+        const unsigned int type = ELF64_ST_TYPE(all[i].st_info);
+        if (all[i].st_shndx != SHN_UNDEF && (type == STT_FUNC || type == STT_GNU_IFUNC))
+            use(TextAt(Sections()[symbols->sh_link], all[i].st_name), all[i].st_value, all[i].st_size);
+    }
+}
+
+std::uint64_t ElfFile::Bias(std::uint64_t start, std::uint64_t offset) const {
+    const Elf64_Phdr* const segments = Segments();
+    constexpr std::uint64_t kPageMask = 4095;
+    for (unsigned int i = 0; segments != nullptr && i < mpoHeader->e_phnum; ++i) {
+        const Elf64_Phdr& segment = segments[i];
+        if (segment.p_type == PT_LOAD && offset + kPageMask >= segment.p_offset &&
+            offset < segment.p_offset + segment.p_filesz && (segment.p_flags & PF_X) != 0)
+            return start - (segment.p_vaddr - segment.p_offset + offset);
+    }
+    return start - offset;
+}
+
+}  // namespace recorder

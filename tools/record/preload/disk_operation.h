@@ -1,0 +1,52 @@
+// One recorded disk operation: measured around the real call, credited if that succeeded.
+#ifndef ZANBASE_RECORD_DISK_OPERATION_H
+#define ZANBASE_RECORD_DISK_OPERATION_H
+
+#include <array>
+#include <cstdint>
+
+#include "files.h"
+#include "recording.h"
+
+namespace recorder {
+
+// Calls `real` and returns its result; a result of 0 or more counts as `operation` of the file behind `descriptor`,
+// with that many bytes if `operation` moves bytes.
+template <class Call>
+auto Operate(DiskOperation operation, int descriptor, const Call& real) {
+    FileRecord* const file = Wants(kDisk) ? FileOf(descriptor) : nullptr;
+    if (file == nullptr) return real();
+    const std::uint64_t start = Now();
+    const auto result = real();
+    if (result < 0) return result;
+    const bool moves = operation == DiskOperation::kRead || operation == DiskOperation::kWrite;
+    CountOperation(*file, operation, moves ? static_cast<std::uint64_t>(result) : 0, Now() - start);
+    return result;
+}
+
+// Calls `real`, which opens `path`, and counts the open of the descriptor that `descriptorOf` finds in its result.
+template <class Call, class Descriptor>
+auto Open(const char* path, const Call& real, const Descriptor& descriptorOf) {
+    if (!Wants(kDisk)) return real();
+    const std::uint64_t start = Now();
+    gThread.opening = true;
+    const auto result = real();
+    gThread.opening = false;
+    const std::uint64_t end = Now();
+    const int descriptor = descriptorOf(result);
+    if (descriptor >= 0) CountOpen(descriptor, path, end - start);
+    return result;
+}
+
+// Descriptors that the recorder itself needs until the end: a program that closes all it finds must not close them.
+// Ascending; those that are not in use are above any descriptor.
+const std::array<unsigned int, 2>& OwnDescriptors();
+
+inline bool IsOwnDescriptor(int descriptor) {
+    const auto number = static_cast<unsigned int>(descriptor);
+    return number == OwnDescriptors()[0] || number == OwnDescriptors()[1];
+}
+
+}  // namespace recorder
+
+#endif

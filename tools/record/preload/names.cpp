@@ -1,0 +1,43 @@
+// Names of functions as people read them.
+#include "names.h"
+
+#include <cstdlib>
+#include <cstring>
+
+#include <cxxabi.h>
+
+namespace recorder {
+namespace {
+
+// Where the parameters of a demangled name start: the last parenthesis that opens outside of all brackets.
+std::size_t FindParameters(const std::string& name) {
+    int depth = 0;
+    for (std::size_t i = name.size(); i-- > 0;) {
+        if (name[i] == ')' || name[i] == '>') ++depth;
+        if (name[i] == '(' || name[i] == '<') --depth;
+        if (depth == 0 && name[i] == '(') return i;
+    }
+    return std::string::npos;
+}
+
+}  // namespace
+
+std::string ReadableName(const char* linkerName) {
+    if (std::strncmp(linkerName, "_Z", 2) != 0) return linkerName;
+    int status = 0;
+    char* const text = abi::__cxa_demangle(linkerName, nullptr, nullptr, &status);
+    if (text == nullptr) return linkerName;
+    std::string name = text;
+    std::free(text);
+    if (name.find("operator") == std::string::npos) name = name.substr(0, FindParameters(name));
+    return name;
+}
+
+std::string ShortName(const char* linkerName) {
+    constexpr std::size_t kLongest = 80;
+    std::string name = ReadableName(linkerName);
+    if (name.size() > kLongest) name = name.substr(0, kLongest - 3) + "...";
+    return name;
+}
+
+}  // namespace recorder

@@ -1,0 +1,17 @@
+// Names of functions as people read them.
+#ifndef ZANBASE_RECORD_NAMES_H
+#define ZANBASE_RECORD_NAMES_H
+
+#include <string>
+
+namespace recorder {
+
+// The demangled name without its parameters, or the name itself if it is no C++ name.
+std::string ReadableName(const char* linkerName);
+
+// The same, cut to what fits a line of a report.
+std::string ShortName(const char* linkerName);
+
+}  // namespace recorder
+
+#endif
