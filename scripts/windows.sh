@@ -1,13 +1,10 @@
 # What the scripts share about programs for 64-bit Windows: packages, and a Wine of our own to run the programs.
 # To be sourced after common.sh.
 
-windows_packages=("${build_packages[@]}" g++-mingw-w64-x86-64-posix wine64 googletest gettext dpkg-dev make xz-utils)
+windows_packages=("${build_packages[@]}" g++-mingw-w64-x86-64-posix wine64 pkg-config googletest
+    nlohmann-json3-dev libvalijson-dev gettext dpkg-dev make xz-utils)
 
-unset DISPLAY
-export WINEPREFIX=$top/build/wine WINEARCH=win64 WINEDEBUG=-all WINESERVER=/usr/lib/wine/wineserver64
-export WINEDLLOVERRIDES='mscoree,mshtml=;winemenubuilder.exe=d'
-
-# prepare_windows PRESET [benchmark]: what a build with PRESET needs, and Wine's folder and search path.
+# prepare_windows PRESET [benchmark]: what a build with PRESET needs, and the environment of its programs under Wine.
 prepare_windows() {
     need "${windows_packages[@]}"
     mkdir -p "$top/build"
@@ -15,6 +12,9 @@ prepare_windows() {
         tail -n 30 "$top/build/windows-root.log" >&2
         fail 'cannot build the libraries for Windows; the whole output is in build/windows-root.log'
     fi
+    unset DISPLAY
+    export WINEPREFIX=$top/build/wine WINEARCH=win64 WINEDEBUG=-all WINESERVER=/usr/lib/wine/wineserver64
+    export WINEDLLOVERRIDES='mscoree,mshtml=;winemenubuilder.exe=d'
     export WINEPATH="Z:$top/build/windows-root/bin;Z:$top/build/$1/src"
 }
 
@@ -41,4 +41,31 @@ run_windows_lane() {
     prepare_windows windows
     configure_and_build windows
     (cd "$top" && with_wine ctest --preset windows)
+}
+
+# bench_windows FLAG…: runs the benchmarks that only compute on both systems, and prints the best time of each under
+# Wine over that on Linux.
+bench_windows() {
+    local flags=("$@" --benchmark_out_format=csv) linux=$top/build/bench windows=$top/build/windows-bench names
+    prepare_windows windows-bench benchmark
+    configure_and_build bench
+    configure_and_build windows-bench
+    with_wine /usr/lib/wine/wine64 "$windows/benchmarks/zanbase_bench.exe" "${flags[@]}" \
+        --benchmark_out="$windows/times.csv" </dev/null
+    names=$(sed -n 's/^"\([^"]*\)".*/\1/p' "$windows/times.csv" | sort -u | sed 's/[][().+*?^$|]/\\&/g' | paste -sd '|')
+    "$linux/benchmarks/zanbase_bench" "${flags[@]}" --benchmark_out="$linux/times.csv" \
+        --benchmark_filter="^($names)\$"
+    printf '\n%-60s %s\n' 'time under Wine over' Linux
+    awk -F '"' '
+        FNR == 1 { system_number += 1 }
+        /^"/ && $2 !~ /_(mean|median|stddev|cv)$/ {
+            split($3, fields, ",")  # the count of iterations is field 2, the time is field 3
+            if (!((system_number, $2) in best) || fields[3] < best[system_number, $2]) best[system_number, $2] = fields[3]
+            names[$2]
+        }
+        END {
+            for (name in names)
+                if ((2, name) in best) printf "%-60s %5.2f\n", name, best[1, name] / best[2, name]
+        }
+    ' "$windows/times.csv" "$linux/times.csv" | sort
 }

@@ -15,3 +15,8 @@ set(ZANBASE_PLATFORM_SOURCES
 find_package(Intl REQUIRED)
 set_property(TARGET Intl::Intl PROPERTY IMPORTED_GLOBAL TRUE)  # for the tests too
 set(ZANBASE_PLATFORM_LIBRARIES Intl::Intl)
+
+set(CMAKE_SHARED_LIBRARY_PREFIX "")  # zanbase.dll
+
+# Without exceptions each operation of the lock ends in a jump to the system's, and needs no frame.
+set_source_files_properties(platform/windows/lock.cpp PROPERTIES COMPILE_OPTIONS -fno-exceptions)
