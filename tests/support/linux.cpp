@@ -1,4 +1,6 @@
 // The helpers of environment.h, blocked_thread.h and run_in_child.h on Linux.
+#include <semaphore.h>
+#include <signal.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -11,6 +13,13 @@
 #include "support/run_in_child.h"
 
 const bool kConditionOutlivesKills = true;
+const bool kExhaustedStackIsAFault = true;
+extern "C" __attribute__((weak)) void __tsan_init();  // defined under the thread sanitizer
+const bool kKillRunsTlsDestructors = __tsan_init != nullptr;
+
+namespace {
+sem_t held, released;
+}
 
 void SetEnvironment(const char* name, const char* value) {
     if (value == nullptr) {
@@ -28,6 +37,19 @@ void AwaitSleepOf(unsigned long long thread) {
         status >> number >> name >> state;
     }
 }
+
+void HoldThread(unsigned long long thread) {
+    sem_init(&held, 0, 0);
+    sem_init(&released, 0, 0);
+    signal(SIGUSR1, [](int) {
+        sem_post(&held);
+        while (sem_wait(&released) != 0) continue;
+    });
+    tgkill(getpid(), static_cast<pid_t>(thread), SIGUSR1);
+    while (sem_wait(&held) != 0) continue;
+}
+
+void ReleaseThread(unsigned long long) { sem_post(&released); }
 
 ChildResult RunInChild(const std::function<int()>& body) {
     std::FILE* const files[] = {std::tmpfile(), std::tmpfile()};

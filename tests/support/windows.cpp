@@ -59,6 +59,16 @@ int RunThisTestAgain(std::FILE* const (&files)[2]) {
     return static_cast<int>(code);
 }
 
+struct Thread {
+    explicit Thread(unsigned long long id)
+        : handle(OpenThread(THREAD_SUSPEND_RESUME | THREAD_GET_CONTEXT, FALSE, static_cast<DWORD>(id))) {}
+    ~Thread() { CloseHandle(handle); }
+    Thread(const Thread&) = delete;
+    Thread& operator=(const Thread&) = delete;
+
+    const HANDLE handle;
+};
+
 // Whether the thread is inside one of the system's waits: at the instruction behind the call of the kernel.
 bool IsInWait(HANDLE thread) {
     static const char* const kWaits[] = {"NtWaitForSingleObject", "NtWaitForMultipleObjects",
@@ -80,15 +90,19 @@ bool IsInWait(HANDLE thread) {
 }  // namespace
 
 const bool kConditionOutlivesKills = false;
+const bool kExhaustedStackIsAFault = false;  // Wine ends the process
+const bool kKillRunsTlsDestructors = false;
 
 void SetEnvironment(const char* name, const char* value) { _putenv_s(name, value != nullptr ? value : ""); }
 
 void AwaitSleepOf(unsigned long long thread) {
-    const HANDLE handle =
-        OpenThread(THREAD_SUSPEND_RESUME | THREAD_GET_CONTEXT, FALSE, static_cast<DWORD>(thread));
-    while (!IsInWait(handle)) std::this_thread::yield();
-    CloseHandle(handle);
+    const Thread one(thread);
+    while (!IsInWait(one.handle)) std::this_thread::yield();
 }
+
+void HoldThread(unsigned long long thread) { SuspendThread(Thread(thread).handle); }
+
+void ReleaseThread(unsigned long long thread) { ResumeThread(Thread(thread).handle); }
 
 ChildResult RunInChild(const std::function<int()>& body) {
     constexpr int kAbortCode = 3;

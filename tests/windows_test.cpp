@@ -1,0 +1,100 @@
+// What the back end for Windows promises beyond the contracts: priorities, handles, and the system's texts.
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <random>
+#include <thread>
+#include <vector>
+
+#include "platform/thread.h"
+#include "support/runner.h"
+#include "zanbase/semaphore.h"
+
+#define WIN32_LEAN_AND_MEAN
+#include <windows.h>
+
+namespace {
+
+TEST(WindowsThread, TakesItsPriorityWheneverItIsSet) {
+    const int priorities[] = {-15, -2, -1, 0, 1, 2, 15, 0};
+    const HSemaphore started(0), leave(0);
+    unsigned long long id = 0;
+    Runner runner([&] {
+        id = HThread::GetCurrentThreadId();
+        started.Unlock();
+        leave.Lock();
+    });
+    for (unsigned int step = 0; step < 16; ++step) {
+        const auto priority = static_cast<HThreadPriority>(step / 2);
+        runner.SetPriority(step % 2 == 0 ? priority : HThreadPriorityNormal);
+        runner.Start(true);
+        started.Lock();
+        runner.SetPriority(priority);
+        const HANDLE handle = OpenThread(THREAD_QUERY_INFORMATION, FALSE, static_cast<DWORD>(id));
+        EXPECT_EQ(GetThreadPriority(handle), priorities[priority]) << step;
+        CloseHandle(handle);
+        leave.Unlock();
+        runner.Wait();
+    }
+}
+
+TEST(WindowsThread, TellsErrorsAsTheSystemDoes) {
+    const std::string text = SystemErrorText(ERROR_ACCESS_DENIED);
+    EXPECT_GT(text.size(), 2U);
+    EXPECT_EQ(text.substr(text.size() - 2), "\r\n");
+    EXPECT_EQ(SystemErrorText(-1), "");
+}
+
+// The number of a new handle; the system takes those again that were closed.
+std::uintptr_t NextHandle() {
+    const HANDLE handle = CreateEventA(nullptr, FALSE, FALSE, nullptr);
+    CloseHandle(handle);
+    return reinterpret_cast<std::uintptr_t>(handle);
+}
+
+TEST(WindowsThread, LeavesNoHandleBehind) {
+    Runner quick([] {}), endless([] {
+        for (;;) std::this_thread::yield();
+    });
+    std::uintptr_t before = 0;
+    for (int round = 0; round < 60; ++round) {
+        if (round == 10) before = NextHandle();
+        quick.RunToEnd();
+        endless.Start(true);
+        endless.Kill();
+    }
+    EXPECT_LE(NextHandle(), before);
+}
+
+// Bodies that hold nothing, since a killed thread would keep it.
+TEST(WindowsThread, IsStartedKilledAndAwaitedFromAllSides) {
+    std::atomic<int> entered{0};
+    Runner runner([&] {
+        for (const int last = ++entered + 50; entered < last;) std::this_thread::yield();
+    });
+    std::atomic<bool> is_operated{false};  // keeps a start and a kill apart
+    std::vector<std::thread> operators;
+    for (unsigned int seed = 1; seed <= 4; ++seed) {
+        operators.emplace_back([&, seed] {
+            std::minstd_rand random(seed);
+            for (int round = 0; round < 300; ++round) {
+                if (random() % 4 == 0) entered += 50;
+                runner.SetPriority(static_cast<HThreadPriority>(random() % 8));
+                while (is_operated.exchange(true)) std::this_thread::yield();
+                if (random() % 3 == 0) {
+                    runner.Kill();
+                    EXPECT_FALSE(runner.IsRunning());
+                } else {
+                    runner.Start(true);
+                }
+                is_operated = false;
+            }
+        });
+    }
+    for (std::thread& each : operators) each.join();
+    entered += 50;
+    runner.Wait();
+    EXPECT_FALSE(runner.IsRunning());
+}
+
+}  // namespace
