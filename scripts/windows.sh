@@ -36,11 +36,26 @@ with_wine() {
     return $status
 }
 
+# TESTS|REASON: tests (an expression for ctest) that are left out. Others say by themselves that they skip.
+windows_skips="\
+RecordedFile\.TellsFailures.*|a full device, and the errors of a folder, are the other system's
+examples/adapters_operator_new|the DLL of the C++ library does not see operators that a program replaces
+examples/adapters_recorded_file|its flags are those of POSIX, without O_BINARY: line ends change"
+
 run_windows_lane() {
+    local tests reason number without=() told=()
     echo '== windows'
     prepare_windows windows
     configure_and_build windows
-    (cd "$top" && with_wine ctest --preset windows)
+    cd "$top"
+    while IFS='|' read -r tests reason; do
+        number=$(ctest --preset windows -N -R "$tests" | sed -n 's/^Total Tests: //p')
+        [ "$number" -gt 0 ] || fail "no test is called $tests; see scripts/windows.sh"
+        without+=("$tests")
+        told+=("left out: $number of $tests: $reason")
+    done <<<"$windows_skips"
+    with_wine ctest --preset windows -E "^($(IFS='|' && echo "${without[*]}"))\$"
+    printf '%s\n' "${told[@]}"
 }
 
 # bench_windows FLAG…: runs the benchmarks that only compute on both systems, and prints the best time of each under
