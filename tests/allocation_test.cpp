@@ -6,17 +6,17 @@
 #include <csignal>
 #include <cstring>
 
-#include "support/failing_allocation.h"
 #include "support/run_in_child.h"
 
 namespace {
 
-int attempts = 0, handled = 0;
+int attempts = 0, attempts_to_fail = 0, handled = 0;
 bool fails_by_exception = false;
 
 bool Fails() {
     ++attempts;
-    if (!AttemptFails()) return false;
+    if (attempts_to_fail == 0) return false;
+    --attempts_to_fail;
     return fails_by_exception ? throw std::bad_alloc() : true;
 }
 

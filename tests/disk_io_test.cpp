@@ -7,7 +7,6 @@
 #include <sstream>
 
 #include "diskio/disk_io_report_text.h"
-#include "support/failing_allocation.h"
 #include "support/held_stream.h"
 #include "support/run_in_child.h"
 #include "zanbase/string_makers.h"
@@ -64,18 +63,6 @@ TEST(DiskIO, MakesTheLedgerAtTheFirstCallThatNeedsIt) {
         });
         EXPECT_EQ(child.exit_code, 0) << script << child.out;
     }
-}
-
-// A binding may exist before the record, and then seeks are dropped. The other thread would block for ever if
-// the mutex stayed locked.
-TEST(DiskIO, StaysSoundWhenMemoryRunsOut) {
-    const auto seek = [] { std::thread(Play, "s1").join(); };
-    FailAtEachNew([] { HDiskIOOpen("a", At('1'), 1); }, seek);
-    FailAtEachNew([] { HDiskIOOpen("b", At('1'), 1); }, seek);
-    const int failures = FailAtEachNew(HDiskIOPush, seek);
-    HDiskIOPop();
-    EXPECT_EQ(State(), MkString("a:1/0/0 0(0)0 0(0)0; b:1/0/%d 0(0)0 0(0)0; 1=b", failures));
-    HDiskIOReset();
 }
 
 // Threads that make the first call at once share one ledger.

@@ -7,7 +7,6 @@
 #include <iostream>
 
 #include "platform/clock.h"
-#include "support/failing_allocation.h"
 #include "support/run_in_child.h"
 #include "zanbase/openmp.h"
 
@@ -54,18 +53,6 @@ void ReportGrowingTeams() {
     }
 }
 
-void ReportAfterShortages() {
-    const auto insist = [](auto step) { return FailAtEachNew(step, [] {}); };
-    OMPSetMaxThreads(1);
-    int failures = 0;
-    for (unsigned long long timer = 0; timer < 9; ++timer) {
-        failures += insist([] { Timers().RegisterNewTimer("t"); });
-#pragma omp parallel num_threads(3)
-        if (OMPGetThreadNum() == 2) failures += insist([=] { Spend(timer, timer < 8 ? 0 : 1000); });
-    }
-    std::cout << (failures >= 20 ? "" : "few failures\n");
-}
-
 TEST(GlobalTimer, Reports) {
     const std::pair<void (*)(), std::string> rows[] = {
         {[] { Timers().RegisterNewTimer("a"), Timers().Report(), std::_Exit(0); }, "a: 0\n"},
@@ -73,7 +60,6 @@ TEST(GlobalTimer, Reports) {
          "0 1 2 3 4 never: 0\none: 0\none: 1\ntwo: 2\nthree: 3\n"
          "never: 0\none: 2\ntwo: 2\nthree: 3\none: 1.23457e+09\n"
          "one: 0\ntwo: 0\nnever: 0\none: 0\nthree: 0.02\n"},
-        {ReportAfterShortages, "t: 0\nt: 0\nt: 0\nt: 0\nt: 0\nt: 0\nt: 0\nt: 0\nt: 1\n"},
         {ReportGrowingTeams, "timer: 176\n"}};
     for (const auto& [program, output] : rows) {
         const ChildResult child = RunInChild([&, run = program] { return run(), 0; });

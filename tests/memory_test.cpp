@@ -3,7 +3,6 @@
 
 #include <map>
 
-#include "support/failing_allocation.h"
 #include "support/held_stream.h"
 #include "zanbase/memory_tables.h"
 #include "zanbase/string_makers.h"
@@ -112,19 +111,6 @@ TEST_F(Tracker, FollowsADerivedClassThatChangesTheUsageTable) {
     FileMap().swap(*mpoFileMap);
     Add(1, 5, kTable, 1);
     EXPECT_EQ(Usage(), "table:1 +5 in 1 -0 in 0; ");
-}
-
-// In the second round the nodes of freed blocks are used again: only the growth of the table can fail.
-TEST_F(Tracker, StaysSoundWhenItsMemoryRunsOut) {
-    int blocks = 0;
-    const auto check = [&] { EXPECT_EQ(mnTotalMemory, blocks); };
-    for (int round = 0; round < 2; ++round) {
-        for (blocks = 0; blocks < 60; ++blocks) FailAtEachNew([&] { Add(blocks, 1, kTable, blocks); }, check);
-        FailAtEachNew(Push, check);
-        Pop();
-        EXPECT_EQ(mpoMemoryMap->size(), 60);
-        while (blocks > 0) Drop(--blocks);
-    }
 }
 
 // In bursts that use up the spare nodes and the remembered sites, with reports in between.

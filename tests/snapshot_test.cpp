@@ -6,7 +6,6 @@
 
 #include <thread>
 
-#include "support/failing_allocation.h"
 #include "zanbase/disk_io.h"
 #include "zanbase/global_timer.h"
 #include "zanbase/memory.h"
@@ -118,19 +117,6 @@ TEST(GlobalTimerSnapshot, SubtractsAndAddsThreadByThread) {
     ASSERT_EQ(sum.maRows.size(), 2U);
     EXPECT_EQ(sum.maRows[1].mdSeconds, 3.5);
     EXPECT_THAT(sum.maRows[1].maThreadSeconds, ElementsAre(1.5, 2));
-}
-
-// A lock that stayed held would keep the other thread for ever.
-TEST(Snapshots, HoldNoLockAfterMemoryRanOut) {
-    const std::string long_name(100, 'n');
-    HMemory::Alloc(&blocks[0], 10, long_name.c_str(), 1);
-    HDiskIOOpen(long_name, &blocks[0], 1);
-    const auto seek = [] { std::thread(HDiskIOSeek, &blocks[0], 1.0).join(); };
-    const auto free = [] { std::thread(HMemory::Free, &blocks[0]).join(); };
-    EXPECT_GE(FailAtEachNew([] { (void)HMemorySnapshot::Take(); }, free), 1);
-    EXPECT_GE(FailAtEachNew([] { (void)HDiskIOSnapshot::Take(); }, seek), 1);
-    HMemory::Reset();
-    HDiskIOReset();
 }
 
 }  // namespace
