@@ -53,13 +53,22 @@ void ReportGrowingTeams() {
     }
 }
 
+// Timers are registered while the other members of the team toggle theirs.
+void ReportTimersOfATeam() {
+#pragma omp parallel num_threads(4)
+    for (int round = 0; round < 100; ++round) Spend(Timers().RegisterNewTimer("t"), 2);
+}
+
 TEST(GlobalTimer, Reports) {
+    std::string four_hundred;
+    for (int timer = 0; timer < 400; ++timer) four_hundred += "t: 0.002\n";
     const std::pair<void (*)(), std::string> rows[] = {
         {[] { Timers().RegisterNewTimer("a"), Timers().Report(), std::_Exit(0); }, "a: 0\n"},
         {ReportInOrder,
          "0 1 2 3 4 never: 0\none: 0\none: 1\ntwo: 2\nthree: 3\n"
          "never: 0\none: 2\ntwo: 2\nthree: 3\none: 1.23457e+09\n"
          "one: 0\ntwo: 0\nnever: 0\none: 0\nthree: 0.02\n"},
+        {ReportTimersOfATeam, four_hundred},
         {ReportGrowingTeams, "timer: 176\n"}};
     for (const auto& [program, output] : rows) {
         const ChildResult child = RunInChild([&, run = program] { return run(), 0; });

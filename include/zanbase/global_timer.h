@@ -14,7 +14,7 @@ struct GlobalTimerSnapshot;
 
 /// The process's flat list of cumulative timers. There is one instance.
 ///
-///     const auto load = GlobalTimer::GetInstance().RegisterNewTimer("load");  // before any parallel region
+///     const auto load = GlobalTimer::GetInstance().RegisterNewTimer("load");
 ///     #pragma omp parallel
 ///     {
 ///         GlobalTimer::GetInstance().Toggle(load);   // starts it on this thread
@@ -48,9 +48,8 @@ public:
     static GlobalTimer& GetInstance();
 
     /// Adds a timer and returns its identifier; identifiers count up from 0. Names need not differ: each
-    /// registration is a timer of its own. `std::bad_alloc` leaves the timers as they were. Not thread-safe.
-    /// Requires: no other call is in progress. A static variable of a function that a team calls is
-    /// initialised inside the team: register outside.
+    /// registration is a timer of its own. `std::bad_alloc` leaves the timers as they were. Thread-safe, also
+    /// while other threads register and toggle. Requires: no `Report` and no `ResetAll` is in progress.
     unsigned long long RegisterNewTimer(std::string name);
 
     /// Starts timer `id` on the calling thread's number if it is stopped there; otherwise stops it and adds

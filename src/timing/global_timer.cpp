@@ -51,7 +51,8 @@ struct GlobalTimer::Impl {
 
     double TotalOf(unsigned long long id) const {
         double total = 0.0;
-        for (const auto& row : moRows.Rows()) total += static_cast<double>((*row)[id].mnElapsed);
+        for (std::size_t row = 0; row < moRows.RowCount(); ++row)
+            total += static_cast<double>(moRows.At(row, id).mnElapsed);
         return total;
     }
 
@@ -67,7 +68,7 @@ struct GlobalTimer::Impl {
     }
 
     RowTable<TimerSlot> moRows;  // row t belongs to OpenMP thread number t; slot i of each to timer i
-    std::map<unsigned long long, std::string> moNames;
+    std::map<unsigned long long, std::string> moNames;  // guarded by goTimerGrowthMutex, except in Report
 };
 
 GlobalTimer& GlobalTimer::GetInstance() {
@@ -82,22 +83,22 @@ GlobalTimer::~GlobalTimer() { delete mpoImpl; }
 GlobalTimer& GlobalTimer::operator=(const GlobalTimer&) = default;
 
 unsigned long long GlobalTimer::RegisterNewTimer(std::string name) {
-    const unsigned long long id = mpoImpl->moRows.RowLength();
-    mpoImpl->moRows.ReserveSlot();
+    const HMutexLock lock(&goTimerGrowthMutex);
+    const unsigned long long id = mpoImpl->moNames.size();
+    mpoImpl->moRows.GrowTo(mpoImpl->moRows.RowCount(), id + 1);
     mpoImpl->moNames.emplace(id, std::move(name));
-    mpoImpl->moRows.AddSlot();
     return id;
 }
 
 void GlobalTimer::Toggle(unsigned long long id) {
     RowTable<TimerSlot>& rows = mpoImpl->moRows;
     const auto thread = static_cast<std::size_t>(OMPGetThreadNum());
-    if (thread >= rows.Rows().size()) {
+    if (thread >= rows.RowCount()) {
         const HMutexLock lock(&goTimerGrowthMutex);
-        rows.GrowTo(thread + 1);
+        rows.GrowTo(thread + 1, mpoImpl->moNames.size());
     }
     const unsigned long long now = ReadClock();
-    TimerSlot& slot = (*rows.Rows()[thread])[id];
+    TimerSlot& slot = rows.At(thread, id);
     if (slot.moStart.has_value()) {
         slot.mnElapsed += now - *slot.moStart;
         slot.moStart.reset();
@@ -109,19 +110,23 @@ void GlobalTimer::Toggle(unsigned long long id) {
 void GlobalTimer::Report() const { mpoImpl->Report(); }
 
 void GlobalTimer::ResetAll() {
-    for (const auto& row : mpoImpl->moRows.Rows()) std::fill(row->begin(), row->end(), TimerSlot());
+    const RowTable<TimerSlot>& rows = mpoImpl->moRows;
+    for (std::size_t row = 0; row < rows.RowCount(); ++row)
+        for (const auto& [id, name] : mpoImpl->moNames) rows.At(row, id) = TimerSlot();
 }
 
 GlobalTimerSnapshot GlobalTimerSnapshot::Take() {
     const GlobalTimer::Impl& timers = *GlobalTimer::GetInstance().mpoImpl;
     GlobalTimerSnapshot snapshot;
+    const HMutexLock lock(&goTimerGrowthMutex);
     snapshot.maRows.reserve(timers.moNames.size());
     for (const auto& [id, name] : timers.moNames) {
         Row& row = snapshot.maRows.emplace_back();
         row.moName = name;
         row.mdSeconds = timers.TotalOf(id) / 1000000.0;
-        for (const auto& slots : timers.moRows.Rows())
-            row.maThreadSeconds.push_back(static_cast<double>((*slots)[id].mnElapsed) / 1000000.0);
+        for (std::size_t thread = 0; thread < timers.moRows.RowCount(); ++thread)
+            row.maThreadSeconds.push_back(static_cast<double>(timers.moRows.At(thread, id).mnElapsed) /
+                                          1000000.0);
     }
     return snapshot;
 }

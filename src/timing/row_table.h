@@ -1,87 +1,78 @@
-// Rows of slots, one row a thread: rows stay where they are while the table grows under their threads' hands.
+// Rows of slots, one row a thread: slots stay where they are while the table grows and threads use it.
 //
-//   mpoTable -> newest table -> row 0, row 1, …      (maTables keeps the older tables, which have the same
-//                                                    rows: a thread may still be reading them)
+//   mpoTable -> newest table -> segments of row 0, segments of row 1, …   (each a block of kSegmentSlots slots;
+//                                                                          older tables have the same segments)
 //
-// - A row is written by its own thread, or by whoever has the whole table for himself.
-// - A table is not changed once mpoTable has pointed at it; a longer one takes its place.
-// - All rows of the newest table have the same length.
-// - Slots of different rows lie in different cache lines, two lines apart: processors fetch them in pairs.
+// - A slot is written by the thread of its row, or with exclusive access to the table.
+// - A table is not changed once mpoTable points at it. A larger one takes its place, and the older ones stay,
+//   because a thread may still be reading them.
+// - Segments start and end at pairs of cache lines, which processors fetch together, so rows share none.
 #ifndef ZANBASE_TIMING_ROW_TABLE_H
 #define ZANBASE_TIMING_ROW_TABLE_H
 
 #include <algorithm>
+#include <array>
 #include <atomic>
 #include <cstddef>
 #include <deque>
 #include <memory>
-#include <new>
 #include <vector>
 
 #include "zanbase/mutex.h"
 
-// Held while Toggle adds rows, and for nothing else.
+// Held while rows or timers are added.
 extern HMutex& goTimerGrowthMutex;  // built in load_time.cpp, never destroyed
-
-// Gives out whole pairs of cache lines.
-template <class T>
-struct LinePairs {
-    using value_type = T;
-
-    LinePairs() = default;
-    template <class Other>
-    LinePairs(const LinePairs<Other>&) noexcept {}
-
-    T* allocate(std::size_t count) {
-        const std::size_t bytes = (count * sizeof(T) + kBytes - 1) / kBytes * kBytes;
-        return static_cast<T*>(::operator new(bytes, std::align_val_t(kBytes)));
-    }
-    void deallocate(T* block, std::size_t) noexcept { ::operator delete(block, std::align_val_t(kBytes)); }
-
-    friend bool operator==(const LinePairs&, const LinePairs&) { return true; }
-    friend bool operator!=(const LinePairs&, const LinePairs&) { return false; }
-
-private:
-    static constexpr std::size_t kBytes = 128;
-};
 
 // What throws std::bad_alloc here has changed nothing that can be seen.
 template <class Slot>
 class RowTable {
 public:
-    using Row = std::vector<Slot, LinePairs<Slot>>;
-    using Table = std::vector<std::shared_ptr<Row>>;
+    explicit RowTable(std::size_t rows) : maTables(1), mpoTable(&maTables.front()) { GrowTo(rows, 0); }
 
-    explicit RowTable(std::size_t rows) : maTables(1), mpoTable(&maTables.front()) { GrowTo(rows); }
+    // Any thread.
+    std::size_t RowCount() const { return Newest().mnRows; }
 
-    // The newest table. Any thread.
-    const Table& Rows() const { return *mpoTable.load(std::memory_order_acquire); }
+    // Requires: the call of GrowTo that made the slot happens-before this one.
+    Slot& At(std::size_t row, std::size_t slot) const {
+        const Table& table = Newest();
+        const auto& segment = table.maSegments[row * table.mnRowSegments + slot / kSegmentSlots];
+        return segment->maSlots[slot % kSegmentSlots];
+    }
 
-    std::size_t RowLength() const { return Rows().empty() ? 0 : Rows().front()->size(); }
-
-    // Adds rows as long as the first, with fresh slots, until there are `count`. One thread at a time, while
-    // others may use their rows; a table that is long enough is left alone.
-    void GrowTo(std::size_t count) {
-        Table longer = Rows();
-        if (longer.size() >= count) return;
-        while (longer.size() < count) longer.push_back(std::make_shared<Row>(RowLength()));
-        maTables.push_back(std::move(longer));
+    // Adds fresh slots until there are `rows` rows of at least `slots` slots. One thread at a time, while others
+    // may use their rows; a table that is large enough is left alone.
+    void GrowTo(std::size_t rows, std::size_t slots) {
+        const Table& old = Newest();
+        const std::size_t row_segments = (slots + kSegmentSlots - 1) / kSegmentSlots;
+        if (rows <= old.mnRows && row_segments <= old.mnRowSegments) return;
+        Table larger{std::max(rows, old.mnRows), std::max(row_segments, old.mnRowSegments), {}};
+        for (std::size_t row = 0; row < larger.mnRows; ++row) {
+            for (std::size_t index = 0; index < larger.mnRowSegments; ++index) {
+                const bool is_old = row < old.mnRows && index < old.mnRowSegments;
+                larger.maSegments.push_back(is_old ? old.maSegments[row * old.mnRowSegments + index]
+                                                   : std::make_shared<Segment>());
+            }
+        }
+        maTables.push_back(std::move(larger));
         mpoTable.store(&maTables.back(), std::memory_order_release);
     }
 
-    // Makes room for one more slot in each row, so that the next AddSlot can't fail. With nothing else going
-    // on.
-    void ReserveSlot() {
-        for (const auto& row : Rows())
-            if (row->size() == row->capacity()) row->reserve(std::max<std::size_t>(2 * row->size(), 8));
-    }
-
-    void AddSlot() {
-        for (const auto& row : Rows()) row->emplace_back();
-    }
-
 private:
-    std::deque<Table> maTables;          // guarded by whatever keeps growth to one thread; adding moves none
+    static constexpr std::size_t kSegmentSlots = 64;
+
+    struct alignas(128) Segment {
+        std::array<Slot, kSegmentSlots> maSlots;
+    };
+
+    struct Table {
+        std::size_t mnRows = 0;
+        std::size_t mnRowSegments = 0;  // segments of each row
+        std::vector<std::shared_ptr<Segment>> maSegments;
+    };
+
+    const Table& Newest() const { return *mpoTable.load(std::memory_order_acquire); }
+
+    std::deque<Table> maTables;          // guarded by what keeps growth to one thread; adding moves none
     std::atomic<const Table*> mpoTable;  // never null
 };
 
