@@ -39,8 +39,7 @@ with_wine() {
 # TESTS|REASON: tests (an expression for ctest) that are left out. Others say by themselves that they skip.
 windows_skips="\
 RecordedFile\.TellsFailures.*|a full device, and the errors of a folder, are the other system's
-examples/adapters_operator_new|the DLL of the C++ library does not see operators that a program replaces
-examples/adapters_recorded_file|its flags are those of POSIX, without O_BINARY: line ends change"
+examples/adapters_operator_new|the DLL of the C++ library does not see operators that a program replaces"
 
 run_windows_lane() {
     local tests reason number without=() told=()

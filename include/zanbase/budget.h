@@ -1,5 +1,23 @@
 /// @file
 /// Budgets for tests: scopes that say whether memory or disk operations stayed within a limit, and where not.
+///
+/// A budget counts from its construction. It says `true` or `false` and gives a text, so it serves in any test
+/// framework:
+///
+///     HMemoryBudget budget;
+///     budget.LimitLiveBytes(0).LimitAllocations(100);
+///     ParseFile("big.txt");
+///     EXPECT_TRUE(budget.Check()) << budget.GetText();
+///
+///     live bytes: 640, limit 0
+///       src/parse.cpp:57: 640
+///
+/// A limit that was not set is not checked. Limits are in bytes or calls; a limit is kept by a figure that is
+/// equal to it. The accounts belong to the whole process: what other threads record counts too. Only what is
+/// fed to the accounts counts. `Check` takes a snapshot; see zanbase/snapshot.h for what that costs and needs.
+/// One budget is used by one thread at a time.
+///
+/// Requires: within the scope nothing calls `Push`, `Pop` or a reset of the account.
 #ifndef ZANBASE_BUDGET_H
 #define ZANBASE_BUDGET_H
 
@@ -8,23 +26,8 @@
 #include "zanbase/export.h"
 #include "zanbase/snapshot.h"
 
-// A budget counts from its construction. It says `true` or `false` and gives a text, so it serves in any test
-// framework:
-//
-//     HMemoryBudget budget;
-//     budget.LimitLiveBytes(0).LimitAllocations(100);
-//     ParseFile("big.txt");
-//     EXPECT_TRUE(budget.Check()) << budget.GetText();
-//
-//     live bytes: 640, limit 0
-//       src/parse.cpp:57: 640
-//
-// A limit that was not set is not checked. Limits are in bytes or calls; a limit is kept by a figure that is
-// equal to it. The accounts belong to the whole process: what other threads record counts too. Only what is
-// fed to the accounts counts. `Check` takes a snapshot; see zanbase/snapshot.h for what that costs and needs.
-// One budget is used by one thread at a time.
-//
-// Requires: within the scope nothing calls `Push`, `Pop` or a reset of the account.
+/// @addtogroup snapshots
+/// @{
 
 /// A limit that nothing exceeds.
 constexpr long long kNoLimit = 0x7FFFFFFFFFFFFFFF;
@@ -94,5 +97,7 @@ private:
     long long mnBytesReadLimit = kNoLimit;
     std::string moText;
 };
+
+/// @}
 
 #endif

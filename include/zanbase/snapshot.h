@@ -1,6 +1,27 @@
 /// @file
 /// The three accounts (tracker, disk ledger, timers) as values that can be compared, added up and written.
 /// Not part of zanbase/zanbase.h: a program that only feeds the accounts has no use for it.
+///
+/// A snapshot is a plain value: it owns its texts, shares nothing with the account, and any code may fill one.
+///
+///     const HMemorySnapshot before = HMemorySnapshot::Take();
+///     Work();
+///     for (const auto& row : HMemorySnapshot::Take().Since(before).maRows)
+///         std::printf("%s:%d %+lld bytes\n", row.moFile.c_str(), row.mnLine, row.mnLiveBytes);
+///
+/// `Take` copies one state of the account and changes nothing. `Since` gives the difference of two snapshots:
+/// every figure is that of this snapshot less that of `earlier`, and rows without a difference are left out.
+/// `Merge` adds every figure of `other`. Both match rows by the text of their key (call site, file or timer
+/// name), so rows of one snapshot with equal keys become one; the rows of the result are in the order of their
+/// keys. So `earlier.Merge(later.Since(earlier))` gives the figures of `later`.
+///
+/// Figures are signed, because differences can be negative, and wrap at 64 bits; a byte count of 2^63 or more
+/// shows as a negative number. If memory runs out, `std::bad_alloc` reaches the caller, no lock stays held, and
+/// the snapshots are unchanged. Different threads may use different snapshots at once; one snapshot is
+/// thread-safe for reading only.
+///
+/// A program whose `operator new` records in the tracker pauses that while it takes a snapshot; see
+/// `HTrackerPause` in zanbase/adapters/tracked_memory.h.
 #ifndef ZANBASE_SNAPSHOT_H
 #define ZANBASE_SNAPSHOT_H
 
@@ -11,27 +32,6 @@
 
 /// @addtogroup snapshots
 /// @{
-
-// A snapshot is a plain value: it owns its texts, shares nothing with the account, and any code may fill one.
-//
-//     const HMemorySnapshot before = HMemorySnapshot::Take();
-//     Work();
-//     for (const auto& row : HMemorySnapshot::Take().Since(before).maRows)
-//         std::printf("%s:%d %+lld bytes\n", row.moFile.c_str(), row.mnLine, row.mnLiveBytes);
-//
-// `Take` copies one state of the account and changes nothing. `Since` gives the difference of two snapshots:
-// every figure is that of this snapshot less that of `earlier`, and rows without a difference are left out.
-// `Merge` adds every figure of `other`. Both match rows by the text of their key (call site, file or timer
-// name), so rows of one snapshot with equal keys become one; the rows of the result are in the order of their
-// keys. So `earlier.Merge(later.Since(earlier))` gives the figures of `later`.
-//
-// Figures are signed, because differences can be negative, and wrap at 64 bits; a byte count of 2^63 or more
-// shows as a negative number. If memory runs out, `std::bad_alloc` reaches the caller, no lock stays held, and
-// the snapshots are unchanged. Different threads may use different snapshots at once; one snapshot is
-// thread-safe for reading only.
-//
-// A program whose `operator new` records in the tracker pauses that while it takes a snapshot; see
-// `HTrackerPause` in zanbase/adapters/tracked_memory.h.
 
 /// What the allocation tracker holds.
 struct HMemorySnapshot {

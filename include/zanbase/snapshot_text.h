@@ -1,5 +1,13 @@
 /// @file
 /// Snapshots as text for other programs: JSON, CSV, folded stacks and Chrome trace events.
+///
+/// Every writer flushes the stream and returns true if the stream took the whole text. It returns false if the
+/// stream failed, unless the stream is set to throw; then that exception reaches the caller. Writers use neither
+/// the stream's number format nor its locale, and write rows in the order of the snapshot. They are thread-safe
+/// for different streams. Open files as binary, so that line ends stay a single "\n" on every system.
+///
+///     std::ofstream file("memory.json", std::ios::binary);
+///     if (!HWriteJson(file, HMemorySnapshot::Take())) std::perror("memory.json");
 #ifndef ZANBASE_SNAPSHOT_TEXT_H
 #define ZANBASE_SNAPSHOT_TEXT_H
 
@@ -10,14 +18,6 @@
 
 /// @addtogroup snapshots
 /// @{
-
-// Every writer flushes the stream and returns true if the stream took the whole text. It returns false if the
-// stream failed, unless the stream is set to throw; then that exception reaches the caller. Writers use neither
-// the stream's number format nor its locale, and write rows in the order of the snapshot. They are thread-safe
-// for different streams. Open files as binary, so that line ends stay a single "\n" on every system.
-//
-//     std::ofstream file("memory.json", std::ios::binary);
-//     if (!HWriteJson(file, HMemorySnapshot::Take())) std::perror("memory.json");
 
 /// The version of the JSON documents. It grows when a member changes its meaning or is removed; new members
 /// can come without it, so readers ignore members that they don't know.

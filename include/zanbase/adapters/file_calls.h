@@ -48,7 +48,7 @@ private:
 
 /// How `HRecordedDescriptor` opens a file.
 struct HOpenMode {
-    int mnFlags = O_RDONLY;    ///< of `open`; on Windows with `O_BINARY`, unless line ends are to be changed
+    int mnFlags = O_RDONLY;    ///< of `open`; files are always binary, also where a system has text files
     int mnPermissions = 0666;  ///< of a new file
 };
 
@@ -59,7 +59,11 @@ struct HDescriptorCalls {
     static constexpr Native kClosed = -1;  ///< no file
     /// As `open`.
     static Native Open(const char* name, const Mode& mode) {
+#ifdef O_BINARY
+        return ::open(name, mode.mnFlags | O_BINARY, mode.mnPermissions);
+#else
         return ::open(name, mode.mnFlags, mode.mnPermissions);
+#endif
     }
     /// As `read`, in pieces of at most 1 GiB, which every system takes.
     static long long Read(Native file, void* block, std::size_t size) {

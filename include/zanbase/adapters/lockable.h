@@ -1,5 +1,26 @@
 /// @file
 /// The library's locks for the holders of the C++ standard library, annotated for clang's analysis.
+///
+/// Operations have the names and the case that the standard asks for, so std::unique_lock, std::scoped_lock,
+/// std::shared_lock and std::condition_variable_any take these locks:
+///
+///     HLockable mutex;
+///     std::condition_variable_any filled;
+///     std::unique_lock<HLockable> lock(mutex);
+///     filled.wait(lock, [] { return !jobs.empty(); });
+///
+/// clang's `-Wthread-safety` checks fields that are marked with `ZANBASE_GUARDED_BY`. It sees no lock in the
+/// holders of a standard library without annotations (GNU's has none); `HLockGuard` and `HSharedLockGuard`
+/// below are annotated:
+///
+///     int count ZANBASE_GUARDED_BY(mutex) = 0;
+///     void Add() {
+///         const HLockGuard guard(mutex);
+///         ++count;
+///     }
+///
+/// The program examples/adapters/lockable.cpp shows all of them. What a lock promises about fairness,
+/// re-entrance and killed threads is told at `HMutex` and `HReadWriteMutex`. Locks can't be copied or moved.
 #ifndef ZANBASE_ADAPTERS_LOCKABLE_H
 #define ZANBASE_ADAPTERS_LOCKABLE_H
 
@@ -9,27 +30,6 @@
 
 /// @addtogroup adapters
 /// @{
-
-// Operations have the names and the case that the standard asks for, so std::unique_lock, std::scoped_lock,
-// std::shared_lock and std::condition_variable_any take these locks:
-//
-//     HLockable mutex;
-//     std::condition_variable_any filled;
-//     std::unique_lock<HLockable> lock(mutex);
-//     filled.wait(lock, [] { return !jobs.empty(); });
-//
-// clang's `-Wthread-safety` checks fields that are marked with `ZANBASE_GUARDED_BY`. It sees no lock in the
-// holders of a standard library without annotations (GNU's has none); `HLockGuard` and `HSharedLockGuard`
-// below are annotated:
-//
-//     int count ZANBASE_GUARDED_BY(mutex) = 0;
-//     void Add() {
-//         const HLockGuard guard(mutex);
-//         ++count;
-//     }
-//
-// The program examples/adapters/lockable.cpp shows all of them. What a lock promises about fairness,
-// re-entrance and killed threads is told at `HMutex` and `HReadWriteMutex`. Locks can't be copied or moved.
 
 /// A `HMutex` as a lockable of the standard. It is re-entrant for its owner; a wait on a condition variable
 /// releases one level only, so the waiting thread must own it exactly once.

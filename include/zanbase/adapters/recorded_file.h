@@ -1,6 +1,34 @@
 /// @file
 /// Files whose every operation is measured and recorded in the disk ledger: over a `std::FILE*` and over a
 /// descriptor.
+///
+///     std::error_code error;
+///     HRecordedFile file = HRecordedFile::Open("run.dat", "rb", error);
+///     char block[4096];
+///     while (const std::size_t size = file.Read(block, sizeof block, error)) Use(block, size);
+///     if (error) std::fprintf(stderr, "run.dat: %s\n", error.message().c_str());
+///     HDiskIOReportFile(stdout, "run.dat");
+///
+/// What is recorded: each call that reached the system's or the C library's function and succeeded, with its
+/// time. A failed call is not recorded. So the count of reads includes the last one, which moves 0 bytes.
+///
+/// Errors: an operation sets its `error` on failure and clears it on success. A failed `Open` gives an object
+/// that is not open; operations on it fail with `bad_file_descriptor`.
+///
+/// Short and interrupted calls: `Read` may give less than was asked for, as the function below does, and 0 at
+/// the end of the file. `Write` writes all or fails; if the function below writes less, it is called again,
+/// and each call is recorded. A call that a signal interrupts before it did anything is made again.
+///
+/// After a read, a `HRecordedFile` needs a seek before it is written, and after a write before it is read, as C
+/// has it for every stream.
+///
+/// An object may be used by one thread at a time, different objects by different threads. Its handle in the
+/// ledger is a block of its own that is released after the close was recorded, so no other file can have
+/// the same handle in between. If the ledger has no memory for an open, the file is closed and `std::bad_alloc`
+/// reaches the caller.
+///
+/// examples/adapters/recorded_file.cpp shows them. For `std::istream` and `std::ostream` see
+/// zanbase/adapters/recorded_stream.h.
 #ifndef ZANBASE_ADAPTERS_RECORDED_FILE_H
 #define ZANBASE_ADAPTERS_RECORDED_FILE_H
 
@@ -17,34 +45,6 @@
 
 /// @addtogroup adapters
 /// @{
-
-//     std::error_code error;
-//     HRecordedFile file = HRecordedFile::Open("run.dat", "rb", error);
-//     char block[4096];
-//     while (const std::size_t size = file.Read(block, sizeof block, error)) Use(block, size);
-//     if (error) std::fprintf(stderr, "run.dat: %s\n", error.message().c_str());
-//     HDiskIOReportFile(stdout, "run.dat");
-//
-// What is recorded: each call that reached the system's or the C library's function and succeeded, with its
-// time. A failed call is not recorded. So the count of reads includes the last one, which moves 0 bytes.
-//
-// Errors: an operation sets its `error` on failure and clears it on success. A failed `Open` gives an object
-// that is not open; operations on it fail with `bad_file_descriptor`.
-//
-// Short and interrupted calls: `Read` may give less than was asked for, as the function below does, and 0 at
-// the end of the file. `Write` writes all or fails; if the function below writes less, it is called again,
-// and each call is recorded. A call that a signal interrupts before it did anything is made again.
-//
-// After a read, a `HRecordedFile` needs a seek before it is written, and after a write before it is read, as C
-// has it for every stream.
-//
-// An object may be used by one thread at a time, different objects by different threads. Its handle in the
-// ledger is a block of its own that is released after the close was recorded, so no other file can have
-// the same handle in between. If the ledger has no memory for an open, the file is closed and `std::bad_alloc`
-// reaches the caller.
-//
-// examples/adapters/recorded_file.cpp shows them. For `std::istream` and `std::ostream` see
-// zanbase/adapters/recorded_stream.h.
 
 /// Owns an open file, or nothing. Objects can be moved.
 template <class Calls>

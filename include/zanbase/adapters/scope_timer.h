@@ -1,5 +1,16 @@
 /// @file
 /// Scopes that add their time to a `GlobalTimer`.
+///
+///     void Load() {
+///         HTimedRegion("load");     // until the end of the scope
+///         …
+///     }
+///
+/// What holds for `GlobalTimer::Toggle` holds here: threads that OpenMP numbers alike, such as all threads
+/// outside of parallel regions, must not be in the same region at the same time; and a region that is entered
+/// again on the same thread before it was left stops the timer instead of nesting.
+///
+/// examples/adapters/scope_timer.cpp shows both forms.
 #ifndef ZANBASE_ADAPTERS_SCOPE_TIMER_H
 #define ZANBASE_ADAPTERS_SCOPE_TIMER_H
 
@@ -11,17 +22,6 @@
 
 /// @addtogroup adapters
 /// @{
-
-//     void Load() {
-//         HTimedRegion("load");     // until the end of the scope
-//         …
-//     }
-//
-// What holds for `GlobalTimer::Toggle` holds here: threads that OpenMP numbers alike, such as all threads
-// outside of parallel regions, must not be in the same region at the same time; and a region that is entered
-// again on the same thread before it was left stops the timer instead of nesting.
-//
-// examples/adapters/scope_timer.cpp shows both forms.
 
 /// Starts a timer on the calling thread and stops it at the end of the scope.
 class HTimerScope {

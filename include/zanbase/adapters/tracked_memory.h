@@ -1,6 +1,20 @@
 /// @file
 /// Memory that the allocation tracker knows of without a line of feeding: a memory resource, an allocator, an
 /// owning pointer, and what a replacement of the global `operator new` needs.
+///
+///     HTrackedResource memory;                          // blocks are recorded at this file and line
+///     std::pmr::vector<int> numbers(&memory);
+///
+///     std::vector<int, HTrackedAllocator<int>> more(HCallSite::Here());
+///     HTrackedPtr<Widget> widget = HMakeTracked<Widget>(HCallSite::Here(), 3, "three");
+///
+/// All of them record a block after it was allocated, and its end before it is given back, so no other thread
+/// can record the same address in between. If the tracker has no memory for a record, the block is given back
+/// and `std::bad_alloc` reaches the caller. If a free can't be recorded, the record stays. What is freed and
+/// was never recorded (because it was allocated during a pause, or the tables were reset) is given back all
+/// the same. Any thread may use any of them, where what they allocate from is thread-safe.
+///
+/// examples/adapters/tracked_memory.cpp shows these, examples/adapters/operator_new.cpp the replacement.
 #ifndef ZANBASE_ADAPTERS_TRACKED_MEMORY_H
 #define ZANBASE_ADAPTERS_TRACKED_MEMORY_H
 
@@ -22,20 +36,6 @@
 
 /// @addtogroup adapters
 /// @{
-
-//     HTrackedResource memory;                          // blocks are recorded at this file and line
-//     std::pmr::vector<int> numbers(&memory);
-//
-//     std::vector<int, HTrackedAllocator<int>> more(HCallSite::Here());
-//     HTrackedPtr<Widget> widget = HMakeTracked<Widget>(HCallSite::Here(), 3, "three");
-//
-// All of them record a block after it was allocated, and its end before it is given back, so no other thread
-// can record the same address in between. If the tracker has no memory for a record, the block is given back
-// and `std::bad_alloc` reaches the caller. If a free can't be recorded, the record stays. What is freed and
-// was never recorded (because it was allocated during a pause, or the tables were reset) is given back all
-// the same. Any thread may use any of them, where what they allocate from is thread-safe.
-//
-// examples/adapters/tracked_memory.cpp shows these, examples/adapters/operator_new.cpp the replacement.
 
 /// A call site for the tracker. The text must stay readable as long as the tracker holds it; texts of
 /// `__builtin_FILE` and of `std::source_location` do.
