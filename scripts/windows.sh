@@ -53,8 +53,8 @@ run_windows_lane() {
         without+=("$tests")
         told+=("left out: $number of $tests: $reason")
     done <<<"$windows_skips"
-    with_wine ctest --preset windows -E "^($(IFS='|' && echo "${without[*]}"))\$"
     printf '%s\n' "${told[@]}"
+    with_wine ctest --preset windows -E "^($(IFS='|' && echo "${without[*]}"))\$"
 }
 
 # bench_windows FLAG…: runs the benchmarks that only compute on both systems, and prints the best time of each under
