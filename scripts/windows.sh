@@ -2,7 +2,7 @@
 # To be sourced after common.sh.
 
 windows_packages=("${build_packages[@]}" g++-mingw-w64-x86-64-posix wine64 pkg-config googletest
-    nlohmann-json3-dev libvalijson-dev gettext dpkg-dev make xz-utils)
+    nlohmann-json3-dev libvalijson-dev gettext dpkg-dev make xz-utils xvfb)
 
 # prepare_windows PRESET [benchmark]: what a build with PRESET needs, and the environment of its programs under Wine.
 prepare_windows() {
@@ -18,10 +18,13 @@ prepare_windows() {
     export WINEPATH="Z:$top/build/windows-root/bin;Z:$top/build/$1/src"
 }
 
-# with_wine COMMAND…: runs COMMAND between the start and the end of a Wine server. The server and its service programs
-# get no descriptor of ours: they would keep locks and pipes of the caller in use.
+# with_wine COMMAND…: runs COMMAND between the start and the end of a Wine server, on a virtual display. The server and
+# its service programs get no descriptor of ours: they would keep locks and pipes of the caller in use.
 with_wine() {
-    local status=0
+    local status=0 display number descriptor
+    exec {display}< <(exec Xvfb -displayfd 1 2>/dev/null)
+    local screen=$!
+    if read -r number <&"$display"; then export DISPLAY=:$number; fi
     (
         for descriptor in /proc/self/fd/*; do
             descriptor=${descriptor##*/}
@@ -33,6 +36,8 @@ with_wine() {
     )
     "$@" || status=$?
     "$WINESERVER" -k -w || true
+    kill "$screen" 2>/dev/null || true
+    exec {display}<&-
     return $status
 }
 

@@ -1,5 +1,6 @@
-// What the back end for Windows promises beyond the contracts: priorities, handles, and the system's texts.
+// What the back end for Windows promises beyond the contracts: priorities, handles, the system's texts and its console.
 #include <gtest/gtest.h>
+#include <io.h>
 
 #include <cstdint>
 #include <random>
@@ -7,8 +8,10 @@
 #include <vector>
 
 #include "platform/thread.h"
+#include "support/run_in_child.h"
 #include "support/runner.h"
 #include "zanbase/semaphore.h"
+#include "zanbase/terminal.h"
 
 #define WIN32_LEAN_AND_MEAN
 #include <windows.h>
@@ -95,6 +98,41 @@ TEST(WindowsThread, IsStartedKilledAndAwaitedFromAllSides) {
     entered += 50;
     runner.Wait();
     EXPECT_FALSE(runner.IsRunning());
+}
+
+std::string FirstTextOnConsole(DWORD length) {
+    std::string text(length, ' ');
+    DWORD read = 0;
+    ReadConsoleOutputCharacterA(GetStdHandle(STD_OUTPUT_HANDLE), text.data(), length, {0, 0}, &read);
+    return text;
+}
+
+// The log is the error stream as it was before.
+int UseConsole() {
+    std::FILE* const log = _fdopen(_dup(2), "wb");
+    FreeConsole();
+    std::fclose(stdin);
+    std::printf("earlier");
+    const int created = CreateConsole();
+    if (GetConsoleWindow() == nullptr) return 0;
+    std::printf("text");
+    std::fprintf(log, "created %d, has %s, input %d, visible", created, FirstTextOnConsole(4).c_str(),
+                 std::getchar());
+    for (const int shown : {0, 1}) {
+        ShowConsole(shown);
+        std::fprintf(log, " %d", IsWindowVisible(GetConsoleWindow()));
+    }
+    std::fprintf(log, ", destroyed %d", DestroyConsole());
+    std::fprintf(log, ", late %d", std::printf("late"));
+    std::fclose(log);
+    return 0;
+}
+
+TEST(WindowsConsole, IsAWindowWithAllStreamsButAClosedOne) {
+    const ChildResult child = RunInChild(UseConsole);
+    if (child.err.empty()) GTEST_SKIP() << "there is no display for a window";
+    EXPECT_EQ(child.err, "created 1, has text, input -1, visible 0 1, destroyed 1, late 4");
+    EXPECT_EQ(child.out, "earlier");
 }
 
 }  // namespace
