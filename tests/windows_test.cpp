@@ -71,9 +71,10 @@ TEST(WindowsThread, LeavesNoHandleBehind) {
 
 // Bodies that hold nothing, since a killed thread would keep it.
 TEST(WindowsThread, IsStartedKilledAndAwaitedFromAllSides) {
-    std::atomic<int> entered{0};
+    std::atomic<int> turns{0};
+    std::atomic<bool> is_over{false};
     Runner runner([&] {
-        for (const int last = ++entered + 50; entered < last;) std::this_thread::yield();
+        for (const int last = turns + 50; turns < last && !is_over; ++turns) std::this_thread::yield();
     });
     std::atomic<bool> is_operated{false};  // keeps a start and a kill apart
     std::vector<std::thread> operators;
@@ -81,7 +82,6 @@ TEST(WindowsThread, IsStartedKilledAndAwaitedFromAllSides) {
         operators.emplace_back([&, seed] {
             std::minstd_rand random(seed);
             for (int round = 0; round < 300; ++round) {
-                if (random() % 4 == 0) entered += 50;
                 runner.SetPriority(static_cast<HThreadPriority>(random() % 8));
                 while (is_operated.exchange(true)) std::this_thread::yield();
                 if (random() % 3 == 0) {
@@ -95,7 +95,7 @@ TEST(WindowsThread, IsStartedKilledAndAwaitedFromAllSides) {
         });
     }
     for (std::thread& each : operators) each.join();
-    entered += 50;
+    is_over = true;
     runner.Wait();
     EXPECT_FALSE(runner.IsRunning());
 }
