@@ -49,7 +49,7 @@ void AddRow(TextSink& sink, const GlobalTimerSnapshot::Row& row) {
     AddText(sink, "name", row.moName);
     AddSeconds(sink.Add(",\"seconds\":"), row.mdSeconds);
     sink.Add(",\"threads\":[");
-    std::string_view separator = "";
+    std::string_view separator;
     for (const double seconds : row.maThreadSeconds) {
         AddSeconds(sink.Add(separator), seconds);
         separator = ",";

@@ -40,7 +40,7 @@ public:
     }
 
 private:
-    static constexpr std::size_t kPieceBytes = 64 * 1024;
+    static constexpr std::size_t kPieceBytes = std::size_t{64} * 1024;
 
     void WritePiece();
     void AddJsonEscape(unsigned char byte);

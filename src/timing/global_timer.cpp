@@ -124,9 +124,10 @@ GlobalTimerSnapshot GlobalTimerSnapshot::Take() {
         Row& row = snapshot.maRows.emplace_back();
         row.moName = name;
         row.mdSeconds = timers.TotalOf(id) / 1000000.0;
-        for (std::size_t thread = 0; thread < timers.moRows.RowCount(); ++thread)
-            row.maThreadSeconds.push_back(static_cast<double>(timers.moRows.At(thread, id).mnElapsed) /
-                                          1000000.0);
+        for (std::size_t thread = 0; thread < timers.moRows.RowCount(); ++thread) {
+            const auto microseconds = static_cast<double>(timers.moRows.At(thread, id).mnElapsed);
+            row.maThreadSeconds.push_back(microseconds / 1000000.0);
+        }
     }
     return snapshot;
 }

@@ -91,7 +91,7 @@ protected:
     /// @endcond
 
 private:
-    static constexpr std::size_t kBufferBytes = 64 * 1024;
+    static constexpr std::size_t kBufferBytes = std::size_t{64} * 1024;
 
     // At most one of the two areas is in use: with bytes to write, nothing is read ahead.
 
