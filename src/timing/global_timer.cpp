@@ -11,7 +11,6 @@
 #include <map>
 #include <optional>
 #include <utility>
-#include <vector>
 
 #include "platform/clock.h"
 #include "timing/row_table.h"
@@ -56,19 +55,35 @@ struct GlobalTimer::Impl {
         return total;
     }
 
+    // Rows in order of registration.
+    GlobalTimerSnapshot Snapshot() const {
+        GlobalTimerSnapshot snapshot;
+        const HMutexLock lock(&goTimerGrowthMutex);
+        snapshot.maRows.reserve(moNames.size());
+        for (const auto& [id, name] : moNames) {
+            GlobalTimerSnapshot::Row& row = snapshot.maRows.emplace_back();
+            row.moName = name;
+            row.mdSeconds = TotalOf(id) / 1000000.0;
+            for (std::size_t thread = 0; thread < moRows.RowCount(); ++thread) {
+                const auto microseconds = static_cast<double>(moRows.At(thread, id).mnElapsed);
+                row.maThreadSeconds.push_back(microseconds / 1000000.0);
+            }
+        }
+        return snapshot;
+    }
+
     // Timers with equal totals come in order of registration.
     void Report() const {
-        std::vector<std::pair<const std::string*, double>> totals;
-        totals.reserve(moNames.size());
-        for (const auto& [id, name] : moNames) totals.emplace_back(&name, TotalOf(id));
-        std::stable_sort(totals.begin(), totals.end(),
-                         [](const auto& left, const auto& right) { return left.second < right.second; });
-        for (const auto& [name, total] : totals) std::cout << *name << ": " << total / 1000000.0 << '\n';
+        GlobalTimerSnapshot timers = Snapshot();
+        std::stable_sort(timers.maRows.begin(), timers.maRows.end(), [](const auto& left, const auto& right) {
+            return left.mdSeconds < right.mdSeconds;
+        });
+        for (const auto& row : timers.maRows) std::cout << row.moName << ": " << row.mdSeconds << '\n';
         std::cout << std::flush;
     }
 
     RowTable<TimerSlot> moRows;  // row t belongs to OpenMP thread number t; slot i of each to timer i
-    std::map<unsigned long long, std::string> moNames;  // guarded by goTimerGrowthMutex, except in Report
+    std::map<unsigned long long, std::string> moNames;  // guarded by goTimerGrowthMutex
 };
 
 GlobalTimer& GlobalTimer::GetInstance() {
@@ -110,24 +125,10 @@ void GlobalTimer::Toggle(unsigned long long id) {
 void GlobalTimer::Report() const { mpoImpl->Report(); }
 
 void GlobalTimer::ResetAll() {
+    const HMutexLock lock(&goTimerGrowthMutex);
     const RowTable<TimerSlot>& rows = mpoImpl->moRows;
     for (std::size_t row = 0; row < rows.RowCount(); ++row)
         for (const auto& [id, name] : mpoImpl->moNames) rows.At(row, id) = TimerSlot();
 }
 
-GlobalTimerSnapshot GlobalTimerSnapshot::Take() {
-    const GlobalTimer::Impl& timers = *GlobalTimer::GetInstance().mpoImpl;
-    GlobalTimerSnapshot snapshot;
-    const HMutexLock lock(&goTimerGrowthMutex);
-    snapshot.maRows.reserve(timers.moNames.size());
-    for (const auto& [id, name] : timers.moNames) {
-        Row& row = snapshot.maRows.emplace_back();
-        row.moName = name;
-        row.mdSeconds = timers.TotalOf(id) / 1000000.0;
-        for (std::size_t thread = 0; thread < timers.moRows.RowCount(); ++thread) {
-            const auto microseconds = static_cast<double>(timers.moRows.At(thread, id).mnElapsed);
-            row.maThreadSeconds.push_back(microseconds / 1000000.0);
-        }
-    }
-    return snapshot;
-}
+GlobalTimerSnapshot GlobalTimerSnapshot::Take() { return GlobalTimer::GetInstance().mpoImpl->Snapshot(); }
