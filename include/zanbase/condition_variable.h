@@ -24,7 +24,8 @@ struct HNativeCondition;
 /// others out while it sleeps, and with them whoever should wake it.
 ///
 /// Any number of threads may call any of the operations at the same time. Which waiter a `Signal` wakes is
-/// open. A waiter that is ended by `HThread::Kill` takes no wake-up of the others with it. Nobody may be
+/// open. On Linux a waiter that is ended by `HThread::Kill` takes no wake-up of the others with it; on Windows
+/// it may hold up later waiters. Nobody may be
 /// inside any of the operations when a condition variable is destroyed.
 class ZANBASE_API HCondVar {
 public:

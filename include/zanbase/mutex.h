@@ -21,7 +21,8 @@ struct HNativeLock;
 /// Any number of threads may use one mutex. Nothing is promised about who of several waiters comes next, and
 /// there is no form with a time limit; a `HSemaphore` has one. Misuse is not detected: only the owner may
 /// unlock, no more often than it locked, and a mutex that is owned must not be destroyed. A thread that was
-/// ended by `HThread::Kill` while it owned a mutex owns it for ever.
+/// ended by `HThread::Kill` while it owned a mutex owns it for ever. A waiter that was ended does not hold up
+/// other waiters on Linux; on Windows it may.
 class ZANBASE_API HMutex {
 public:
     /// A free mutex. Its lock object lives in a heap block of its own; see `HMalloc` for exhausted memory.

@@ -56,6 +56,9 @@ ZANBASE_API const char* IMPGetMajorRev();
 /// at most half a minute. The window's process is no child of the program and sends it no signal. When the
 /// user closes the window, reading gives end-of-file and writing fails.
 ///
+/// On Windows the console is one of the system's, with a window. It can't be made where the process has one already,
+/// as a program started from a command prompt has. There the waits above have no bound.
+///
 /// Not for programs that need single keys or the mouse: the console transfers lines of text.
 /// Thread-safety: one thread at a time calls the three console operations. Other threads may use the streams.
 ZANBASE_API int CreateConsole();
@@ -68,7 +71,8 @@ ZANBASE_API int DestroyConsole();
 
 /// Shows the console's window if `show` is not 0, and hides it otherwise. On Linux it restores or iconifies a
 /// window of the library's own, wherever the standard streams lead; it does nothing to the terminal that the
-/// process was started from. Thread-safety: as `CreateConsole`.
+/// process was started from. On Windows it finds the window of the process's console by a temporary title, which
+/// stays for 40 milliseconds. Thread-safety: as `CreateConsole`.
 ZANBASE_API void ShowConsole(int show);
 
 /// Returns 0: no supported system is the 32-bit extension of a 16-bit one. Thread-safe.

@@ -15,7 +15,8 @@ struct HNativeThread;
 /// How much of a busy processor a thread gets, from least to most. Normal is the priority of the process; a
 /// value beyond the last counts as normal. On Linux a priority sets the nice value of the thread: 39, 10 and
 /// 5 above that of the process, or 5, 10 and 39 below, clamped to -20 to 19. Only privileged processes may
-/// lower a nice value, also back to normal. A refusal is not reported.
+/// lower a nice value, also back to normal. A refusal is not reported. On Windows the values are the system's
+/// own relative priorities, from `THREAD_PRIORITY_IDLE` to `THREAD_PRIORITY_TIME_CRITICAL`, and need no right.
 enum HThreadPriority : unsigned int {
     HThreadPriorityIdle = 0,
     HThreadPriorityLowest = 1,
@@ -56,6 +57,8 @@ enum HThreadPriority : unsigned int {
 ///     pass on the faults of these threads to the handler that it replaced.
 ///   - `abort` ends the process. `pthread_exit` in `Run` ends the thread and prints nothing. A thread that
 ///     calls the raw `exit` system call stays "running" until `Kill`.
+///
+/// On Windows faults are structured exceptions. A handler in `Run` gets them first, and so does a vectored one.
 ///
 /// **Fork.** In the child every object is idle, except that of the thread that called `fork`.
 ///
@@ -110,6 +113,13 @@ public:
     ///   - Memory leaks: the thread's cache of freed blocks (0.7 kB, and up to 234 kB that the thread has
     ///     freed), and 32 bytes for each thread-local object with a destructor.
     ///   - If the initial thread has ended by `pthread_exit`, the process ends without its exit handlers.
+    ///
+    /// On Windows it is `TerminateThread`, which takes effect at once:
+    ///   - A thread inside the C runtime or the loader leaves their locks held: the next thread that allocates,
+    ///     starts or ends may deadlock.
+    ///   - A thread that waits for a `HMutex` or on a `HCondVar` may take the wake-ups of later waiters with it. A
+    ///     `HSemaphore` serves its other waiters.
+    ///   - A thread that waits in `Wait` leaves a handle and a small block behind.
     void Kill();
 
     /// Sets the priority, for the running thread and for later starts. Does nothing if it is set already.

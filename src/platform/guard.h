@@ -8,10 +8,10 @@
 // held stays held. Wake-ups that they had to forward are forwarded. Exceptions pass through. Frames nest; the
 // innermost receives.
 //
-// Faults of threads without a frame, and fault signals that were sent, are passed to the handler that the
-// program had before the first call of this function or of StartThread. A handler that the program installs
-// later is called first; frames work only if it passes on the faults that it does not handle. The body must
-// not block the signals of faults; the call itself unblocks them.
+// Where faults are signals: faults of threads without a frame, and fault signals that were sent, are passed to
+// the handler that the program had before the first call of this function or of StartThread. A handler that
+// the program installs later is called first; frames work only if it passes on the faults that it does not
+// handle. The body must not block the signals of faults; the call itself unblocks them.
 bool RunGuarded(void (*body)(void*), void* argument);
 
 #endif

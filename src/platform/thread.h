@@ -19,7 +19,7 @@ using ThreadSlot = std::atomic<HNativeThread*>;
 // Requires: the slot is empty; only what RethrowThreadExit throws leaves the body.
 int StartThread(ThreadSlot& slot, void (*body)(void*), void* argument) noexcept;
 
-// The system's text for an error number of StartThread, without a line end.
+// The system's text for an error number of StartThread, as the system writes it: on Windows with a line end.
 std::string SystemErrorText(int error);
 
 // Waits until the thread in the slot has ended, including the destructors of its thread-local objects. Any

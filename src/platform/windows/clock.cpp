@@ -1,13 +1,25 @@
-// Clocks of the system and of the C runtime.
+// Clocks of the system. Those of the C runtime count by the system time, which can be set, and _ftime64 also looks up
+// the time zone, which makes it many times as slow under Wine.
 #include "platform/clock.h"
-
-#include <ctime>
 
 #include "platform/windows/system.h"
 
-static_assert(CLOCKS_PER_SEC == 1000);
+namespace {
 
-// Not _ftime64, which has the same two numbers: it also looks up the time zone, at many times the cost under Wine.
+long long Counter() noexcept {
+    LARGE_INTEGER counter;
+    QueryPerformanceCounter(&counter);  // can't fail
+    return counter.QuadPart;
+}
+
+long long CounterPerSecond() noexcept {
+    LARGE_INTEGER frequency;
+    QueryPerformanceFrequency(&frequency);
+    return frequency.QuadPart;
+}
+
+}  // namespace
+
 WallClock ReadWallClock() noexcept {
     constexpr unsigned long long kUnitsPerSecond = 10000000;  // of 100 nanoseconds
     constexpr unsigned long long kUnitsPerMillisecond = 10000;
@@ -20,7 +32,16 @@ WallClock ReadWallClock() noexcept {
             static_cast<unsigned short>(units % kUnitsPerSecond / kUnitsPerMillisecond)};
 }
 
-// The time since the start of the process, not the processor time that this function counts on other systems.
-unsigned int ReadTicks() noexcept { return static_cast<unsigned int>(std::clock()); }
+unsigned int ReadTicks() noexcept {
+    const long long counter = Counter();
+    const long long per_second = CounterPerSecond();
+    // In two parts, since the product of the whole would overflow.
+    return static_cast<unsigned int>(counter / per_second * 1000 + counter % per_second * 1000 / per_second);
+}
 
-void SleepFor(unsigned int ms) noexcept { Sleep(ms); }
+// The system may end a pause at the timer interrupt before its end.
+void SleepFor(unsigned int ms) noexcept {
+    const long long end = Counter() + CounterPerSecond() * ms / 1000;
+    Sleep(ms);
+    while (Counter() < end) Sleep(1);
+}
