@@ -15,10 +15,11 @@
 #include <vector>
 
 constexpr std::size_t kThreads = 3;
+constexpr std::size_t kDelayedStores = 2 * kThreads;  // that a model may have
 using Value = unsigned long long;
 
 struct State {
-    std::array<Value, 24> words{};  // all that is shared, and what a model notes beside it
+    std::array<Value, 26> words{};  // all that is shared, and what a model notes beside it
     struct Thread {
         std::size_t call = 0;    // its place in the script
         std::vector<Value> log;  // results of the steps of this call
@@ -33,6 +34,8 @@ public:
     std::function<void(char)> call;
     std::function<const char*(const State&, bool at_the_end)> check;  // what is wrong, or null
     std::function<bool(State&, std::size_t thread)> kill;  // what may end a thread, if set; false: not now
+    std::function<bool(State&, std::size_t store)>
+        deliver;  // makes a delayed store, if set; false: not there
 
     // What is wrong in some order of steps; empty if nothing is.
     std::string Explore(const State& start) {
@@ -54,6 +57,12 @@ public:
                 }
                 State killed = state;
                 if (kill && kill(killed, thread)) meet(killed);
+            }
+            for (std::size_t store = 0; deliver && store < kDelayedStores; ++store) {
+                State delivered = state;
+                if (!deliver(delivered, store)) continue;
+                at_the_end = false;
+                meet(delivered);
             }
             if (mFound == nullptr) mFound = check(state, at_the_end);
         }

@@ -1,5 +1,10 @@
 // The shipped algorithms of lock, semaphore and condition on words and sleepers of the explorer. One thread may be
 // killed, at any of its steps.
+//
+// Stores may be delayed, as a processor with a weak memory order does: a store to the futex word or to what the lock
+// guards first waits in a place of its thread, and reaches the others at any later time, in any order. An operation
+// with release order, and entering the kernel, makes the thread's stores to what is guarded first. A read-modify-write
+// works on the word itself, after the thread's own store to it. Loads are made in order.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -24,8 +29,12 @@ constexpr std::size_t kAsleep = 6;                          // 1: the thread sle
 constexpr std::size_t kPendingWakeup = kAsleep + kThreads;  // 1: noted on a lock or semaphore
 constexpr std::size_t kPendingSignal = kPendingWakeup + kThreads;  // 1: noted on a condition
 constexpr std::size_t kSeen = kPendingSignal + kThreads;  // the condition's word at the start of the wait
+constexpr std::size_t kDelayedWord = kSeen + kThreads;    // a store to kWord that is delayed, plus 1; 0: none
+constexpr std::size_t kDelayedGuarded = kDelayedWord + kThreads;  // the same for kGuarded
+constexpr std::size_t kGuarded = kDelayedGuarded + kThreads;      // what the threads write under the lock
+constexpr std::size_t kWrites = kGuarded + 1;                     // how often they wrote it
 
-enum class Fault { kNone, kForgetsWakeups, kForgetsSignals };
+enum class Fault { kNone, kForgetsWakeups, kForgetsSignals, kReleasesRelaxed };
 
 Fault fault = Fault::kNone;
 constexpr int kSoon = 0;  // a deadline, which may pass at any time
@@ -38,24 +47,65 @@ Value Take(Value old, Value desired) {
 
 unsigned int As32Bits(Value value) { return static_cast<unsigned int>(value); }
 
+// Makes a delayed store: those of the threads to kWord come first, then those to kGuarded.
+bool Deliver(State& state, std::size_t store) {
+    const Value delayed = std::exchange(state.words[kDelayedWord + store], 0);
+    if (delayed != 0) state.words[store < kThreads ? kWord : kGuarded] = delayed - 1;
+    return delayed != 0;
+}
+
+// Makes the running thread's delayed stores as far as `order` wants it.
+void DeliverBefore(State& state, std::memory_order order, bool changes_word) {
+    const bool releases = order != std::memory_order_relaxed && order != std::memory_order_acquire;
+    if (releases && fault != Fault::kReleasesRelaxed) Deliver(state, kThreads + explorer.self);
+    if (changes_word) Deliver(state, explorer.self);
+}
+
+// Changes the futex word by a read-modify-write.
+template <class Rule>
+unsigned int ChangeWord(std::memory_order order, Rule rule) {
+    return As32Bits(explorer.Step([&](State& state) {
+        DeliverBefore(state, order, true);
+        return std::exchange(state.words[kWord], rule(state.words[kWord]));
+    }));
+}
+
+// Writes under the lock: what was written before has to be there, and the store may be delayed.
+void WriteGuarded() {
+    explorer.Step([](State& state) {
+        Deliver(state, kThreads + explorer.self);
+        if (state.words[kGuarded] != state.words[kWrites]) Explorer::Fail("misses a store");
+        return state.words[kDelayedGuarded + explorer.self] = ++state.words[kWrites] + 1;
+    });
+}
+
 struct Word {
     explicit Word(unsigned int) {}  // the explorer's start state has the value
-    unsigned int load(std::memory_order) const { return As32Bits(Get(kWord)); }
-    void store(unsigned int desired, std::memory_order) { Set(kWord, desired); }
-    unsigned int exchange(unsigned int desired, std::memory_order) {
-        return As32Bits(Change(kWord, [=](Value old) { return Take(old, desired); }));
+    unsigned int load(std::memory_order) const {
+        return As32Bits(explorer.Step([](State& state) {
+            const Value mine = state.words[kDelayedWord + explorer.self];
+            return mine != 0 ? mine - 1 : state.words[kWord];
+        }));
     }
-    unsigned int fetch_add(unsigned int more, std::memory_order) {
-        return As32Bits(Add(kWord, static_cast<int>(more)));
+    void store(unsigned int desired, std::memory_order order) {
+        explorer.Step([&](State& state) {
+            DeliverBefore(state, order, true);
+            return state.words[kDelayedWord + explorer.self] = desired + 1;
+        });
     }
-    unsigned int fetch_or(unsigned int bits, std::memory_order) {
-        return As32Bits(Change(kWord, [=](Value value) { return value | bits; }));
+    unsigned int exchange(unsigned int desired, std::memory_order order) {
+        return ChangeWord(order, [=](Value old) { return Take(old, desired); });
     }
-    bool compare_exchange_strong(unsigned int& expected, unsigned int desired, std::memory_order,
+    unsigned int fetch_add(unsigned int more, std::memory_order order) {
+        return ChangeWord(order, [=](Value old) { return old + more; });
+    }
+    unsigned int fetch_or(unsigned int bits, std::memory_order order) {
+        return ChangeWord(order, [=](Value old) { return old | bits; });
+    }
+    bool compare_exchange_strong(unsigned int& expected, unsigned int desired, std::memory_order order,
                                  std::memory_order = {}) {
         const unsigned int wanted = expected;
-        expected =
-            As32Bits(Change(kWord, [=](Value old) { return old == wanted ? Take(old, desired) : old; }));
+        expected = ChangeWord(order, [=](Value old) { return old == wanted ? Take(old, desired) : old; });
         return expected == wanted;
     }
 };
@@ -81,6 +131,9 @@ struct Pending {
     }
 };
 
+// A barrier: the kernel's futex calls order the word against their queue of sleepers.
+void EnterKernel(State& state) { DeliverBefore(state, std::memory_order_seq_cst, true); }
+
 struct System {
     using Word = ::Word;
     using Owner = ::Owner;
@@ -94,8 +147,10 @@ struct System {
     // Two steps: fall asleep if the word is as expected; go on once woken or at the deadline.
     static bool SleepWhile(Word&, unsigned int expected, Deadline deadline) {
         const std::size_t asleep = kAsleep + explorer.self;
-        const Value slept = explorer.Step(
-            [&](State& state) { return state.words[asleep] = state.words[kWord] == expected ? 1 : 0; });
+        const Value slept = explorer.Step([&](State& state) {
+            EnterKernel(state);
+            return state.words[asleep] = state.words[kWord] == expected ? 1 : 0;
+        });
         if (slept == 0) return true;
         const Value still_asleep = Change(asleep, [&](Value value) {
             if (value != 0 && deadline == nullptr) Explorer::Block();
@@ -107,6 +162,7 @@ struct System {
     // Any sleeper may be the one that is woken.
     static int WakeSleepers(Word&, int most) {
         return static_cast<int>(explorer.Step([&](State& state) {
+            EnterKernel(state);
             std::vector<std::size_t> sleepers;
             for (std::size_t place = kAsleep; place < kAsleep + kThreads; ++place)
                 if (state.words[place] != 0) sleepers.push_back(place);
@@ -117,10 +173,12 @@ struct System {
     }
 };
 
-// Kills a thread, which forwards its pending wake-ups as ForwardPendingWakeups does.
+// Kills a thread, which forwards its pending wake-ups as ForwardPendingWakeups does. The signal that ends it is a
+// barrier: its stores are made before.
 bool Kill(State& state, std::size_t thread) {
     if (state.words[kHasKilled] != 0) return false;
     state.words[kHasKilled] = 1;
+    for (const std::size_t store : {thread, kThreads + thread}) Deliver(state, store);
     state.threads[thread].dead = true;
     Value* const asleep = &state.words[kAsleep];
     asleep[thread] = 0;
@@ -159,6 +217,7 @@ void CallLock(char call) {
         lock.Acquire(1);
         ++explorer.now.words[kOwners];
     } else {
+        WriteGuarded();
         Add(kOwners, -1);
         lock.Release();
     }
@@ -166,22 +225,40 @@ void CallLock(char call) {
 
 TEST(FutexModel, LockHasOneOwnerAndLosesNoWakeUp) {
     explorer.kill = Kill;
+    explorer.deliver = Deliver;
     explorer.call = CallLock;
     const auto is_available = [](const State&) { return true; };
     const Scripts scripts{"ARAR", "AR", "AR"};
     EXPECT_EQ(Explore(kWord, is_available, scripts), "");
     EXPECT_EQ(Explore(kWord, is_available, scripts, Fault::kForgetsWakeups), "asleep");
+    EXPECT_EQ(Explore(kWord, is_available, scripts, Fault::kReleasesRelaxed), "misses a store");
+}
+
+// Writes what the thread that acquires the unit has to see.
+void WriteBeforeRelease() {
+    explorer.Step([](State& state) { return state.words[kDelayedGuarded + explorer.self] = 2; });
+}
+
+// At the end of a call: no step of its own.
+void ReadAfterAcquire() {
+    const bool has_written = explorer.now.words[kDelayedGuarded + explorer.self] != 0;
+    if (explorer.now.words[kGuarded] == 0 && !has_written) Explorer::Fail("misses a store");
 }
 
 // A: acquire; a: acquire before a deadline; R: release.
 void CallSemaphore(char call) {
     FutexSemaphore<System> semaphore(0);
-    if (call == 'R') return semaphore.Release();
-    semaphore.Acquire(call == 'a' ? &kSoon : nullptr);
+    if (call == 'R') {
+        WriteBeforeRelease();
+        semaphore.Release();
+    } else if (semaphore.Acquire(call == 'a' ? &kSoon : nullptr)) {
+        ReadAfterAcquire();
+    }
 }
 
 TEST(FutexModel, SemaphoreLosesNoUnitAndNoWakeUp) {
     explorer.kill = Kill;
+    explorer.deliver = Deliver;
     explorer.call = CallSemaphore;
     const auto has_units = [](const State& state) {
         return (state.words[kWord] & FutexSemaphore<System>::kMost) != 0;
@@ -189,6 +266,7 @@ TEST(FutexModel, SemaphoreLosesNoUnitAndNoWakeUp) {
     EXPECT_EQ(Explore(kLock, has_units, {"AR", "A", "RR"}), "");
     EXPECT_EQ(Explore(kLock, has_units, {"A", "a", "RR"}), "");
     EXPECT_EQ(Explore(kLock, has_units, {"AR", "A", "RR"}, Fault::kForgetsWakeups), "asleep");
+    EXPECT_EQ(Explore(kLock, has_units, {"AR", "A", "RR"}, Fault::kReleasesRelaxed), "misses a store");
 }
 
 struct SimpleLock {
@@ -222,6 +300,7 @@ bool KillOutsideStartOfSignal(State& state, std::size_t thread) {
 
 TEST(FutexModel, ConditionLosesNoWakeUp) {
     explorer.kill = KillOutsideStartOfSignal;
+    explorer.deliver = Deliver;
     explorer.call = CallCondition;
     const auto has_items = [](const State& state) { return state.words[kItems] != 0; };
     EXPECT_EQ(Explore(kLock, has_items, {"W", "W", "+s+s"}), "");
