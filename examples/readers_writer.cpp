@@ -1,5 +1,5 @@
-// A price list that several threads look into while one keeps it up to date. Each update changes two entries
-// together, and no reader may see one of them without the other.
+// A price list that several threads read while one updates it. Each update changes two entries together, and
+// no reader may see one change without the other.
 #include <atomic>
 #include <cstdio>
 #include <map>
@@ -14,7 +14,7 @@
 namespace {
 
 struct PriceList {
-    // Writers first: an update must not wait for ever while readers come and go.
+    // Prefers writers: overlapping readers must not keep an update out for ever.
     HWritePrefMutex mutex;
     std::map<std::string, int> prices{{"bolt", 100}, {"nut", 100}};  // guarded by mutex
 };
@@ -37,7 +37,7 @@ protected:
     }
 
 private:
-    // Takes a lock of its own; on a thread that reads already that never waits, not even for a writer.
+    // Acquires a read lock of its own: nested in that of Run, it never waits, not even behind a writer.
     int Price(const std::string& name) const {
         const HReaderLock lock(&mList.mutex);
         return mList.prices.at(name);
@@ -46,7 +46,7 @@ private:
     const PriceList& mList;
     const std::atomic<bool>& mEnds;
     const HSemaphore mLooked{0};
-    long mTorn = 0;  // read by others only when the thread has ended
+    long mTorn = 0;  // other threads read it only after Wait()
 };
 
 }  // namespace

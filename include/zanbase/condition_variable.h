@@ -1,5 +1,5 @@
 /// @file
-/// The condition variable: sleeping until another thread says that something has changed.
+/// The condition variable: a thread sleeps until another thread signals that a condition may have changed.
 #ifndef ZANBASE_CONDITION_VARIABLE_H
 #define ZANBASE_CONDITION_VARIABLE_H
 
@@ -11,42 +11,43 @@
 
 struct HNativeCondition;
 
-/// A condition variable that is waited for with a `HMutex`.
+/// A condition variable that is used with a `HMutex`.
 ///
 ///     HMutexLock lock(&mutex);
 ///     while (jobs.empty()) condition.Wait(mutex);  // the other side: add a job, then Signal()
 ///
-/// A waiter sleeps once and does not loop: it may return for no reason, or after another thread has already
-/// taken what it was woken for, so the caller tests its condition again under the mutex. A wake-up with
-/// nobody waiting is lost; where it must be remembered, use a `HSemaphore`.
+/// Spurious wake-ups are possible, and another thread may consume the condition first: always wait in a loop
+/// that tests the condition under the mutex. A wake-up without a waiter is lost; use a `HSemaphore` where it
+/// has to be remembered.
 ///
-/// A wait gives back exactly one level of the mutex. A thread that owns the mutex more than once keeps the
-/// others out while it sleeps, and with them whoever should wake it.
-///
-/// Any number of threads may call any of the operations at the same time. Which waiter a `Signal` wakes is
-/// open. On Linux a waiter that is ended by `HThread::Kill` takes no wake-up of the others with it; on Windows
-/// it may hold up later waiters. Nobody may be
-/// inside any of the operations when a condition variable is destroyed.
+/// Thread-safe: any number of threads may call any operation at the same time. Which waiter `Signal` wakes is
+/// unspecified. On Linux a waiter killed by `HThread::Kill` consumes no wake-up of the others; on Windows it may
+/// hold up later waiters. Not async-signal-safe.
 class ZANBASE_API HCondVar {
 public:
-    /// Takes a small block from `malloc`; throws `std::bad_alloc` if there is none.
+    /// Allocates a small block with `malloc`; throws `std::bad_alloc` if that fails.
     HCondVar();
+    /// Requires: no thread waits, and no thread is inside any operation. Not thread-safe.
     ~HCondVar();
 
-    /// Wakes one waiter, if there is any.
+    /// Wakes one waiter, if there is any. The caller need not own the mutex. Thread-safe.
     void Signal() const;
 
-    /// Wakes all threads that wait now.
+    /// Wakes all threads that wait now. The caller need not own the mutex. Thread-safe.
     void Broadcast() const;
 
-    /// Lets go of `mutex`, sleeps until a wake-up, and owns the mutex again on return. The calling thread
-    /// owns `mutex` exactly once.
+    /// Releases `mutex`, sleeps until a wake-up, and acquires `mutex` again before it returns. Releasing and
+    /// beginning to wait are one step for threads that acquire the mutex. Thread-safe.
+    ///
+    /// Requires: the calling thread owns `mutex` exactly once. At a deeper level the mutex stays owned during
+    /// the sleep, and a thread that needs it to signal deadlocks with the waiter.
     void Wait(const HMutex& mutex) const;
 
-    /// The same for at most `seconds`, which are cut to whole milliseconds: true if it was woken, false if
-    /// the time ran out. The mutex is owned on return in both cases, which may take longer than the limit.
-    /// Less than a millisecond lets the mutex go and takes it again without a sleep, and gives false; so do
-    /// negative times and what is no number. A limit of 4294967.295 s or more never runs out.
+    /// Does what `Wait` does for at most `seconds`, cut to whole milliseconds. True if it was woken, false on
+    /// a timeout; the mutex is owned on return in both cases, and acquiring it may take longer than the
+    /// limit. Less than a millisecond, a negative time and a NaN release the mutex and acquire it again
+    /// without a sleep, and return false. A limit of 4294967.295 s or more never expires. Requires: as
+    /// `Wait`. Thread-safe.
     bool TryWait(const HMutex& mutex, double seconds) const;
 
 private:

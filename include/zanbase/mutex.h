@@ -1,5 +1,9 @@
 /// @file
-/// The re-entrant mutex and its scoped holder, on which every other lock and global table stands.
+/// The re-entrant mutex and its scoped holder. All other locks and the library's global tables use them.
+///
+/// Lock order: no operation of the library holds two of the library's own mutexes at once. A program that
+/// holds several mutexes at once must acquire them in one order everywhere; otherwise its threads can
+/// deadlock.
 #ifndef ZANBASE_MUTEX_H
 #define ZANBASE_MUTEX_H
 
@@ -12,31 +16,39 @@
 
 struct HNativeLock;
 
-/// A re-entrant mutex: the thread that owns it may take it again without blocking, and it becomes free once
-/// that thread has given it back as often as it took it.
+/// A re-entrant mutex: the thread that owns it can acquire it again without blocking. It is free again once
+/// that thread has released it as often as it acquired it.
 ///
 ///     HMutex mutex;
 ///     { HMutexLock lock(&mutex);  /* one thread at a time */ }
 ///
-/// Any number of threads may use one mutex. Nothing is promised about who of several waiters comes next, and
-/// there is no form with a time limit; a `HSemaphore` has one. Misuse is not detected: only the owner may
-/// unlock, no more often than it locked, and a mutex that is owned must not be destroyed. A thread that was
-/// ended by `HThread::Kill` while it owned a mutex owns it for ever. A waiter that was ended does not hold up
-/// other waiters on Linux; on Windows it may.
+/// Thread-safe: any number of threads may call any operation of one mutex at the same time. Releasing
+/// happens-before the next acquisition. There is no fairness: a thread that releases and acquires again can
+/// overtake waiting threads. There is no acquisition with a timeout; `HSemaphore` has one.
+///
+/// Misuse is not detected: releasing by a thread that does not own the mutex, releasing too often, and
+/// destroying an owned mutex have undefined behaviour. A thread killed by `HThread::Kill` while it owns a
+/// mutex owns it for ever; a killed waiter does not hold up other waiters on Linux; on Windows it may. Not
+/// async-signal-safe. After
+/// `fork` the child's thread owns what the forking thread owned; mutexes of other threads stay owned for ever
+/// there.
 class ZANBASE_API HMutex {
 public:
-    /// A free mutex. Its lock object lives in a heap block of its own; see `HMalloc` for exhausted memory.
+    /// Makes a free mutex. Its lock is a heap block of its own from `HMalloc`, which see for exhausted
+    /// memory.
     HMutex();
+    /// Requires: no thread owns the mutex or waits for it. Not thread-safe.
     ~HMutex();
 
-    /// Blocks until the calling thread owns the mutex; returns at once if it owns it already.
+    /// Acquires one level of ownership. Blocks while another thread owns the mutex; returns at once if the
+    /// calling thread owns it already. Thread-safe.
     void Lock() const;
 
-    /// Never blocks. True if the calling thread now owns the mutex, also if it owned it before; it then owes
-    /// one `Unlock`. False if another thread owns it.
+    /// Acquires one level of ownership if no other thread owns the mutex, and never blocks. True if it did,
+    /// also if the calling thread owned the mutex before: one `Unlock` has to follow. Thread-safe.
     [[nodiscard]] bool TryLock() const;
 
-    /// Gives back one level of ownership.
+    /// Releases one level of ownership. Requires: the calling thread owns the mutex. Thread-safe.
     void Unlock() const;
 
 private:
@@ -50,27 +62,28 @@ private:
 
 /// Holds one level of ownership of a `HMutex` for a scope, or nothing.
 ///
-/// An object belongs to the thread that made it, and releases on that thread. It can't be made with `new`.
-/// Copying or assigning from an object of another thread that holds a mutex waits until that thread lets go.
+/// Not thread-safe: an object belongs to the thread that made it, and must be released on that thread. It
+/// can't be made with `new`. Copying or assigning from an object of another thread that holds a mutex blocks
+/// until that thread has released it.
 class ZANBASE_API HMutexLock {
 public:
-    /// Locks `mutex`, which must outlive the hold; with null, or no argument, holds nothing.
+    /// Acquires `mutex`; with null, or no argument, holds nothing. Requires: `mutex` outlives the hold.
     HMutexLock(const HMutex* mutex = nullptr);
 
-    /// Locks once more the mutex that `other` holds now, if any; each of the two gives its own level back.
+    /// Acquires one more level of the mutex that `other` holds, if any. Each object releases its own level.
     HMutexLock(const HMutexLock& other);
 
-    /// As `Release`.
+    /// Does what `Release` does.
     virtual ~HMutexLock();
 
-    /// Releases what this object holds, then locks the mutex that `other` held at the start of the call. So
-    /// an object assigned to itself lets its mutex go for a moment and takes it again.
+    /// Releases what this object holds, then acquires the mutex that `other` held at the start of the call.
+    /// An object assigned to itself releases its mutex for a moment and acquires it again.
     HMutexLock& operator=(const HMutexLock& other);
 
-    /// Unlocks what is held, if anything; a second call does nothing.
+    /// Releases what this object holds; does nothing if it holds nothing.
     void Release();
 
-    /// Releases what is held, then locks `mutex` if it is not null. Two mutexes are never held at once.
+    /// Releases what this object holds, then acquires `mutex` if it is not null. Never holds both at once.
     void Reset(const HMutex* mutex);
 
     /// The mutex held now, or null.
@@ -78,8 +91,9 @@ public:
 
 private:
     static void* operator new(std::size_t) noexcept { return nullptr; }
+    static void* operator new[](std::size_t) noexcept { return nullptr; }
 
-    const HMutex* mpoMutex;  // not owned; non-null exactly while this object owes it one Unlock
+    const HMutex* mpoMutex;  // not owned; null while nothing is held
 };
 
 /// @}

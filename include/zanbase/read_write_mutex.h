@@ -1,15 +1,12 @@
 /// @file
-/// Locks for many readers or one writer, in two kinds that differ in who goes first, and their scoped
-/// holders.
+/// Locks for many readers or one writer, in two kinds that differ in which of them they prefer, and their
+/// scoped holders.
 #ifndef ZANBASE_READ_WRITE_MUTEX_H
 #define ZANBASE_READ_WRITE_MUTEX_H
 
 #include <atomic>
 #include <cstddef>
-#include <functional>
 #include <map>
-#include <new>
-#include <utility>
 
 #include "zanbase/export.h"
 #include "zanbase/mutex.h"
@@ -21,84 +18,69 @@
 /// A lock that many readers or one writer can hold: the interface of both kinds.
 ///
 ///     HWritePrefMutex mutex;
-///     { HReaderLock lock(&mutex);  /* others may read too */ }
-///     { HWriterLock lock(&mutex);  /* nobody else is inside */ }
+///     { HReaderLock lock(&mutex);  /* other threads may read too */ }
+///     { HWriterLock lock(&mutex);  /* no other thread is inside */ }
 ///
-/// A thread may nest read locks in read locks, which never wait, not even behind a waiting writer, and write
-/// locks in write locks. Each lock is given back by the thread that took it, as often as it took it; threads
-/// are told apart by `HThread::GetCurrentThreadId`. Any number of threads may use one lock. Who of several
-/// waiting threads wakes first is open.
+/// A thread can nest read locks in read locks and write locks in write locks. A nested lock never waits, not
+/// even behind a waiting writer. Each lock is released by the thread that acquired it, as often as it
+/// acquired it.
 ///
-/// Nothing detects misuse. A thread that holds a read lock must not ask for the write lock, which would wait
-/// for itself. A lock has to be free when it is destroyed. A thread that is ended by `HThread::Kill` holds
-/// for ever what it holds, and what it was about to get may be lost to all.
+/// Thread-safe: any number of threads may call any operation of one lock at the same time. A release of the
+/// write lock happens-before the next acquisition of either lock; a release of a read lock happens-before the
+/// next acquisition of the write lock. Which of several waiting threads wakes first is unspecified.
 ///
-/// Reading under such a lock pays where readers stay inside for long: taking it costs a few times what a
-/// `HMutex` costs, so short sections are better off with that.
+/// Misuse is not detected. A thread that holds a read lock and asks for the write lock deadlocks with itself.
+/// Destroying a lock that is held or waited for has undefined behaviour. A thread killed by `HThread::Kill`
+/// holds for ever what it holds, and a unit handed to it at that moment is lost: other threads may wait for
+/// ever. After `fork` the child's thread holds what the forking thread held; locks of other threads stay held
+/// for ever there.
+///
+/// When not to use it: acquiring a read lock costs a few times what a `HMutex` costs. It pays where readers
+/// stay inside for long.
 class ZANBASE_API HReadWriteMutex {
 public:
     HReadWriteMutex() = default;
-    /// A lock of its own; whatever the other one is, nothing of it is taken over.
+    /// Makes a lock of its own; nothing is copied.
     HReadWriteMutex(const HReadWriteMutex&) = default;
+    /// Requires: no thread holds the lock or waits for it. Not thread-safe.
     virtual ~HReadWriteMutex();
 
-    /// Waits until the thread may read, and counts one more read lock of it. Throws `std::bad_alloc` if there
-    /// is no memory for a thread's first read lock; the lock can't be used after that.
+    /// Acquires one read lock; waits until the thread may read. Throws `std::bad_alloc` if there is no memory
+    /// for a thread's first read lock; the lock can't be used after that. Thread-safe.
     virtual void ReadLock() const = 0;
-    /// Gives one read lock back.
+    /// Releases one read lock. Requires: the calling thread holds one. Thread-safe.
     virtual void ReadUnlock() const = 0;
-    /// Waits until the thread alone is inside, and counts one more write lock of it.
+    /// Acquires one write lock; waits until no other thread is inside. Requires: the calling thread holds no
+    /// read lock, or holds a write lock already. Thread-safe.
     virtual void WriteLock() const = 0;
-    /// Gives one write lock back; at the last one others may enter.
+    /// Releases one write lock; at the last one other threads may enter. Requires: the calling thread holds
+    /// one. Thread-safe.
     virtual void WriteUnlock() const = 0;
 
-    /// Changes nothing: a lock can't be handed over.
+    /// Changes nothing: a lock can't be transferred.
     HReadWriteMutex& operator=(const HReadWriteMutex&) = default;
 
 protected:
     /// @cond
-    // Gives a map its entries, one at a time, and keeps the last one that it got back for the next, so that a
-    // lock doesn't go to the heap each time its first reader comes. Guarded like the map; copies have nothing
-    // to spare, and any of them can take back what another one gave.
-    template <class T>
-    class EntryAllocator {
-    public:
-        using value_type = T;
-        EntryAllocator() noexcept = default;
-        EntryAllocator(const EntryAllocator&) noexcept {}
-        template <class Other>
-        EntryAllocator(const EntryAllocator<Other>&) noexcept {}
-        ~EntryAllocator() { ::operator delete(mpoSpare); }
-        EntryAllocator& operator=(const EntryAllocator&) noexcept { return *this; }
-
-        T* allocate(std::size_t count) {
-            if (mpoSpare == nullptr) return static_cast<T*>(::operator new(count * sizeof(T)));
-            return static_cast<T*>(std::exchange(mpoSpare, nullptr));
-        }
-        void deallocate(T* entry, std::size_t) noexcept { ::operator delete(std::exchange(mpoSpare, entry)); }
-        friend bool operator==(const EntryAllocator&, const EntryAllocator&) noexcept { return true; }
-        friend bool operator!=(const EntryAllocator&, const EntryAllocator&) noexcept { return false; }
-
-    private:
-        void* mpoSpare = nullptr;  // owned
-    };
-
-    // The read locks of each thread that has any, by the thread's identifier.
-    using ReadCounts = std::map<unsigned long long, unsigned int, std::less<unsigned long long>,
-                                EntryAllocator<std::pair<const unsigned long long, unsigned int>>>;
+    // The number of read locks of each thread that has any, by the thread's number as an owner of locks.
+    using ReadCounts = std::map<unsigned long long, unsigned int>;
     /// @endcond
 };
 
-/// The kind that prefers readers: as long as one reader is inside, a new one gets in at once, past waiting
-/// writers. Readers that overlap without a gap keep a writer out for ever; `HWritePrefMutex` doesn't let
-/// them.
+/// The kind that prefers readers: while a reader is inside, a new reader enters at once, past waiting
+/// writers. Readers that overlap without a gap keep a writer out for ever; `HWritePrefMutex` does not allow
+/// that.
 ///
-/// It allows a downgrade, from writing to reading with no writer in between: `WriteLock`, `ReadLock`,
-/// `WriteUnlock`, and `ReadUnlock` in the end. From that `ReadLock` on other threads' readers get in as well,
-/// so a thread takes it only when it has finished writing. The two may also be given back in the other order.
+/// There is one exception: a reader that began to wait while a writer was inside can stay behind the next
+/// waiting writer, although other readers have entered since. So a reader inside must not wait for another
+/// reader to enter: the two can deadlock.
+///
+/// Downgrade from writing to reading without a writer in between: `WriteLock`, `ReadLock`, `WriteUnlock`, and
+/// `ReadUnlock` at the end. From that `ReadLock` on other threads' readers enter as well, so call it only
+/// when writing has finished. The two locks may also be released in the other order.
 class ZANBASE_API HReadPrefMutex : public HReadWriteMutex {
 public:
-    /// A free lock; see `HMutex` and `HSemaphore` for exhausted memory.
+    /// Makes a free lock; see `HMutex` and `HSemaphore` for exhausted memory.
     HReadPrefMutex();
     ~HReadPrefMutex() override;
     void ReadLock() const override;
@@ -112,22 +94,25 @@ private:
     mutable unsigned int mnReaders = 0;  // read locks of all threads, nested too; guarded by moReaderMutex
     mutable unsigned int mnWriters = 0;  // depth of the write lock; guarded by moWriterMutex
     mutable ReadCounts moReaderThreads;  // guarded by moReaderMutex
-    // The writer, or its start value for nobody: set under moWriterMutex, cleared under both.
+    // The writer's number as an owner of locks; the start value: none. Set under moWriterMutex, cleared under
+    // both.
     mutable std::atomic<unsigned long long> mnWriterThread{0xFFFFFFFFFFFFFFFF};
     HMutex moReaderMutex;
     HMutex moWriterMutex;
-    HSemaphore moResource;  // the lock proper: its unit belongs to the readers together, or to the writer
-    HSemaphore moGate;      // passed by readers, kept by the writer
+    HSemaphore moResource;  // the lock proper: the readers together hold its unit, or the writer does
+    HSemaphore moGate;      // acquired by a reader to enter, and by a writer until it leaves
+    mutable ReadCounts::node_type
+        moSpareCount;  // saves the next first reader an allocation; guarded by moReaderMutex
 };
 
-/// The kind that prefers writers: from the moment a writer waits, no thread that isn't reading yet gets in,
-/// those inside leave, and the writer follows. Writers without a gap keep readers out for ever.
+/// The kind that prefers writers: while a writer waits, no thread enters that is not reading already. The
+/// readers inside leave, and the writer enters. Writers without a gap keep readers out for ever.
 ///
-/// A thread that holds the write lock must not ask for a read lock, which would wait for itself;
-/// `HReadPrefMutex` allows that.
+/// A thread that holds the write lock and asks for a read lock deadlocks with itself; `HReadPrefMutex` allows
+/// it.
 class ZANBASE_API HWritePrefMutex : public HReadWriteMutex {
 public:
-    /// A free lock; see `HMutex` and `HSemaphore` for exhausted memory.
+    /// Makes a free lock; see `HMutex` and `HSemaphore` for exhausted memory.
     HWritePrefMutex();
     ~HWritePrefMutex() override;
     void ReadLock() const override;
@@ -138,77 +123,80 @@ public:
 private:
     friend struct HReadWriteSteps;
 
-    mutable unsigned int mnReaders = 0;  // as in HReadPrefMutex, all of them
+    // As in HReadPrefMutex, but mnWriterThread is set and cleared under moWriterMutex.
+    mutable unsigned int mnReaders = 0;
     mutable unsigned int mnWriters = 0;
     mutable ReadCounts moReaderThreads;
-    mutable std::atomic<unsigned long long> mnWriterThread{
-        0xFFFFFFFFFFFFFFFF};  // but under moWriterMutex only
+    mutable std::atomic<unsigned long long> mnWriterThread{0xFFFFFFFFFFFFFFFF};
     HMutex moReaderMutex;
     HMutex moWriterMutex;
     HSemaphore moGate;
     HSemaphore moResource;
+    mutable ReadCounts::node_type moSpareCount;
 };
 
 /// Holds one read lock of a `HReadWriteMutex` for a scope, or nothing.
 ///
-/// An object belongs to the thread that made it and is released there. It can't be made with `new`. A copy
-/// on the same thread is a nested read lock and never waits. Where a lock has to be tried, or waited for
-/// within a limit, there is no such form.
+/// Not thread-safe: an object belongs to the thread that made it, and must be released on that thread. It
+/// can't be made with `new`. A copy on the same thread is a nested read lock and never waits. There is no
+/// form with a test or a timeout.
 class ZANBASE_API HReaderLock {
 public:
-    /// Takes a read lock of `mutex`, which must outlive the hold; with null holds nothing.
+    /// Acquires a read lock of `mutex`; with null holds nothing. Requires: `mutex` outlives the hold.
     HReaderLock(const HReadWriteMutex* mutex);
 
-    /// Takes one more read lock of the mutex that `other` holds one of, if any; each gives its own back.
+    /// Acquires one more read lock of the mutex that `other` holds one of, if any. Each releases its own.
     HReaderLock(const HReaderLock& other);
 
-    /// As `Release`.
+    /// Does what `Release` does.
     virtual ~HReaderLock();
 
-    /// Releases what this object holds, then takes a read lock of the mutex that `other` held one of at the
-    /// start of the call. So an object assigned to itself lets go for a moment, and a writer can get in.
+    /// Releases what this object holds, then acquires a read lock of the mutex that `other` held one of at
+    /// the start of the call. An object assigned to itself releases for a moment, and a writer can enter.
     HReaderLock& operator=(const HReaderLock& other);
 
-    /// Gives the read lock back, if one is held; a second call does nothing.
+    /// Releases the read lock; does nothing if the object holds none.
     void Release();
 
-    /// Releases what is held, then takes a read lock of `mutex` if it is not null.
+    /// Releases what this object holds, then acquires a read lock of `mutex` if it is not null.
     void Reset(const HReadWriteMutex* mutex);
 
 private:
     static void* operator new(std::size_t) noexcept { return nullptr; }
+    static void* operator new[](std::size_t) noexcept { return nullptr; }
 
-    const HReadWriteMutex* mpoMutex;  // not owned; non-null exactly while this object owes it one ReadUnlock
+    const HReadWriteMutex* mpoMutex;  // not owned; null while nothing is held
 };
 
-/// Holds one write lock of a `HReadWriteMutex` for a scope, or nothing; all else is as for `HReaderLock`. A
-/// copy on the same thread is a nested write lock. A holder of a read lock is no base to write from: release
-/// it first.
+/// Holds one write lock of a `HReadWriteMutex` for a scope, or nothing. Not thread-safe, as `HReaderLock`. A
+/// copy on the same thread is a nested write lock. Requires: the thread holds no read lock of the mutex.
 class ZANBASE_API HWriterLock {
 public:
-    /// Takes a write lock of `mutex`, which must outlive the hold; with null holds nothing.
+    /// Acquires a write lock of `mutex`; with null holds nothing. Requires: `mutex` outlives the hold.
     HWriterLock(const HReadWriteMutex* mutex);
 
-    /// Takes one more write lock of the mutex that `other` holds one of, if any; each gives its own back.
+    /// Acquires one more write lock of the mutex that `other` holds one of, if any. Each releases its own.
     HWriterLock(const HWriterLock& other);
 
-    /// As `Release`.
+    /// Does what `Release` does.
     virtual ~HWriterLock();
 
-    /// Releases what this object holds, then takes a write lock of the mutex that `other` held one of at the
-    /// start of the call. So an object assigned to itself lets go for a moment, and others can get in.
+    /// Releases what this object holds, then acquires a write lock of the mutex that `other` held one of at
+    /// the start of the call. An object assigned to itself releases for a moment, and other threads can
+    /// enter.
     HWriterLock& operator=(const HWriterLock& other);
 
-    /// Gives the write lock back, if one is held; a second call does nothing.
+    /// Releases the write lock; does nothing if the object holds none.
     void Release();
 
-    /// Releases what is held, then takes a write lock of `mutex` if it is not null.
+    /// Releases what this object holds, then acquires a write lock of `mutex` if it is not null.
     void Reset(const HReadWriteMutex* mutex);
 
 private:
     static void* operator new(std::size_t) noexcept { return nullptr; }
+    static void* operator new[](std::size_t) noexcept { return nullptr; }
 
-    const HReadWriteMutex* mpoMutex;  // not owned; non-null exactly while this object owes it one WriteUnlock
+    const HReadWriteMutex* mpoMutex;  // not owned; null while nothing is held
 };
 
 /// @}

@@ -12,34 +12,36 @@
 
 struct HNativeSemaphore;
 
-/// A counting semaphore: `Lock` takes a unit and waits while there is none, `Unlock` gives one.
+/// A counting semaphore: `Lock` acquires a unit and waits while there is none, `Unlock` releases one.
 ///
 ///     HSemaphore done(0);
 ///     StartJob([&] { Work(); done.Unlock(); });
-///     done.Lock();                                  // returns when the job has given its unit
+///     done.Lock();                                  // returns when the job has released its unit
 ///
-/// It has no owner: any thread may give a unit, also one that never took any, and the count then simply
-/// rises. So it is not re-entrant; to keep threads out of each other's way a `HMutex` is the better choice,
-/// which also finds its owner's second call. Any number of threads may call any of the operations at the same
-/// time, and who of several waiters gets a unit is open. A waiter that is ended by `HThread::Kill` takes no
-/// unit of the others with it. A thread that has taken a unit may destroy the semaphore as soon as nobody
-/// else waits for one.
+/// A unit has no owner: any thread may release one, also a thread that acquired none; the count then rises.
+/// So a semaphore is not re-entrant. Prefer a `HMutex` for mutual exclusion.
+///
+/// Thread-safe: any number of threads may call any operation at the same time. Releasing a unit
+/// happens-before its acquisition. Which waiter gets a unit is unspecified. A waiter killed by
+/// `HThread::Kill` consumes no unit of the others. Not async-signal-safe.
 class ZANBASE_API HSemaphore {
 public:
-    /// A semaphore with `count` free units. More than 2147483647, the most it can hold, is a caller's error
-    /// and counts as that. Throws `std::bad_alloc` if there is no memory for it.
+    /// Makes a semaphore with `count` free units, at most 2147483647; a larger count is cut to that. Throws
+    /// `std::bad_alloc` if memory is exhausted.
     HSemaphore(unsigned int count = 1);
+    /// Requires: no thread waits. A thread that has acquired a unit may destroy the semaphore although the
+    /// thread that released the unit is still inside `Unlock`.
     ~HSemaphore();
 
-    /// Takes one unit; blocks as long as there is none.
+    /// Acquires one unit; blocks while there is none. Thread-safe.
     void Lock() const;
 
-    /// Takes one unit if there is one within `seconds`, which are cut to whole milliseconds: true if it took
-    /// one. Less than a millisecond is a test without a wait; so are negative times and what is no number. A
-    /// limit of 4294967.295 s or more never runs out.
+    /// Acquires one unit if there is one within `seconds`, cut to whole milliseconds. True if it did, false
+    /// on a timeout. Less than a millisecond, a negative time and a NaN are a test without a wait. A limit of
+    /// 4294967.295 s or more never expires. Thread-safe.
     bool TryLock(double seconds) const;
 
-    /// Gives one unit; at 2147483647 free units it does nothing.
+    /// Releases one unit; does nothing at 2147483647 free units. Thread-safe.
     void Unlock() const;
 
 private:
@@ -51,35 +53,36 @@ private:
 
 /// Holds one unit of a `HSemaphore` for a scope, or nothing.
 ///
-/// An object belongs to one thread at a time; the unit itself has no owner, so another thread may release it
-/// later. It can't be made with `new`. A `HSemaphoreLock` that is not copied is enough for most uses: each
-/// copy waits for a unit of its own, and where the source holds the last one, for ever.
+/// Not thread-safe: an object belongs to one thread at a time; another thread may release it later. It can't
+/// be made with `new`. A copy acquires a unit of its own: if its source holds the last unit and no other
+/// thread releases one, the copy deadlocks.
 class ZANBASE_API HSemaphoreLock {
 public:
-    /// Takes a unit of `semaphore`, which must outlive the hold; with null holds nothing.
+    /// Acquires a unit of `semaphore`; with null holds nothing. Requires: `semaphore` outlives the hold.
     HSemaphoreLock(HSemaphore* semaphore);
 
-    /// Takes a further unit of the semaphore that `other` holds one of, if any; each of the two gives its own
-    /// unit back.
+    /// Acquires one more unit of the semaphore that `other` holds a unit of, if any. Each object releases its
+    /// own unit.
     HSemaphoreLock(const HSemaphoreLock& other);
 
-    /// As `Release`.
+    /// Does what `Release` does.
     virtual ~HSemaphoreLock();
 
-    /// Releases what this object holds, then takes a unit of the semaphore that `other` held one of at the
-    /// start of the call. So an object assigned to itself gives its unit back and takes one again.
+    /// Releases what this object holds, then acquires a unit of the semaphore that `other` held one of at the
+    /// start of the call. An object assigned to itself releases its unit and acquires one again.
     HSemaphoreLock& operator=(const HSemaphoreLock& other);
 
-    /// Gives the unit back, if one is held; a second call does nothing.
+    /// Releases the unit; does nothing if the object holds none.
     void Release();
 
-    /// Releases what is held, then takes a unit of `semaphore` if it is not null.
+    /// Releases what this object holds, then acquires a unit of `semaphore` if it is not null.
     void Reset(HSemaphore* semaphore);
 
 private:
     static void* operator new(std::size_t) noexcept { return nullptr; }
+    static void* operator new[](std::size_t) noexcept { return nullptr; }
 
-    HSemaphore* mpoSemaphore;  // not owned; non-null exactly while this object owes it one Unlock
+    HSemaphore* mpoSemaphore;  // not owned; null while nothing is held
 };
 
 /// @}

@@ -19,7 +19,7 @@ void HCondVar::Signal() const { SignalCondition(mpoCondition); }
 void HCondVar::Broadcast() const { BroadcastCondition(mpoCondition); }
 
 void HCondVar::Wait(const HMutex& mutex) const {
-    // Without a limit there is nothing to tell but that it woke up.
+    // Without a timeout the result is always true.
     static_cast<void>(WaitOnCondition(mpoCondition, mutex.mpoCriticalSection, kForever));
 }
 

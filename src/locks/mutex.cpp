@@ -1,4 +1,4 @@
-// HMutex passes every call to the platform's lock; HMutexLock adds the orders of releasing and taking.
+// HMutex passes every call to the platform's lock; HMutexLock releases before it acquires.
 #include "zanbase/mutex.h"
 
 #include <cstdlib>

@@ -1,14 +1,15 @@
-// The two read-write locks on the steps of read_write_steps.h, and the orders of their scoped holders.
+// The two read-write locks on the steps of read_write_steps.h, and their scoped holders.
 #include "zanbase/read_write_mutex.h"
 
 #include "locks/read_write_steps.h"
-#include "zanbase/thread.h"
+#include "platform/lock.h"
 
 namespace {
 
 using Downgrade = HReadWriteSteps::Downgrade;
 
-unsigned long long Self() { return HThread::GetCurrentThreadId(); }
+// Not HThread::GetCurrentThreadId: that changes in the child of a fork, and the system reuses it.
+unsigned long long Self() { return LockOwner(); }
 
 }  // namespace
 
@@ -37,7 +38,7 @@ HReaderLock::HReaderLock(const HReaderLock& other) : HReaderLock(other.mpoMutex)
 HReaderLock::~HReaderLock() { HReaderLock::Release(); }
 
 HReaderLock& HReaderLock::operator=(const HReaderLock& other) {
-    Reset(other.mpoMutex);  // the argument is read before anything is released: safe for itself
+    Reset(other.mpoMutex);  // the argument is read before anything is released, so self-assignment is safe
     return *this;
 }
 

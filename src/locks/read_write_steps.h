@@ -1,6 +1,6 @@
-// The steps of the two read-write locks, as templates over the lock, so that a test can run the very same
-// code under every order of steps. `Lock` has the members of HReadPrefMutex; what a type needs of them is
-// what is called here.
+// The steps of the two read-write locks, as templates over the lock, so that tests/models can run the shipped
+// code under every order of its steps. `Lock` has the members of HReadPrefMutex; what is called here is all
+// that a type needs of them.
 //
 //   State                       mnReaders  mnWriters  moResource  moGate
 //   free                        0          0          free        free
@@ -10,28 +10,33 @@
 //   write and read (readers     > 0        > 0        taken       held by the writer
 //     preferred only)
 //
-// Order of taking: moGate, moReaderMutex, moResource for a reader; moGate, moResource for a writer, which in
-// its last unlock takes moReaderMutex inside moWriterMutex. Nobody waits for moGate while holding
-// moReaderMutex, so readers can always leave.
+// Lock order: a reader acquires moGate, moReaderMutex, moResource; a writer acquires moGate, moResource, and
+// in its last unlock moReaderMutex inside moWriterMutex. No thread waits for moGate while it holds
+// moReaderMutex; otherwise readers could deadlock in ReadUnlock.
 //
-// Who gives back moResource: in the state "write and read" either side may leave first, and the unit has to
-// go back exactly once, with the other. Both sides decide inside moReaderMutex: the writer clears
-// mnWriterThread there before it looks at mnReaders, and a reader lowers mnReaders there before it looks at
-// mnWriterThread. So the second of them sees the first gone, and only the second. mnWriters would not do: it
-// is still above 0 when the writer has already left the unit to the readers.
+// Which side releases moResource: in the state "write and read" either side may leave first, and the unit has
+// to be released exactly once, by the side that leaves last. Both decide inside moReaderMutex: the writer
+// clears mnWriterThread before it reads mnReaders, and a reader lowers mnReaders before it reads
+// mnWriterThread. So the second of them finds that the first has left, and the first does not find that of
+// the second. mnWriters would not do: it is still above 0 when the writer has already left the unit to the
+// readers.
+//
+// mnWriterThread is relaxed: a thread acts on it only if it equals its own number, which it stored itself, or
+// inside moReaderMutex, which orders it.
 #ifndef ZANBASE_LOCKS_READ_WRITE_STEPS_H
 #define ZANBASE_LOCKS_READ_WRITE_STEPS_H
 
 #include <atomic>
+#include <utility>
 
 struct HReadWriteSteps {
     using Thread = unsigned long long;
-    static constexpr Thread kNobody = 0xFFFFFFFFFFFFFFFF;  // no thread has this identifier
+    static constexpr Thread kNoThread = 0xFFFFFFFFFFFFFFFF;  // LockOwner never returns it
 
-    // Whether readers can be inside beside the writer: its own downgrade, and those that it lets in.
+    // Whether readers can be inside beside the writer: the writer itself, and readers that follow it.
     enum class Downgrade { kAllowed, kBarred };
 
-    // Past waiting writers, as long as one reader is in.
+    // Passes waiting writers while a reader is inside.
     template <class Lock>
     static void ReadLockAtOnce(Lock& lock, Thread self) {
         lock.moReaderMutex.Lock();
@@ -40,7 +45,7 @@ struct HReadWriteSteps {
                 lock.moReaderMutex.Unlock();
                 lock.moGate.Lock();
                 lock.moReaderMutex.Lock();
-                // A writer that has left its unit to readers may have let some in meanwhile.
+                // Readers may have entered meanwhile: a writer that downgraded left its unit to them.
                 if (lock.mnReaders == 0) lock.moResource.Lock();
                 lock.moGate.Unlock();
             }
@@ -49,13 +54,13 @@ struct HReadWriteSteps {
         lock.moReaderMutex.Unlock();
     }
 
-    // Behind waiting writers, unless the thread reads already.
+    // Waits behind waiting writers, unless the thread reads already.
     template <class Lock>
     static void ReadLockInTurn(Lock& lock, Thread self) {
         lock.moReaderMutex.Lock();
-        const bool nests = TryNestedReadLock(lock, self);
+        const bool nested = TryNestedReadLock(lock, self);
         lock.moReaderMutex.Unlock();
-        if (nests) return;
+        if (nested) return;
         lock.moGate.Lock();
         lock.moReaderMutex.Lock();
         if (lock.mnReaders == 0) lock.moResource.Lock();
@@ -68,8 +73,9 @@ struct HReadWriteSteps {
     static void ReadUnlock(Lock& lock, Thread self) {
         lock.moReaderMutex.Lock();
         const auto entry = lock.moReaderThreads.find(self);
-        if (entry != lock.moReaderThreads.end() && --entry->second == 0) lock.moReaderThreads.erase(entry);
-        if (--lock.mnReaders == 0 && (kDowngrade == Downgrade::kBarred || WriterOf(lock) == kNobody))
+        if (entry != lock.moReaderThreads.end() && --entry->second == 0)
+            lock.moSpareCount = lock.moReaderThreads.extract(entry);
+        if (--lock.mnReaders == 0 && (kDowngrade == Downgrade::kBarred || WriterOf(lock) == kNoThread))
             lock.moResource.Unlock();
         lock.moReaderMutex.Unlock();
     }
@@ -77,10 +83,10 @@ struct HReadWriteSteps {
     template <class Lock>
     static void WriteLock(Lock& lock, Thread self) {
         lock.moWriterMutex.Lock();
-        const bool nests = lock.mnWriters != 0 && WriterOf(lock) == self;
-        if (nests) ++lock.mnWriters;
+        const bool nested = lock.mnWriters != 0 && WriterOf(lock) == self;
+        if (nested) ++lock.mnWriters;
         lock.moWriterMutex.Unlock();
-        if (nests) return;
+        if (nested) return;
         lock.moGate.Lock();
         lock.moResource.Lock();
         lock.moWriterMutex.Lock();
@@ -93,7 +99,7 @@ struct HReadWriteSteps {
     static void WriteUnlock(Lock& lock, Thread self) {
         lock.moWriterMutex.Lock();
         if (lock.mnWriters == 1 && WriterOf(lock) == self) {
-            GiveUpWriting<kDowngrade>(lock);
+            ReleaseFromWriter<kDowngrade>(lock);
             lock.moGate.Unlock();
         }
         --lock.mnWriters;
@@ -106,7 +112,8 @@ private:
         return lock.mnWriterThread.load(std::memory_order_relaxed);
     }
 
-    // True, and one more counted, if the thread reads already.
+    // Counts one more read lock and returns true if the thread reads already. Requires: moReaderMutex is
+    // held.
     template <class Lock>
     static bool TryNestedReadLock(Lock& lock, Thread self) {
         const auto entry = lock.moReaderThreads.find(self);
@@ -116,16 +123,23 @@ private:
         return true;
     }
 
+    // Requires: moReaderMutex is held.
     template <class Lock>
     static void CountFirst(Lock& lock, Thread self) {
         ++lock.mnReaders;
-        ++lock.moReaderThreads[self];
+        if (lock.moSpareCount.empty()) {
+            lock.moReaderThreads.emplace(self, 1U);
+            return;
+        }
+        lock.moSpareCount.key() = self;
+        lock.moSpareCount.mapped() = 1;
+        lock.moReaderThreads.insert(std::move(lock.moSpareCount));
     }
 
     template <Downgrade kDowngrade, class Lock>
-    static void GiveUpWriting(Lock& lock) {
+    static void ReleaseFromWriter(Lock& lock) {
         if (kDowngrade == Downgrade::kAllowed) lock.moReaderMutex.Lock();
-        lock.mnWriterThread.store(kNobody, std::memory_order_relaxed);
+        lock.mnWriterThread.store(kNoThread, std::memory_order_relaxed);
         if (kDowngrade == Downgrade::kBarred || lock.mnReaders == 0) lock.moResource.Unlock();
         if (kDowngrade == Downgrade::kAllowed) lock.moReaderMutex.Unlock();
     }

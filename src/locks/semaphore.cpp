@@ -1,5 +1,4 @@
-// HSemaphore passes every call to the platform's semaphore; HSemaphoreLock adds the orders of releasing and
-// taking.
+// HSemaphore passes every call to the platform's semaphore; HSemaphoreLock releases before it acquires.
 #include "zanbase/semaphore.h"
 
 #include "locks/milliseconds.h"
@@ -10,7 +9,7 @@ HSemaphore::HSemaphore(unsigned int count) : mpoHandle(NewSemaphore(count)) {}
 HSemaphore::~HSemaphore() { DeleteSemaphore(mpoHandle); }
 
 void HSemaphore::Lock() const {
-    static_cast<void>(AcquireUnit(mpoHandle, kForever));  // without a limit it returns with a unit only
+    static_cast<void>(AcquireUnit(mpoHandle, kForever));  // without a timeout the result is always true
 }
 
 bool HSemaphore::TryLock(double seconds) const { return AcquireUnit(mpoHandle, MillisecondsIn(seconds)); }
@@ -26,7 +25,8 @@ HSemaphoreLock::HSemaphoreLock(const HSemaphoreLock& other) : HSemaphoreLock(oth
 HSemaphoreLock::~HSemaphoreLock() { HSemaphoreLock::Release(); }
 
 HSemaphoreLock& HSemaphoreLock::operator=(const HSemaphoreLock& other) {
-    Reset(other.mpoSemaphore);  // the argument is read before anything is released: safe for itself
+    Reset(
+        other.mpoSemaphore);  // the argument is read before anything is released, so self-assignment is safe
     return *this;
 }
 

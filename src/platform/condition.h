@@ -5,7 +5,7 @@
 #include "platform/lock.h"
 #include "platform/wait_limit.h"
 
-// Storage for one condition; may lie in any block of the heap. There is nothing to close.
+// Storage for one condition, in any memory. There is nothing to destroy.
 struct HNativeCondition {
     alignas(8) unsigned char storage[16];
 };
@@ -13,15 +13,15 @@ struct HNativeCondition {
 // Makes the condition ready. Can't fail.
 void InitCondition(HNativeCondition* condition) noexcept;
 
-// Gives back one level of `lock`, sleeps once until a wake-up or for `limit_ms`, and takes the lock again.
-// The caller owns the lock exactly once; if it owns it more than once, others stay out while it sleeps. True
-// if it was woken, which may also be for no reason; false if the limit ran out. A limit of 0 doesn't sleep,
-// takes nobody's wake-up and gives false. A waiter that was ended by KillThread may hold up later waiters on
-// some systems; where it doesn't, the back end says so.
+// Releases one level of `lock`, sleeps once until a wake-up or for `limit_ms`, and acquires the lock again.
+// True if it was woken; spurious wake-ups are possible. False on a timeout. A limit of 0 does not sleep,
+// consumes no wake-up and returns false. On some systems a waiter that was killed by KillThread can hold up
+// later waiters; a back end where it does not says so. Thread-safe. Requires: the caller owns the lock
+// exactly once; at a deeper level the lock stays owned during the sleep.
 bool WaitOnCondition(HNativeCondition* condition, HNativeLock* lock, unsigned int limit_ms) noexcept;
 
-// Wakes one of the threads that sleep now, or all of them; nothing is kept if none does. A thread sleeps from
-// the moment its lock is free for others.
+// Wakes one of the threads that sleep now, or all of them; no effect if none does. A thread counts as asleep
+// from the moment it has released its lock. Thread-safe.
 void SignalCondition(HNativeCondition* condition) noexcept;
 void BroadcastCondition(HNativeCondition* condition) noexcept;
 

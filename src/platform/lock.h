@@ -1,9 +1,9 @@
-// Contract: the re-entrant lock under HMutex.
+// Contract: the re-entrant lock under HMutex, and the numbers by which locks know their owners.
 #ifndef ZANBASE_PLATFORM_LOCK_H
 #define ZANBASE_PLATFORM_LOCK_H
 
-// Storage for one lock. It holds no pointer to itself and needs no alignment beyond this. The back end alone
-// knows what lies inside.
+// Storage for one lock. It holds no pointer to itself and needs no more alignment. Only the back end knows
+// its content.
 struct HNativeLock {
     alignas(8) unsigned char storage[64];
 };
@@ -11,18 +11,22 @@ struct HNativeLock {
 // Makes the lock ready and free. Can't fail.
 void InitLock(HNativeLock* lock) noexcept;
 
-// Ends a lock that nobody owns.
+// Destroys a lock. Requires: no thread owns it.
 void DestroyLock(HNativeLock* lock) noexcept;
 
-// Waits until the calling thread owns the lock; a thread that owns it already passes at once and owes one
-// more ReleaseLock. A lock whose owner was ended by KillThread stays held for ever. A waiter that was ended may
-// hold up later waiters on some systems; where it doesn't, the back end says so.
+// Acquires one level of ownership; waits while another thread owns the lock. A lock whose owner was killed by
+// KillThread stays held for ever. On some systems a killed waiter can hold up later waiters; a back end where
+// it does not says so. Thread-safe, as the next two.
 void AcquireLock(HNativeLock* lock) noexcept;
 
 // The same without waiting; false if another thread owns the lock.
 bool TryAcquireLock(HNativeLock* lock) noexcept;
 
-// Gives back one level of the calling thread's ownership; at level zero the lock is free.
+// Releases one level; at level zero the lock is free. Requires: the calling thread owns the lock.
 void ReleaseLock(HNativeLock* lock) noexcept;
+
+// A number for the calling thread, constant for its life and below 2^64 - 1; no other living thread of the
+// process has it. Where the system can fork, the child's thread has the number of the forking thread.
+unsigned long long LockOwner() noexcept;
 
 #endif

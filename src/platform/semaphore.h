@@ -8,19 +8,20 @@ struct HNativeSemaphore;
 
 constexpr unsigned int kMaxUnits = 2147483647;
 
-// A semaphore with `count` units, at most kMaxUnits; throws std::bad_alloc if there is no memory for it.
+// Makes a semaphore with `count` units; more than kMaxUnits count as that. Throws std::bad_alloc if memory is
+// exhausted.
 HNativeSemaphore* NewSemaphore(unsigned int count);
 
-// Ends a semaphore that nobody waits for.
+// Destroys a semaphore. Requires: no thread waits for it.
 void DeleteSemaphore(HNativeSemaphore* semaphore) noexcept;
 
-// Takes one unit, waiting up to `limit_ms` (kForever: without end; 0: not at all) for one; false if there was
-// none. A semaphore stays whole after one of its waiters was ended by KillThread: no unit is lost, and the
-// others are served.
+// Acquires one unit; waits for it up to `limit_ms` (kForever: without a timeout; 0: not at all). False if
+// there was none. A waiter that is killed by KillThread consumes no unit and no wake-up of the others.
+// Thread-safe.
 bool AcquireUnit(HNativeSemaphore* semaphore, unsigned int limit_ms) noexcept;
 
-// Adds a unit, which any thread may do; at kMaxUnits it has no effect. Whoever takes that unit may end the
-// semaphore.
+// Releases one unit; no effect at kMaxUnits. The thread that acquires that unit may destroy the semaphore
+// while this call is still returning. Thread-safe.
 void ReleaseUnit(HNativeSemaphore* semaphore) noexcept;
 
 #endif

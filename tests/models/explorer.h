@@ -1,9 +1,9 @@
-// Runs three threads of an algorithm under every order of their steps.
+// Runs three threads of an algorithm under every order of their steps. Steps are sequentially consistent: a
+// weaker memory order is not explored; the algorithms' headers argue it.
 //
-// A thread makes the calls of its script, and each access to something shared is a step. A step is made by
-// running the call again from its start, with the results of its earlier steps played back, and leaving it by
-// an exception before the step after the new one. So a state is plain data, and one met before isn't gone
-// through again.
+// A thread makes the calls of its script, and each access to shared data is a step. To make the next step the
+// call runs again from its start: it gets the recorded results of its earlier steps, and an exception leaves
+// it before the step after the new one. So a state is plain data, and each state is explored once.
 #ifndef ZANBASE_TESTS_EXPLORER_H
 #define ZANBASE_TESTS_EXPLORER_H
 
@@ -19,7 +19,7 @@ constexpr std::size_t kDelayedStores = 2 * kThreads;  // that a model may have
 using Value = unsigned long long;
 
 struct State {
-    std::array<Value, 26> words{};  // all that is shared, and what a model notes beside it
+    std::array<Value, 26> words{};  // the shared data, and what a model notes beside it
     struct Thread {
         std::size_t call = 0;    // its place in the script
         std::vector<Value> log;  // results of the steps of this call
@@ -33,7 +33,7 @@ public:
     std::array<std::string, kThreads> scripts;  // a letter each call
     std::function<void(char)> call;
     std::function<const char*(const State&, bool at_the_end)> check;  // what is wrong, or null
-    std::function<bool(State&, std::size_t thread)> kill;  // what may end a thread, if set; false: not now
+    std::function<bool(State&, std::size_t thread)> kill;  // kills a thread, if set; false: not at this step
     std::function<bool(State&, std::size_t store)>
         deliver;  // makes a delayed store, if set; false: not there
 

@@ -193,8 +193,8 @@ bool Kill(State& state, std::size_t thread) {
 using Scripts = std::array<std::string, kThreads>;
 using IsAvailable = bool (*)(const State&);
 
-// What is wrong in some order of steps. At the end a living thread may still wait only if what it waits for is not
-// available, or if a killed thread holds the lock at `lock`.
+// What is wrong in some order of steps. At the end a living thread may still wait only if what it waits for
+// is not available, or if a killed thread holds the lock at `lock`.
 std::string Explore(std::size_t lock, IsAvailable is_available, Scripts scripts,
                     Fault seeded = Fault::kNone) {
     fault = seeded;
@@ -291,7 +291,8 @@ void CallCondition(char call) {
     lock.Release();
 }
 
-// The third thread signals. Killed before it has changed the word that it read first, it has signalled nothing.
+// The third thread signals. Killed before it has changed the word that it read first, it has signalled
+// nothing.
 bool KillOutsideStartOfSignal(State& state, std::size_t thread) {
     const std::vector<Value>& steps = state.threads[2].log;
     const bool has_changed_word = steps.size() > 2 && state.words[kWord] != steps[0];

@@ -1,5 +1,4 @@
-// The steps of the read-write locks as they are shipped, on a mutex, semaphores and fields whose every access
-// is a step.
+// The shipped steps of the read-write locks, on a mutex, semaphores and fields whose every access is a step.
 #include "locks/read_write_steps.h"
 
 #include <gtest/gtest.h>
@@ -10,30 +9,30 @@ namespace {
 
 using Downgrade = HReadWriteSteps::Downgrade;
 
-// The fields; then what the model notes of each thread: what it holds, and whether as a writer it has let
-// readers in.
+// Places in State::words: the fields; then for each thread the locks that it holds, and whether it has
+// admitted readers while it writes.
 constexpr std::size_t kReaders = 0, kWriters = 1, kWriter = 2, kReaderMutex = 3, kWriterMutex = 4,
                       kResource = 5, kGate = 6, kEntries = 7, kCounts = kEntries + kThreads,
-                      kReads = kCounts + kThreads, kWrites = kReads + kThreads, kOpened = kWrites + kThreads;
+                      kReads = kCounts + kThreads, kWrites = kReads + kThreads, kAdmits = kWrites + kThreads;
 enum class Fault { kNone, kWriterLooksOutside, kReaderLooksAtDepth };
 
 Fault fault = Fault::kNone;
-char call = 0;  // that runs: r, R, w or W for ReadLock, ReadUnlock, WriteLock, WriteUnlock
+char call = 0;  // the running one: r, R, w, W for ReadLock, ReadUnlock, WriteLock, WriteUnlock
 
 struct Mutex {
     std::size_t place;
-    bool IsForgotten() const {
+    bool IsLeftOut() const {
         return fault == Fault::kWriterLooksOutside && call == 'W' && place == kReaderMutex;
     }
     void Lock() const {
-        if (IsForgotten()) return;
+        if (IsLeftOut()) return;
         Change(place, [](Value owner) {
             if (owner != 0) Explorer::Block();
             return explorer.self + 1;
         });
     }
     void Unlock() const {
-        if (!IsForgotten()) Set(place, 0);
+        if (!IsLeftOut()) Set(place, 0);
     }
 };
 
@@ -42,13 +41,13 @@ struct Semaphore {
     void Lock() const {
         Change(place, [this](Value units) {
             if (place == kGate && explorer.now.words[kReaderMutex] == explorer.self + 1)
-                Explorer::Fail("at the gate with the reader mutex");
+                Explorer::Fail("waits for the gate with the reader mutex");
             if (units == 0) Explorer::Block();
             return units - 1;
         });
     }
     void Unlock() const {
-        if (Add(place, 1) != 0) Explorer::Fail("given back twice");
+        if (Add(place, 1) != 0) Explorer::Fail("released twice");
     }
 };
 
@@ -62,9 +61,17 @@ struct Number {
 struct Writer {
     Value load(std::memory_order) const {
         if (fault != Fault::kReaderLooksAtDepth || call != 'R') return Get(kWriter);
-        return Get(kWriters) == 0 ? HReadWriteSteps::kNobody : 0;
+        return Get(kWriters) == 0 ? HReadWriteSteps::kNoThread : 0;
     }
     void store(Value value, std::memory_order) const { Set(kWriter, value); }
+};
+
+// The spare entry saves allocations and changes nothing else: the model has none.
+struct Spare {
+    bool empty() const { return true; }
+    Value& key() { return mKey; }
+    Value& mapped() { return mKey; }
+    Value mKey = 0;
 };
 
 struct Table {
@@ -77,22 +84,27 @@ struct Table {
     };
     Entry end() const { return {kThreads}; }
     Entry find(Value thread) const { return Get(kEntries + thread) != 0 ? Entry{thread} : end(); }
-    void erase(const Entry& entry) const { Set(kEntries + entry.thread, 0); }
-    Number operator[](Value thread) const {
-        Set(kEntries + thread, 1);
-        return {kCounts + thread};
+    Spare extract(const Entry& entry) const {
+        Set(kEntries + entry.thread, 0);
+        return {};
     }
+    void emplace(Value thread, unsigned int count) const {
+        Set(kEntries + thread, 1);
+        Set(kCounts + thread, count);
+    }
+    void insert(Spare&&) const {}
 };
 
 struct Lock {
     Number mnReaders{kReaders}, mnWriters{kWriters};
     Table moReaderThreads;
+    Spare moSpareCount;
     Writer mnWriterThread;
     Mutex moReaderMutex{kReaderMutex}, moWriterMutex{kWriterMutex};
     Semaphore moResource{kResource}, moGate{kGate};
 };
 
-// A lock counts as held from the return of its call to the start of its unlock. A writer lets readers in from
+// A lock counts as held from the return of its call to the start of its unlock. A writer admits readers from
 // the start of its own read lock.
 template <Downgrade kDowngrade>
 void Make(char letter) {
@@ -102,7 +114,7 @@ void Make(char letter) {
     const std::size_t self = explorer.self;
     call = letter;
     if (letter == 'R' || letter == 'W') Add((letter == 'R' ? kReads : kWrites) + self, -1);
-    if (letter == 'r' && Get(kWrites + self) != 0) Set(kOpened + self, 1);
+    if (letter == 'r' && Get(kWrites + self) != 0) Set(kAdmits + self, 1);
     if (letter == 'r') kReadLock(lock, self);
     if (letter == 'w') HReadWriteSteps::WriteLock(lock, self);
     if (letter == 'R') HReadWriteSteps::ReadUnlock<kDowngrade>(lock, self);
@@ -112,7 +124,7 @@ void Make(char letter) {
 
 State Free() {
     State state;
-    state.words[kWriter] = HReadWriteSteps::kNobody;
+    state.words[kWriter] = HReadWriteSteps::kNoThread;
     state.words[kResource] = state.words[kGate] = 1;
     return state;
 }
@@ -123,11 +135,11 @@ const char* Wrong(const State& state, bool at_the_end) {
         for (std::size_t other = 0; other < kThreads; ++other) {
             if (writer == other || state.words[kWrites + writer] == 0) continue;
             if (state.words[kWrites + other] != 0) return "two writers";
-            if (state.words[kReads + other] != 0 && state.words[kOpened + writer] == 0) return "a reader too";
+            if (state.words[kReads + other] != 0 && state.words[kAdmits + writer] == 0) return "a reader too";
         }
     }
     State free = Free();
-    for (std::size_t place = kOpened; place < free.words.size(); ++place)
+    for (std::size_t place = kAdmits; place < free.words.size(); ++place)
         free.words[place] = state.words[place];
     return at_the_end && state.words != free.words ? "not free in the end" : nullptr;
 }
@@ -150,12 +162,12 @@ std::string Explore(void (*make)(char), const std::vector<std::string>& scripts,
     return "";
 }
 
-TEST(ReadWriteModel, IsWholeInEveryOrderOfStepsAndFindsFaults) {
+TEST(ReadWriteModel, HoldsInEveryOrderOfStepsAndFindsFaults) {
     constexpr auto kReadPref = Make<Downgrade::kAllowed>, kWritePref = Make<Downgrade::kBarred>;
     const std::vector<std::string> scripts{"rR", "rrRR", "wW", "wwWW", "wrWR", "wrRW"};
     EXPECT_EQ(Explore(kReadPref, scripts, Fault::kNone), "");
     EXPECT_EQ(Explore(kWritePref, {"rR", "rrRR", "wW", "wwWW", "rRwW"}, Fault::kNone), "");
-    EXPECT_EQ(Explore(kReadPref, scripts, Fault::kWriterLooksOutside), "given back twice: rR rR wrRW");
+    EXPECT_EQ(Explore(kReadPref, scripts, Fault::kWriterLooksOutside), "released twice: rR rR wrRW");
     EXPECT_EQ(Explore(kReadPref, scripts, Fault::kReaderLooksAtDepth), "a deadlock: rR rR wW");
 }
 

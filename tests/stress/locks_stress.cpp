@@ -1,5 +1,5 @@
-// All locks under many threads, with what they promise checked all the time: for a second, or as many times
-// longer as the argument says. A broken promise ends it with a message, a lost unit or wake-up with a hang.
+// All locks under many threads, with their contracts checked all the time: for a second, or as many times
+// longer as the argument says. A broken contract ends it with a message, a lost unit or wake-up with a hang.
 #include <cstdio>
 #include <cstdlib>
 #include <random>

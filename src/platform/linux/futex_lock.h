@@ -10,10 +10,10 @@
 // sleeper runs; under contention one thread so does many short sections in a row, and the lock's cache line
 // stays with it. Spinning was measured and lost: it moves the line and the lock at every release.
 //
-// Memory order. The acquire loads of 0 in TryAcquireFree and AcquireContended read the value of the release store in
-// Release (or a later value of the same release sequence, which read-modify-writes continue), so an owner
-// happens after the previous owner. mnState needs no order beyond that: the kernel compares the word and
-// queues the sleeper in one step against a wake-up, so a waiter either sees the 0 or is woken.
+// Memory order. The acquire loads of 0 in TryAcquireFree and AcquireContended read the value of the release
+// store in Release (or a later value of the same release sequence, which read-modify-writes continue), so an
+// owner happens after the previous owner. mnState needs no order beyond that: the kernel compares the word
+// and queues the sleeper in one step against a wake-up, so a waiter either sees the 0 or is woken.
 //   mnOwner is relaxed. Only the owner stores its own number, and clears it before the release store. So a
 // thread reads its own number exactly if it stored it and still holds the lock, whatever else it may read.
 //   mnDepth is plain: the owner alone reads and writes it.

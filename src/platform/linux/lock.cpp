@@ -14,6 +14,8 @@ SystemLock::Thread NumberLockThread() noexcept {
     return tnLockThread;
 }
 
+unsigned long long LockOwner() noexcept { return LockThread(); }
+
 void InitLock(HNativeLock* lock) noexcept { new (lock->storage) SystemLock; }
 
 void DestroyLock(HNativeLock*) noexcept {}

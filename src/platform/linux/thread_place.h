@@ -47,6 +47,7 @@ inline long long ResultIn(const ucontext_t&) noexcept { return 0; }
 // True if the instruction at `code` is a system call. A thread that a signal interrupts in a system call is
 // at this instruction if the kernel restarts the call, and behind it if the call fails with EINTR.
 inline bool IsSystemCall(std::uintptr_t code) noexcept {
+    // NOLINTNEXTLINE(performance-no-int-to-ptr): a register holds the address
     return std::memcmp(reinterpret_cast<const void*>(code), kSystemCallCode, sizeof kSystemCallCode) == 0;
 }
 

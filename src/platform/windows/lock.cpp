@@ -14,3 +14,5 @@ void AcquireLock(HNativeLock* lock) noexcept { EnterCriticalSection(In(lock)); }
 bool TryAcquireLock(HNativeLock* lock) noexcept { return TryEnterCriticalSection(In(lock)) != 0; }
 
 void ReleaseLock(HNativeLock* lock) noexcept { LeaveCriticalSection(In(lock)); }
+
+unsigned long long LockOwner() noexcept { return GetCurrentThreadId(); }
