@@ -7,12 +7,12 @@
 #include "diskio/ledger.h"
 
 // Hours, minutes, seconds and hundredths, "00:00:00.00", each cut and never rounded. Hours take as many
-// digits as they need; the parts of a negative time are negative. NaN counts as 0, and a time whose whole
-// seconds a 32-bit integer can't hold as the nearest that it can.
+// digits as they need; the parts of a negative time are negative. NaN counts as 0. A time whose whole seconds
+// don't fit a 32-bit integer counts as the nearest time that does.
 std::string DiskIOTimeText(double seconds);
 
-// The block of one file, blank line included. A kind of operation that never happened has no line, but for
-// opens and closes.
+// The block of one file with its blank line. Open and close always have a line, other operations only if
+// their count is not 0.
 std::string DiskIOFileText(const std::string& name, const DiskIOUsage& usage);
 
 // The table of sums over `files`.

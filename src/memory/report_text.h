@@ -1,4 +1,4 @@
-// Texts that the printed reports share, as functions without a state.
+// Texts that the printed reports share, as functions without state.
 #ifndef ZANBASE_MEMORY_REPORT_TEXT_H
 #define ZANBASE_MEMORY_REPORT_TEXT_H
 
@@ -16,10 +16,10 @@ std::string KiloSizeText(double kilobytes);
 // `text` filled with blanks to `width`, on the left if `rightAlign`, else on the right. Nothing is ever cut.
 std::string FitField(const std::string& text, unsigned int width, bool rightAlign);
 
-// `path` from the "src/" of its first "/src/" on; whole if there is none.
+// `path` from the "src/" of its first "/src/"; unchanged if there is none.
 std::string ShortSourcePath(const std::string& path);
 
-// Writes `text` in one call. What becomes of it is up to the stream's owner.
+// Writes `text` in one call. A failure of the stream is not reported.
 void WriteText(std::FILE* stream, const std::string& text);
 
 #endif

@@ -1,7 +1,7 @@
 // The one ring of name slots.
 //
-//   mnLastSlot: -1 at load, then 0, 1, … 255, 0, …; only a take moves it, under moRingMutex.
-//   A slot is its taker's until the 256th take after; filling and reading it need no lock.
+//   mnLastSlot: -1 at load, then 0, 1, … 255, 0, …; changed by TakeSlot only, under moRingMutex.   A slot
+// belongs to the caller that took it until the 256th take after; no lock is needed to fill or read it.
 #ifndef ZANBASE_TEXT_NAME_RING_H
 #define ZANBASE_TEXT_NAME_RING_H
 

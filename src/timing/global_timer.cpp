@@ -1,4 +1,4 @@
-// The timers: slots in rows, names beside them.
+// The timers: rows of slots, and the names.
 //
 // A slot is running exactly while moStart has a value:
 //
@@ -19,9 +19,8 @@
 
 namespace {
 
-// The value of GetMicroSeconds as a whole number, without the way through a double, which is exact for some
-// 285 years and makes a toggle a seventh slower. Differences are right modulo 2^64, also for a clock before
-// 1970.
+// The value of GetMicroSeconds as a whole number. A double would be exact for 285 years, but makes a toggle a
+// seventh slower. Differences are right modulo 2^64, also for a clock before 1970.
 unsigned long long ReadClock() {
     const WallClock now = ReadWallClock();
     return static_cast<unsigned long long>(now.seconds) * 1000000 + now.milliseconds * 1000ULL;
@@ -37,7 +36,7 @@ struct GlobalTimer::TimerSlot {
 struct GlobalTimer::Impl {
     Impl() : moRows(static_cast<std::size_t>(OMPGetMaxThreads())) {}
 
-    // At exit nobody is left to be told that the report could not be made.
+    // At exit no caller is left to receive an exception.
     ~Impl() {
         try {
             Report();

@@ -1,4 +1,4 @@
-// Splits whole seconds into units; the largest that is there decides where the text begins.
+// Splits whole seconds into units; the text begins with the largest unit that is not 0.
 #include "timing/time_text.h"
 
 #include "zanbase/string_makers.h"
