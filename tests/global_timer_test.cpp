@@ -91,8 +91,7 @@ TEST(GlobalTimer, AddsUpOverGrowingTeams) {
 // Timers are registered while the other members of the team toggle theirs.
 TEST(GlobalTimer, RegistersTimersInATeam) {
     std::string report;
-    for (int timer = 0; timer < 400; ++timer) report += "t: 0.002
-";
+    for (int timer = 0; timer < 400; ++timer) report += "t: 0.002\n";
     const std::string output = OutputOf([] {
 #pragma omp parallel num_threads(4)
         for (int round = 0; round < 100; ++round) Spend(Timers().RegisterNewTimer("t"), 2);

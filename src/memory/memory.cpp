@@ -64,8 +64,8 @@ public:
         node.key() = ptr;
         node.mapped() = block;
         mpoMemoryMap->insert(mpoMemoryMap->cend(), std::move(node));
-        if (node.empty())
-            --spare.mnCount;  // NOLINT(bugprone-use-after-move): a node that was not inserted stays in it
+        // A node that was not inserted stays in `node`. NOLINTNEXTLINE(bugprone-use-after-move)
+        if (node.empty()) --spare.mnCount;
     }
 
     static void DropBlock(MemoryMap::const_iterator block) {

@@ -32,8 +32,9 @@ void HMemory::UsageReport(std::FILE* stream) {
     if (mpoFileMap == nullptr || mpoFileMap->empty()) return;
     std::vector<UsageRow> rows;
     rows.reserve(mpoFileMap->size());
-    for (const auto& [site, usage] : *mpoFileMap)
+    for (const auto& [site, usage] : *mpoFileMap) {
         rows.push_back({site.first, site.second, usage.mnAllocated, usage.mnFreed, usage.mnAllocCount,
                         usage.mnFreeCount});
+    }
     WriteText(stream, UsageReportText(rows, mnPeekMemory));
 }
