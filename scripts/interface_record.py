@@ -20,6 +20,7 @@ def common_spelling(text):
                   text.replace("[abi:cxx11]", ""))
     text = re.sub(r"\b(long long|long|short) unsigned int\b", r"unsigned \1", text)
     text = re.sub(r"\b((?:unsigned )?(?:long long|long|short)) int\b", r"\1", text)
+    text = re.sub(r"(?<=[<,])( ?)([\w: ]+) const(?=[,>])", r"\1const \2", text)
     return re.sub(r" (?=[*&>])", "", text)
 
 
