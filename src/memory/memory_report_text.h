@@ -27,8 +27,8 @@ struct UsageRow {
 // A table of `groups`, largest last, with totals; groups of one size stay in their order.
 std::string LeakReportText(const std::vector<LeakGroup>& groups);
 
-// A section for each of `rows`, largest last, with totals and the peak; rows of one size stay in their order, and
-// those below a small share of the total are summed up.
+// A section for each of `rows`, largest last, with totals and the peak; rows of one size stay in their order,
+// and those below a small share of the total are summed up.
 std::string UsageReportText(const std::vector<UsageRow>& rows, std::size_t peak);
 
 #endif

@@ -49,5 +49,65 @@ cpp) # rows by line, also of libraries that are loaded at the same address one a
     same <(echo 1 6 36 6 36) <(reported one.c) one.c
     same <(echo 1 4 16 4 16) <(reported two.c) two.c
     ;;
+options) # comparison, budgets, a report on a signal, children, an allocator behind the recorder
+    "$@" "$here/small.c" -o small
+    expect 0 "$record" --json --output a.json ./small leak 10
+    expect 0 "$record" --json --output b.json ./small leak 30
+    expect 0 "$record" compare a.json a.json
+    expect 1 "$record" compare a.json b.json
+    says '^grew  *+320  *+320  *+20  .*/small\.c:[0-9]*$' out
+    expect 0 "$record" compare --tolerance 1000 a.json b.json
+    expect 2 "$record" compare a.json missing.json
+    says missing.json
+
+    expect 0 "$record" --output report --max-leaked 160 --max-peak 1M --max-calls 100 --max-read 1K --max-opens 5 \
+        ./small leak 10
+    expect 3 "$record" --output report --max-leaked 159 ./small leak 10
+    says 'bytes leaked: 160 exceed the budget of 159; most: .*/small\.c:[0-9]* (160)'
+    expect 7 "$record" --output report --max-calls 0 ./small status 7
+
+    expect 0 "$record" --signal USR1 --json --output signalled.json ./small signal
+    cmp -s kept.json signalled.json && fail "no second report"
+    says '"live_bytes":512' kept.json
+
+    expect 0 "$record" --follow --csv --output child.%p ./small children
+    [ "$(grep -l 'small.c",[0-9]*,1,1000,1000,0,1,0' child.* | wc -l)" = 2 ] || fail "not both children were recorded"
+    expect 0 "$record" --csv --output alone.%p ./small children
+    [ "$(find . -name 'alone.*' | wc -l)" = 1 ] || fail "children were recorded unasked"
+
+    expect 0 "$record" --folded --output report ./small leak 10
+    says ';small\.c:[0-9]* 160$' report
+    # An allocator behind the recorder serves the program, and is recorded all the same.
+    "$@" -shared -fPIC -DALLOCATOR "$here/small.c" -o allocator.so
+    expect 0 env LD_PRELOAD=./allocator.so "$record" --csv --output report ./small leak 10
+    says 'small\.c",[0-9]*,10,160,160,0,10,0' report
+    says 'blocks from the allocator: yes' out
+    ;;
+hostile) # what can't be recorded is said; programs that make it hard end as they do alone
+    "$@" "$here/small.c" -pthread -o small
+    "$@" -static "$here/small.c" -pthread -o static
+    "$@" -fsanitize=address "$here/small.c" -pthread -o sanitized
+    "$@" -rdynamic -DALLOCATOR "$here/small.c" -pthread -o allocating
+    expect 125 "$record" ./static leak 1
+    says 'linked statically'
+    expect 125 "$record" ./sanitized leak 1
+    says 'sanitizer build'
+    expect 0 "$record" --csv --output report ./allocating leak 1
+    says 'allocator of its own'
+    expect 127 "$record" ./missing
+    expect 125 "$record" --output
+    expect 139 "$record" --output report ./small fault
+    says 'signal 11'
+    expect 0 "$record" --output report ./small replaced
+    says 'left no report'
+    expect 0 "$record" --output /dev/full ./small leak 1
+    says 'cannot write /dev/full: No space left on device'
+    expect 0 "$record" --output report ./small leak 1 $(seq 100000)
+    says 'Memory Leak Report' report
+    expect 0 "$record" --output report bash -c "exec 0<&- 1>&- 2>&-; exec 3<&-; ulimit -n 16; :"
+    says 'Memory Usage Report' report
+    expect 0 "$record" --csv --output report ./small threads 100000
+    says 'small\.c",[0-9]*,0,0,1600000,1600000,100000,100000' report
+    ;;
 *) fail "no such case: $case" ;;
 esac

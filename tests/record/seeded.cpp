@@ -1,5 +1,5 @@
-// A C++ program with known rows: a comment "row" tells calls, bytes, live blocks and live bytes of its line. Its
-// arguments are two plug-ins that are loaded one after the other.
+// A C++ program with known rows: a comment "row" tells calls, bytes, live blocks and live bytes of its line.
+// Its arguments are two plug-ins that are loaded one after the other.
 #include <dlfcn.h>
 
 #include <algorithm>

@@ -11,7 +11,8 @@ namespace {
 
 using Json = nlohmann::json;
 
-// Names that are no text have their bytes in hexadecimal beside them; for a comparison the readable form will do.
+// Names that are no text have their bytes in hexadecimal beside them; for a comparison the readable form will
+// do.
 HMemorySnapshot ReadMemory(const Json& json) {
     HMemorySnapshot memory;
     memory.mnTotal = json.at("total");

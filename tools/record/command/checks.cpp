@@ -1,4 +1,5 @@
-// What can be told of a program before it runs: whether the loader will load the recorder, and what allocates.
+// What can be told of a program before it runs: whether the loader will load the recorder, and what
+// allocates.
 #include "checks.h"
 
 #include <algorithm>

@@ -38,8 +38,8 @@ std::string PreloadLibrary() {
     return {};
 }
 
-// The library writes there that it reported, and which budgets broke. The number is one that programs leave alone; it
-// stays open in the program and its children.
+// The library writes there that it reported, and which budgets broke. The number is one that programs leave
+// alone; it stays open in the program and its children.
 int MakeResultFile() {
     constexpr int kFirst = 900;
     const int low = memfd_create("zanbase-record", MFD_CLOEXEC);

@@ -1,5 +1,5 @@
-// An ELF file of this machine's class, mapped and read with every offset checked: what the command looks at before a
-// run, and where the preload library finds the names of functions.
+// An ELF file of this machine's class, mapped and read with every offset checked: what the command looks at
+// before a run, and where the preload library finds the names of functions.
 #ifndef ZANBASE_RECORD_ELF_FILE_H
 #define ZANBASE_RECORD_ELF_FILE_H
 
@@ -33,8 +33,8 @@ public:
     // The names of the libraries that the file is linked against.
     std::vector<std::string> NeededLibraries() const;
 
-    // Calls `use` with the name, address and size of every function that the file defines; `dynamicOnly` leaves out
-    // those that the loader doesn't see.
+    // Calls `use` with the name, address and size of every function that the file defines; `dynamicOnly`
+    // leaves out those that the loader doesn't see.
     void ForEachFunction(bool dynamicOnly,
                          const std::function<void(const char*, std::uint64_t, std::uint64_t)>& use) const;
 

@@ -1,4 +1,5 @@
-// What the command tells the preload library: the settings of a run, as text in one variable of the environment.
+// What the command tells the preload library: the settings of a run, as text in one variable of the
+// environment.
 #ifndef ZANBASE_RECORD_SETTINGS_H
 #define ZANBASE_RECORD_SETTINGS_H
 

@@ -1,7 +1,8 @@
 // The shards: open hash tables with linear probing, which keep no marks of what was removed.
 //
-// An entry has two words: the block's address and site packed into one, and the size. Zero is no entry. Between two
-// sections under a shard's lock, every entry can be reached from its home slot without crossing an empty one.
+// An entry has two words: the block's address and site packed into one, and the size. Zero is no entry.
+// Between two sections under a shard's lock, every entry can be reached from its home slot without crossing
+// an empty one.
 #include "block_table.h"
 
 #include <array>

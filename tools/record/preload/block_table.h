@@ -1,5 +1,6 @@
-// The memory account: live blocks by address and usage by call site. It is split into shards by address, each with a
-// lock of its own, so that threads with heaps of their own seldom meet; the total and its peak are shared counters.
+// The memory account: live blocks by address and usage by call site. It is split into shards by address, each
+// with a lock of its own, so that threads with heaps of their own seldom meet; the total and its peak are
+// shared counters.
 #ifndef ZANBASE_RECORD_BLOCK_TABLE_H
 #define ZANBASE_RECORD_BLOCK_TABLE_H
 

@@ -10,8 +10,8 @@
 
 namespace recorder {
 
-// Calls `real` and returns its result; a result of 0 or more counts as `operation` of the file behind `descriptor`,
-// with that many bytes if `operation` moves bytes.
+// Calls `real` and returns its result; a result of 0 or more counts as `operation` of the file behind
+// `descriptor`, with that many bytes if `operation` moves bytes.
 template <class Call>
 auto Operate(DiskOperation operation, int descriptor, const Call& real) {
     FileRecord* const file = Wants(kDisk) ? FileOf(descriptor) : nullptr;
@@ -24,7 +24,8 @@ auto Operate(DiskOperation operation, int descriptor, const Call& real) {
     return result;
 }
 
-// Calls `real`, which opens `path`, and counts the open of the descriptor that `descriptorOf` finds in its result.
+// Calls `real`, which opens `path`, and counts the open of the descriptor that `descriptorOf` finds in its
+// result.
 template <class Call, class Descriptor>
 auto Open(const char* path, const Call& real, const Descriptor& descriptorOf) {
     if (!Wants(kDisk)) return real();
@@ -38,8 +39,8 @@ auto Open(const char* path, const Call& real, const Descriptor& descriptorOf) {
     return result;
 }
 
-// Descriptors that the recorder itself needs until the end: a program that closes all it finds must not close them.
-// Ascending; those that are not in use are above any descriptor.
+// Descriptors that the recorder itself needs until the end: a program that closes all it finds must not close
+// them. Ascending; those that are not in use are above any descriptor.
 const std::array<unsigned int, 2>& OwnDescriptors();
 
 inline bool IsOwnDescriptor(int descriptor) {

@@ -1,7 +1,8 @@
 // The disk account: what was done with each regular file, and which file each descriptor stands for.
 //
-// A descriptor carries a mark of its own: not looked at yet, no regular file, or a file's record. A close takes the
-// mark away, so what reuses the number (a socket, a directory) is looked at anew and never credited to the old file.
+// A descriptor carries a mark of its own: not looked at yet, no regular file, or a file's record. A close
+// takes the mark away, so what reuses the number (a socket, a directory) is looked at anew and never credited
+// to the old file.
 #ifndef ZANBASE_RECORD_FILES_H
 #define ZANBASE_RECORD_FILES_H
 
@@ -35,8 +36,9 @@ struct FileRecord {
     FileRecord* next;
 };
 
-// The record that `descriptor` stands for, or null if it is no regular file. A descriptor that was not looked at yet
-// was opened where no hook sees it, and that open is counted without time, unless a hook will count it.
+// The record that `descriptor` stands for, or null if it is no regular file. A descriptor that was not looked
+// at yet was opened where no hook sees it, and that open is counted without time, unless a hook will count
+// it.
 FileRecord* FileOf(int descriptor);
 
 void CountOperation(FileRecord& file, DiskOperation operation, std::uint64_t bytes,
@@ -45,8 +47,8 @@ void CountOperation(FileRecord& file, DiskOperation operation, std::uint64_t byt
 // `descriptor` was opened as `path`, which may be null. Counts it, and marks the descriptor.
 void CountOpen(int descriptor, const char* path, std::uint64_t nanoseconds);
 
-// Takes the mark away; returns the record that it led to, or null. A child of vfork, whose descriptors are its own but
-// whose memory is its parent's, leaves the mark and gets null.
+// Takes the mark away; returns the record that it led to, or null. A child of vfork, whose descriptors are
+// its own but whose memory is its parent's, leaves the mark and gets null.
 FileRecord* ForgetDescriptor(int descriptor);
 
 // `copy` now stands for what `descriptor` stands for.

@@ -8,8 +8,8 @@
 
 namespace recorder {
 
-// The canonical frame address (CFA) is a register plus an offset; the return address lies in the word below it, and
-// the caller's frame pointer is saved at an offset from it or still in its register.
+// The canonical frame address (CFA) is a register plus an offset; the return address lies in the word below
+// it, and the caller's frame pointer is saved at an offset from it or still in its register.
 struct FrameRule {
     bool known;
     bool from_frame_pointer;  // otherwise from the stack pointer

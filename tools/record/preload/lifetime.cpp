@@ -1,5 +1,5 @@
-// The recorder's life in the program: settings at the start, what a fork or a signal asks for, and the report at the
-// end, whichever way the program takes there.
+// The recorder's life in the program: settings at the start, what a fork or a signal asks for, and the report
+// at the end, whichever way the program takes there.
 #include <cerrno>
 #include <csignal>
 #include <cstdio>
@@ -111,8 +111,8 @@ void Finish() {
     Report(true);
 }
 
-// Runs after all destructors, since it was registered before any of the program's. Streams are flushed after that,
-// so it is done here once more, to be counted.
+// Runs after all destructors, since it was registered before any of the program's. Streams are flushed after
+// that, so it is done here once more, to be counted.
 void FinishAtExit(void* /*argument*/) {
     if (gProcess != 0 && syscall(SYS_getpid) == gProcess) std::fflush(nullptr);
     Finish();
@@ -128,8 +128,9 @@ void EndForkInParent() {
     if (__libc_single_threaded == 0 && _IO_list_unlock != nullptr) _IO_list_unlock();
 }
 
-// Most children start another program at once, so a followed one is emptied of its parent's account only when it has
-// something to record. A child of a process with threads has one, but the C library's flag doesn't tell.
+// Most children start another program at once, so a followed one is emptied of its parent's account only when
+// it has something to record. A child of a process with threads has one, but the C library's flag doesn't
+// tell.
 void EndForkInChild() {
     UnlockSites();
     if (__libc_single_threaded == 0 && _IO_list_resetlock != nullptr) _IO_list_resetlock();

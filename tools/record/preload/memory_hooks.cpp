@@ -1,5 +1,5 @@
-// The hooks of the C allocators. A block is recorded after it was taken and dropped before it is freed: between the
-// two no other thread can get a block at its address.
+// The hooks of the C allocators. A block is recorded after it was taken and dropped before it is freed:
+// between the two no other thread can get a block at its address.
 #include <cerrno>
 #include <cstddef>
 #include <cstdlib>

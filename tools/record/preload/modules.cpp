@@ -1,5 +1,5 @@
-// The modules, from the kernel's list of mappings. The loader is never asked: its lock may be held by a thread that
-// waits for the recorder.
+// The modules, from the kernel's list of mappings. The loader is never asked: its lock may be held by a
+// thread that waits for the recorder.
 #include "modules.h"
 
 #include <algorithm>
@@ -70,7 +70,8 @@ void Open(Module& module) {
     });
 }
 
-// One line of the list: "first-end rwxp offset device inode   path". Lines of other mappings than code give nothing.
+// One line of the list: "first-end rwxp offset device inode   path". Lines of other mappings than code give
+// nothing.
 void ReadMapping(const char* line, const char* line_end, ModuleList& found) {
     char* rest = nullptr;
     const std::uintptr_t start = std::strtoul(line, &rest, 16);

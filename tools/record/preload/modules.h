@@ -1,4 +1,5 @@
-// The program's modules: the files that are mapped as code, by address. All functions require the lock of the sites.
+// The program's modules: the files that are mapped as code, by address. All functions require the lock of the
+// sites.
 #ifndef ZANBASE_RECORD_MODULES_H
 #define ZANBASE_RECORD_MODULES_H
 

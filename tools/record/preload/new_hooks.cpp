@@ -1,6 +1,7 @@
-// The hooks of operator new and delete. Most runtimes take memory from malloc, whose hook then does the recording: the
-// caller that asked is left for it in the thread's state. An allocator that serves operator new by itself never gets
-// there, and the block is recorded after it was taken. No hook needs a cleanup when the program's operator throws.
+// The hooks of operator new and delete. Most runtimes take memory from malloc, whose hook then does the
+// recording: the caller that asked is left for it in the thread's state. An allocator that serves operator
+// new by itself never gets there, and the block is recorded after it was taken. No hook needs a cleanup when
+// the program's operator throws.
 #include <cstddef>
 #include <cstdlib>
 #include <new>

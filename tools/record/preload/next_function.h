@@ -1,5 +1,5 @@
-// The functions behind the hooks: those that the program would have reached without the recorder, be they the C
-// library's or those of an allocator that is preloaded too.
+// The functions behind the hooks: those that the program would have reached without the recorder, be they the
+// C library's or those of an allocator that is preloaded too.
 #ifndef ZANBASE_RECORD_NEXT_FUNCTION_H
 #define ZANBASE_RECORD_NEXT_FUNCTION_H
 
@@ -7,14 +7,15 @@
 
 namespace recorder {
 
-// Looks `name` up behind this library, also among libraries that were loaded for one other library only. Null if
-// there is none. What the loader allocates meanwhile does not reach a hook that needs the same look-up.
+// Looks `name` up behind this library, also among libraries that were loaded for one other library only. Null
+// if there is none. What the loader allocates meanwhile does not reach a hook that needs the same look-up.
 void* FindNext(const char* name);
 
 // True while this thread is in FindNext.
 bool IsLookingUp();
 
-// One function, looked up at its first call. Constant-initialised, so it can be used before any constructor ran.
+// One function, looked up at its first call. Constant-initialised, so it can be used before any constructor
+// ran.
 template <class Function>
 class NextFunction {
 public:

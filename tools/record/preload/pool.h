@@ -1,5 +1,5 @@
-// Memory of the recorder's own, taken from the system rather than from the program's heap: many small blocks between
-// those of the program would cost it more than the recording itself.
+// Memory of the recorder's own, taken from the system rather than from the program's heap: many small blocks
+// between those of the program would cost it more than the recording itself.
 #ifndef ZANBASE_RECORD_POOL_H
 #define ZANBASE_RECORD_POOL_H
 

@@ -10,7 +10,8 @@
 
 namespace recorder {
 
-// Bits of gState. Events before the library's constructor are recorded; whether they are wanted is known then.
+// Bits of gState. Events before the library's constructor are recorded; whether they are wanted is known
+// then.
 constexpr unsigned int kMemory = 1;
 constexpr unsigned int kDisk = 2;
 constexpr unsigned int kAttention = 4;  // the next event first does what a signal or a fork has asked for
@@ -27,8 +28,8 @@ inline bool Wants(unsigned int kind) {
     return (state & kind) != 0;
 }
 
-// True for an address in this library's code. What that code allocates is not recorded, also where no guard is set yet,
-// and its containers don't call the program's operators.
+// True for an address in this library's code. What that code allocates is not recorded, also where no guard
+// is set yet, and its containers don't call the program's operators.
 bool IsOwnCode(std::uintptr_t pc);
 
 // Records a block that `caller` got; null is no block. Requires: Wants(kMemory).

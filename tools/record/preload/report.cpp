@@ -1,4 +1,5 @@
-// The report: both accounts as snapshots, from there the library's own tables or its writers for other programs.
+// The report: both accounts as snapshots, from there the library's own tables or its writers for other
+// programs.
 #include "report.h"
 
 #include <algorithm>

@@ -1,5 +1,5 @@
-// Call sites. Every return address is looked at once, under a lock; its answer goes to a table that is read without
-// one. The answer is a site, or the rule that leads to the caller's frame, or that the climb ends.
+// Call sites. Every return address is looked at once, under a lock; its answer goes to a table that is read
+// without one. The answer is a site, or the rule that leads to the caller's frame, or that the climb ends.
 #include "sites.h"
 
 #include <array>
@@ -43,8 +43,9 @@ FrameRule UnpackRule(std::uint64_t answer) {
             -static_cast<std::int32_t>(answer >> 36)};
 }
 
-// The answers by return address. Readers take no lock: a slot's answer is written before its key, and a key is never
-// replaced by another one. A full table is replaced; the old one stays, since a reader may still be in it.
+// The answers by return address. Readers take no lock: a slot's answer is written before its key, and a key
+// is never replaced by another one. A full table is replaced; the old one stays, since a reader may still be
+// in it.
 struct Slot {
     std::atomic<std::uintptr_t> key;
     std::atomic<std::uint64_t> answer;
@@ -232,8 +233,8 @@ void RetireUnmappedSites() {
     }
 }
 
-// Functions are looked up here rather than when a site is met: most programs have far more sites than rows of interest
-// at their start, and a runtime library's table is read once for all its sites.
+// Functions are looked up here rather than when a site is met: most programs have far more sites than rows of
+// interest at their start, and a runtime library's table is read once for all its sites.
 std::vector<SiteText> DescribeSites() {
     const SpinLockScope lock(gLock);
     std::unordered_map<const Module*, std::vector<Function>> functions;

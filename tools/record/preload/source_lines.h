@@ -1,5 +1,6 @@
-// What a module's debug information and unwind tables tell of an address. Built in two ways: over libdw, or, without
-// it, as one that knows nothing, so that sites are named by functions. Requires the lock of the sites.
+// What a module's debug information and unwind tables tell of an address. Built in two ways: over libdw, or,
+// without it, as one that knows nothing, so that sites are named by functions. Requires the lock of the
+// sites.
 #ifndef ZANBASE_RECORD_SOURCE_LINES_H
 #define ZANBASE_RECORD_SOURCE_LINES_H
 
@@ -28,11 +29,12 @@ public:
     SourceLines(const SourceLines&) = delete;
     SourceLines& operator=(const SourceLines&) = delete;
 
-    // The innermost line at `address` of the file that lies outside of system headers and skipped functions, where
-    // the functions that were inlined there count one by one.
+    // The innermost line at `address` of the file that lies outside of system headers and skipped functions,
+    // where the functions that were inlined there count one by one.
     SourcePlace Find(std::uint64_t address);
 
-    // How the frame of the code at `address` leads to that of its caller; a rule without meaning if it can't be told.
+    // How the frame of the code at `address` leads to that of its caller; a rule without meaning if it can't
+    // be told.
     FrameRule RuleAt(std::uint64_t address);
 
 private:

@@ -1,5 +1,6 @@
-// Lines and unwind rules by libdw. Each module's file is given to it as an image in memory, so no descriptor stays open,
-// and units are found by a table of our own: not all compilers write the section that would lead to them.
+// Lines and unwind rules by libdw. Each module's file is given to it as an image in memory, so no descriptor
+// stays open, and units are found by a table of our own: not all compilers write the section that would lead
+// to them.
 #include <algorithm>
 #include <cstdlib>
 #include <cstring>
@@ -53,8 +54,8 @@ std::string PathIn(Dwarf_Die* unit, const char* path) {
     return whole[0] == '/' ? CleanPath(whole) : whole;
 }
 
-// Adds the functions below `parent` that hold `address`, outermost first: the one that has the code, then those that were
-// inlined there. Namespaces hold functions, but have no addresses of their own.
+// Adds the functions below `parent` that hold `address`, outermost first: the one that has the code, then
+// those that were inlined there. Namespaces hold functions, but have no addresses of their own.
 void CollectFunctions(Dwarf_Die* parent, Dwarf_Addr address, std::vector<Dwarf_Die>& functions) {
     Dwarf_Die child;
     for (int more = dwarf_child(parent, &child); more == 0; more = dwarf_siblingof(&child, &child)) {

@@ -6,8 +6,8 @@
 
 namespace recorder {
 
-// The sections are short, but their thread may be off the processor: after some rounds a waiter sleeps, which also
-// lets a holder of lower priority run.
+// The sections are short, but their thread may be off the processor: after some rounds a waiter sleeps, which
+// also lets a holder of lower priority run.
 void SpinLock::AcquireSlowly() {
     constexpr int kRounds = 200;
     constexpr long kLongestPause = 1000000;  // nanoseconds

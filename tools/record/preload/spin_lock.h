@@ -1,5 +1,5 @@
-// The lock of the recorder's tables. It is constant-initialised, never destroyed, can be reset in a forked child, and
-// costs no atomic operation while the process has one thread.
+// The lock of the recorder's tables. It is constant-initialised, never destroyed, can be reset in a forked
+// child, and costs no atomic operation while the process has one thread.
 #ifndef ZANBASE_RECORD_SPIN_LOCK_H
 #define ZANBASE_RECORD_SPIN_LOCK_H
 

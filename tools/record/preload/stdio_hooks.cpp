@@ -1,6 +1,7 @@
-// The C library's streams. Their calls of the kernel don't go through any function that can be replaced, but through
-// two tables of the library that it exports; the entries for reading, writing, seeking and closing are replaced there.
-// So each inner call is counted once, whatever made the stream. Opens are counted by hooks of the functions.
+// The C library's streams. Their calls of the kernel don't go through any function that can be replaced, but
+// through two tables of the library that it exports; the entries for reading, writing, seeking and closing
+// are replaced there. So each inner call is counted once, whatever made the stream. Opens are counted by
+// hooks of the functions.
 #include <cstdint>
 #include <cstdio>
 

@@ -1,4 +1,5 @@
-// What the hooks keep for each thread: the guard against recording the recorder, and the code that asked for memory.
+// What the hooks keep for each thread: the guard against recording the recorder, and the code that asked for
+// memory.
 #ifndef ZANBASE_RECORD_THREAD_STATE_H
 #define ZANBASE_RECORD_THREAD_STATE_H
 

@@ -1,0 +1,80 @@
+// Programs of a few lines each, chosen by the first argument; with ALLOCATOR, also an allocator of its own.
+#define _GNU_SOURCE
+#include <pthread.h>
+#include <signal.h>
+#include <stdio.h>
+#include <stdlib.h>
+#include <string.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+static void* volatile gSink;
+
+#ifdef ALLOCATOR
+// Hands out one array from front to back and takes nothing back.
+static _Alignas(16) char gArray[1 << 26];
+static size_t gUsed;
+
+void* malloc(size_t size) {
+    char* block = gArray + __atomic_fetch_add(&gUsed, (size + 31) / 16 * 16, __ATOMIC_RELAXED);
+    *(size_t*)block = size;
+    return block + 16;
+}
+void free(void* block) { (void)block; }
+void* calloc(size_t count, size_t size) { return malloc(count * size); }
+void* realloc(void* old, size_t size) {
+    void* block = malloc(size);
+    return old == NULL ? block : memcpy(block, old, size < ((size_t*)old)[-2] ? size : ((size_t*)old)[-2]);
+}
+int IsFromAllocator(void) { return 1; }
+#endif
+extern int IsFromAllocator(void) __attribute__((weak));
+
+static void* FreeThere(void* block) {
+    free(block);
+    return NULL;
+}
+
+static void Threads(int count) {
+    for (int i = 0; i < count; ++i) {
+        pthread_t thread;
+        void* const block = malloc(16);
+        if (pthread_create(&thread, NULL, FreeThere, block) != 0) abort();
+        pthread_join(thread, NULL);
+    }
+}
+
+// One child allocates by itself, the other starts this program anew.
+static void Children(char* program) {
+    if (fork() == 0) {
+        gSink = malloc(1000);
+        exit(0);
+    }
+    wait(NULL);
+    if (fork() == 0) execl(program, program, "one", NULL);
+    wait(NULL);
+}
+
+static void Signal(void) {
+    gSink = malloc(512);
+    raise(SIGUSR1);
+    free(malloc(1));
+    if (system("cp signalled.json kept.json") != 0) abort();
+    free(gSink);
+}
+
+int main(int count, char** words) {
+    const char* what = count > 1 ? words[1] : "";
+    const int number = count > 2 ? atoi(words[2]) : 0;
+    if (strcmp(what, "leak") == 0)
+        for (int i = 0; i < number; ++i) gSink = malloc(16);
+    if (strcmp(what, "one") == 0) gSink = malloc(1000);
+    if (strcmp(what, "status") == 0) return gSink = malloc(1), number;
+    if (strcmp(what, "threads") == 0) Threads(number);
+    if (strcmp(what, "children") == 0) Children(words[0]);
+    if (strcmp(what, "signal") == 0) Signal();
+    if (strcmp(what, "fault") == 0) raise(SIGSEGV);
+    if (strcmp(what, "replaced") == 0) execl("/bin/true", "true", NULL);
+    if (IsFromAllocator != NULL) puts("blocks from the allocator: yes");
+    return 0;
+}
