@@ -53,7 +53,7 @@ std::string FramesOf(std::string_view path) {
             if (!frames.empty() && frames.back() != ';') frames += ';';
         } else if (length == 0) {
             frames += "\xEF\xBF\xBD";
-        } else if (byte == ';' || byte == '\x7F' || (byte >= 0 && byte < ' ')) {
+        } else if (byte == ';' || byte == '\x7F' || static_cast<unsigned char>(byte) < ' ') {
             frames += '_';
         } else {
             frames += path.substr(0, length);
