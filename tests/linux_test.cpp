@@ -61,6 +61,7 @@ TEST(LinuxThread, DoesNotEnterItsBodyOnceKilled) {
         slot.load()->mbKillRequested = true;  // as KillThread does
     }
     KillThread(slot);
+    ReapKilledThreads();  // in case it ended before the call above, with no waiter
 }
 
 TEST(LinuxThread, LeavesABlockedSignalToItsReader) {
