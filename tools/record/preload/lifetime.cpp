@@ -1,15 +1,11 @@
 // The recorder's life in the program: settings at the start, what a fork or a signal asks for, and the report
 // at the end, whichever way the program takes there.
-#include <cerrno>
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
-#include <cstring>
 
 #include <dlfcn.h>
-#include <fcntl.h>
 #include <pthread.h>
-#include <sys/resource.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
@@ -19,7 +15,7 @@
 #include "next_function.h"
 #include "pool.h"
 #include "recording.h"
-#include "report.h"
+#include "report_output.h"
 #include "sites.h"
 #include "stdio_tables.h"
 
@@ -47,60 +43,10 @@ NextFunction<void(int)> gExitNow{"_exit"};
 NextFunction<void(int)> gQuickExit{"quick_exit"};
 
 Settings* gSettings = nullptr;  // made at the start, never destroyed
-int gError = STDERR_FILENO;     // a copy with a high number: programs close standard error before they exit
 int gProcess = 0;
-std::array<unsigned int, 2> gOwn{~0U, ~0U};
 std::atomic<bool> gReportWanted{false};
 std::atomic<bool> gIsFreshChild{false};
 std::atomic<bool> gFinished{false};
-
-bool WriteAll(int file, const std::string& text) {
-    std::size_t written = 0;
-    while (written < text.size()) {
-        const long step = syscall(SYS_write, file, text.data() + written, text.size() - written);
-        if (step < 0 && errno == EINTR) continue;
-        if (step <= 0) return false;
-        written += static_cast<std::size_t>(step);
-    }
-    return true;
-}
-
-void Say(const std::string& text) { WriteAll(gError, "zanbase-record: " + text + "\n"); }
-
-std::string OutputPath() {
-    std::string path = gSettings->output;
-    const std::string process = std::to_string(gProcess);
-    for (std::size_t at = path.find("%p"); at != std::string::npos; at = path.find("%p", at + process.size()))
-        path.replace(at, 2, process);
-    return path;
-}
-
-// A file holds the newest report only.
-void WriteReport(const std::string& text) {
-    if (gSettings->output.empty()) {
-        WriteAll(gError, text);
-        return;
-    }
-    const std::string path = OutputPath();
-    const auto file = static_cast<int>(
-        syscall(SYS_openat, AT_FDCWD, path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666));
-    const bool written = file >= 0 && WriteAll(file, text);
-    const int error = errno;
-    if (file >= 0) syscall(SYS_close, file);
-    if (!written) Say("cannot write " + path + ": " + std::strerror(error));
-}
-
-// Requires: the thread is inside the recorder.
-void Report(bool is_last) {
-    try {
-        std::string broken;
-        WriteReport(ReportText(*gSettings, is_last ? &broken : nullptr));
-        if (is_last && gSettings->result_descriptor >= 0)
-            WriteAll(gSettings->result_descriptor, std::string(kReportedLine) + "\n" + broken);
-    } catch (...) {
-        WriteAll(gError, "zanbase-record: memory ran out, so there is no report\n");
-    }
-}
 
 // The program has ended, but for what the C library itself still does.
 void Finish() {
@@ -108,7 +54,7 @@ void Finish() {
     if (gIsFreshChild) Attend();
     const InsideScope scope;
     gState = 0;
-    Report(true);
+    Report(*gSettings, gProcess, true);
 }
 
 // Runs after all destructors, since it was registered before any of the program's. Streams are flushed after
@@ -148,14 +94,6 @@ void AskForReport(int /*signal*/) {
     gState |= kAttention;
 }
 
-// The largest number that is free, within what any process may use.
-int MoveHigh(int descriptor) {
-    rlimit limit{};
-    constexpr rlim_t kBelow = 1024;
-    const rlim_t end = getrlimit(RLIMIT_NOFILE, &limit) == 0 ? std::min(limit.rlim_cur, kBelow) : kBelow;
-    return fcntl(descriptor, F_DUPFD_CLOEXEC, static_cast<int>(end > 16 ? end - 16 : 3));
-}
-
 // Programs that are not to be recorded find the environment that they would have had.
 void RestoreEnvironment() {
     unsetenv(kSettingsVariable);
@@ -166,19 +104,10 @@ void RestoreEnvironment() {
     }
 }
 
-void TakeDescriptors() {
-    const int error = MoveHigh(STDERR_FILENO);
-    if (error >= 0) gError = error;
-    const int result = gSettings->result_descriptor;
-    if (!gSettings->follow && result >= 0) fcntl(result, F_SETFD, FD_CLOEXEC);
-    gOwn = {error >= 0 ? static_cast<unsigned int>(error) : ~0U, static_cast<unsigned int>(result)};
-    std::sort(gOwn.begin(), gOwn.end());
-}
-
 void StartRecording() {
     __cxa_atexit(&FinishAtExit, nullptr, nullptr);
     pthread_atfork(&PrepareFork, &EndForkInParent, &EndForkInChild);
-    TakeDescriptors();
+    TakeDescriptors(*gSettings);
     for (const std::string& name : gSettings->skipped_functions) SkipFunction(name);
     if (gSettings->signal != 0) {
         struct sigaction action {};
@@ -215,8 +144,6 @@ __attribute__((constructor)) void Start() {
 
 }  // namespace
 
-const std::array<unsigned int, 2>& OwnDescriptors() { return gOwn; }
-
 unsigned int Attend() {
     const InsideScope scope;
     gState &= ~kAttention;
@@ -225,7 +152,7 @@ unsigned int Attend() {
         ResetBlocksInChild();
         ResetFilesInChild();
     }
-    if (gReportWanted.exchange(false)) Report(false);
+    if (gReportWanted.exchange(false)) Report(*gSettings, gProcess, false);
     return gState;
 }
 
