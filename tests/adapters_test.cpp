@@ -159,6 +159,21 @@ TEST(RecordedStream, ReadsWritesAndSeeksInOneFile) {
     HDiskIOReset();
 }
 
+TEST(RecordedStream, StepsBackBeyondWhatItHasBuffered) {
+    const std::string name = testing::TempDir() + "recorded_step_back";
+    std::ofstream(name, std::ios::binary) << std::string(65536, 'a') << "bc";
+    std::error_code error;
+    HRecordedStreambuf buffer(HRecordedDescriptor::Open(name, {}, error));
+    std::istream stream(&buffer);
+    stream.ignore(65536);
+    EXPECT_EQ(stream.peek(), 'b');
+    EXPECT_EQ(stream.tellg(), 65536);
+    EXPECT_EQ(stream.unget().get(), 'a');
+    EXPECT_EQ(stream.get(), 'b');
+    EXPECT_TRUE(buffer.Close());
+    std::remove(name.c_str());
+}
+
 TEST(RecordedStream, KeepsTheFirstError) {
     std::error_code error;
     HRecordedStreambuf buffer(HRecordedDescriptor::Open("/dev/full", {O_WRONLY}, error));

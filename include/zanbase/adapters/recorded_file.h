@@ -55,14 +55,17 @@ public:
     /// An object that is not open.
     HRecorded() = default;
     HRecorded(HRecorded&&) noexcept = default;
-    /// Closes the file that this object owned.
+    /// Takes what `other` owns and closes the file that this object owned.
     HRecorded& operator=(HRecorded&& other) noexcept {
-        Drop();
-        moState = std::move(other.moState);
+        HRecorded taken(std::move(other));
+        std::swap(moState, taken.moState);
         return *this;
     }
     /// Closes the file if it is open. An error goes unreported: call `Close` where data must be safe.
-    ~HRecorded() { Drop(); }
+    ~HRecorded() {
+        std::error_code ignored;
+        if (IsOpen()) Close(ignored);
+    }
 
     /// Opens `name` and records that.
     [[nodiscard]] static HRecorded Open(const std::string& name, Mode mode, std::error_code& error) {
@@ -78,8 +81,8 @@ public:
             return file;
         }
         error.clear();
+        HDiskIOOpen(name, state.get(), seconds);
         file.moState = std::move(state);
-        HDiskIOOpen(name, file.moState.get(), seconds);
         return file;
     }
 
@@ -138,7 +141,7 @@ public:
             return;
         }
         const Clock::time_point start = Clock::now();
-        const int result = Calls::Close(closing->moNative);
+        const int result = Calls::Close(std::exchange(closing->moNative, Calls::kClosed));
         const double seconds = SecondsSince(start);
         if (result != 0) {
             error.assign(errno, std::generic_category());
@@ -153,6 +156,14 @@ private:
 
     // Its address is the handle in the ledger.
     struct State {
+        State() = default;
+        // Closes what `Close` has not closed: the file of an open that the ledger has no memory for.
+        ~State() {
+            if (moNative != Calls::kClosed) Calls::Close(moNative);
+        }
+        State(const State&) = delete;
+        State& operator=(const State&) = delete;
+
         typename Calls::Native moNative = Calls::kClosed;
     };
 
@@ -178,11 +189,6 @@ private:
             record(result, seconds);
         }
         return result;
-    }
-
-    void Drop() noexcept {
-        std::error_code ignored;
-        if (IsOpen()) Close(ignored);
     }
 
     std::unique_ptr<State> moState;  // null if there is no open file

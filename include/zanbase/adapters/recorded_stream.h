@@ -23,9 +23,10 @@
 ///     for (std::string line; std::getline(in, line);) Use(line);
 ///     if (buffer.GetError()) std::fprintf(stderr, "%s\n", buffer.GetError().message().c_str());
 ///
-/// Positions are bytes of the file; there is one position for reading and writing. A failure below shows as the
-/// end of the file or as the stream's `badbit`, and its reason in `GetError`. The destructor writes what is
-/// left and ignores errors: call `Close` where data must be safe. One thread at a time.
+/// Positions are bytes of the file; there is one position for reading and writing. Where the file has none (a
+/// pipe), `tellg`, `seekg` and `sync` fail and lose nothing that was read. A failure below shows as the end of
+/// the file or as the stream's `badbit`, and its reason in `GetError`. The bytes of a failed write are lost. The
+/// destructor writes what is left and ignores errors: call `Close` where data must be safe. One thread at a time.
 class HRecordedStreambuf : public std::streambuf {
 public:
     /// Takes over `file`; if that is not open, nothing can be read or written.
@@ -47,13 +48,14 @@ public:
     /// The first failure since the buffer was made.
     [[nodiscard]] const std::error_code& GetError() const noexcept { return moError; }
 
-    /// Writes what is left and closes the file; false if any of the two failed or no file was open.
+    /// Writes what is left and closes the file; false if that or any call before it failed, see `GetError`.
     bool Close() {
-        const bool is_written = WriteBuffer();
+        WriteBuffer();
         setg(nullptr, nullptr, nullptr);
         std::error_code error;
         moFile.Close(error);
-        return Keep(error) && is_written;
+        Keep(error);
+        return !moError;
     }
 
 protected:
@@ -73,16 +75,30 @@ protected:
         return traits_type::not_eof(byte);
     }
 
+    // At the start of the area, reads again from one byte before.
+    int_type pbackfail(int_type byte) override {
+        if (gptr() != eback()) {
+            gbump(-1);
+        } else if (seekoff(-1, std::ios_base::cur, std::ios_base::in) == pos_type(off_type(-1)) ||
+                   traits_type::eq_int_type(underflow(), traits_type::eof())) {
+            return traits_type::eof();
+        }
+        if (!traits_type::eq_int_type(byte, traits_type::eof())) *gptr() = traits_type::to_char_type(byte);
+        return traits_type::not_eof(byte);
+    }
+
     int sync() override { return DropReadAhead() && WriteBuffer() ? 0 : -1; }
 
+    // A question for the position keeps what was read ahead.
     pos_type seekoff(off_type offset, std::ios_base::seekdir direction, std::ios_base::openmode) override {
-        if (sync() != 0) return pos_type(off_type(-1));
+        const bool is_tell = offset == 0 && direction == std::ios_base::cur;
+        if (is_tell ? !WriteBuffer() : sync() != 0) return pos_type(off_type(-1));
         const int origin = direction == std::ios_base::beg   ? SEEK_SET
                            : direction == std::ios_base::cur ? SEEK_CUR
                                                              : SEEK_END;
         std::error_code error;
         const long long position = moFile.Seek(offset, origin, error);
-        return pos_type(Keep(error) ? position : -1);
+        return pos_type(Keep(error) ? position - (egptr() - gptr()) : -1);
     }
 
     pos_type seekpos(pos_type position, std::ios_base::openmode which) override {
@@ -104,14 +120,15 @@ private:
         return Keep(error);
     }
 
-    // Sets the file back to the position that the reader has reached.
+    // Sets the file back to the position that the reader has reached. Keeps the bytes if it has no position.
     bool DropReadAhead() {
-        const auto unread = static_cast<long long>(egptr() - gptr());
+        if (const long long unread = egptr() - gptr(); unread != 0) {
+            std::error_code error;
+            moFile.Seek(-unread, SEEK_CUR, error);
+            if (!Keep(error)) return false;
+        }
         setg(nullptr, nullptr, nullptr);
-        if (unread == 0) return true;
-        std::error_code error;
-        moFile.Seek(-unread, SEEK_CUR, error);
-        return Keep(error);
+        return true;
     }
 
     // True if `error` is none; otherwise it is kept if it is the first.
