@@ -9,11 +9,12 @@
 
 #include <pthread.h>
 
-// Exported by glibc and declared in no header.
+// Exported by glibc and declared in no header. Weak: a C library without them must still load this one. A fork
+// then acquires the locks alone.
 extern "C" {
-void _IO_list_lock();
-void _IO_list_unlock();
-void _IO_list_resetlock();
+[[gnu::weak]] void _IO_list_lock();
+[[gnu::weak]] void _IO_list_unlock();
+[[gnu::weak]] void _IO_list_resetlock();
 }
 
 namespace {
@@ -22,11 +23,15 @@ bool (*gpfnTryAcquire)();
 void (*gpfnAcquire)();
 void (*gpfnRelease)();
 
+bool HasStreamList() {
+    return _IO_list_lock != nullptr && _IO_list_unlock != nullptr && _IO_list_resetlock != nullptr;
+}
+
 void BeforeFork() {
     for (;;) {
-        _IO_list_lock();
+        if (HasStreamList()) _IO_list_lock();
         if (gpfnTryAcquire()) return;
-        _IO_list_unlock();
+        if (HasStreamList()) _IO_list_unlock();
         gpfnAcquire();  // only waits until the locks are free
         gpfnRelease();
     }
@@ -34,13 +39,13 @@ void BeforeFork() {
 
 void InParent() {
     gpfnRelease();
-    _IO_list_unlock();
+    if (HasStreamList()) _IO_list_unlock();
 }
 
 // fork() resets the list in the child of a process with threads, so there it is not owned any more.
 void InChild() {
     gpfnRelease();
-    _IO_list_resetlock();
+    if (HasStreamList()) _IO_list_resetlock();
 }
 
 }  // namespace
