@@ -1,5 +1,5 @@
 // The condition variable beside the standard library's for any lock, both with a re-entrant mutex: two
-// threads that pass the turn back and forth, and a signal that nobody waits for.
+// threads that pass the turn back and forth, and a signal without a waiter.
 #include "zanbase/condition_variable.h"
 
 #include <benchmark/benchmark.h>

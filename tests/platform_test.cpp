@@ -29,7 +29,8 @@ TEST(PlatformClock, SleepsNoLessThanAsked) {
 }
 
 TEST(PlatformProcessors, AreKnownAndAtLeastAsManyAsCores) {
-    EXPECT_TRUE(CountLogicalProcessors() >= 1 && CountProcessorCores() <= CountLogicalProcessors());
+    EXPECT_GE(CountLogicalProcessors(), 1);
+    EXPECT_LE(CountProcessorCores(), CountLogicalProcessors());
 }
 
 TEST(PlatformSemaphore, KeepsItsMostUnits) {

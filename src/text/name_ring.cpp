@@ -5,7 +5,7 @@
 
 namespace {
 
-// The text ends at the end of the slot; what stands before it is left from earlier turns.
+// The text ends at the end of the slot; the bytes before it are left from earlier uses.
 template <class Integer>
 char* DecimalName(Integer value) {
     char* const terminator = goNameRing.TakeSlot() + kTextBytes - 1;

@@ -23,7 +23,7 @@
 // Held while rows or timers are added.
 extern HMutex& goTimerGrowthMutex;  // built in load_time.cpp, never destroyed
 
-// What throws std::bad_alloc here has changed nothing that can be seen.
+// An operation that throws std::bad_alloc has no visible effect.
 template <class Slot>
 class RowTable {
 public:

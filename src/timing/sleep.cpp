@@ -1,4 +1,4 @@
-// The sleep hook and the routine that stands in it until a caller installs another.
+// The sleep hook and its default routine, which is used until a caller installs another.
 #include "zanbase/sleep.h"
 
 #include <algorithm>
@@ -8,7 +8,7 @@
 
 namespace {
 
-// Waits for a tenth of the requested time at least, one tick at the fewest: the single pause is expected to
+// Waits for at least a tenth of the requested time and at least one tick: the single pause is expected to
 // take the rest. The difference of two readings is right across the wrap of the tick count too.
 void SleepByTicks(int microseconds) {
     const auto amount = static_cast<unsigned int>(microseconds);

@@ -6,14 +6,14 @@
 //   0 -> 2   Acquire by a waiter, which can't know whether others sleep
 //   1 -> 0   Release                              2 -> 0   Release, which then wakes one sleeper
 //
-// A waiter does not spin. The owner that wakes a sleeper goes on and may acquire the lock again before the
-// sleeper runs; under contention one thread so does many short sections in a row, and the lock's cache line
-// stays with it. Spinning was measured and lost: it moves the line and the lock at every release.
+// A waiter does not spin. The owner that wakes a sleeper may acquire the lock again before the sleeper runs.
+// Under contention one thread therefore runs many short critical sections in a row, and the lock's cache line
+// stays in its cache. Spinning was measured and lost: it moves the line and the lock at every release.
 //
 // Memory order. The acquire loads of 0 in TryAcquireFree and AcquireContended read the value of the release
 // store in Release (or a later value of the same release sequence, which read-modify-writes continue), so an
-// owner happens after the previous owner. mnState needs no order beyond that: the kernel compares the word
-// and queues the sleeper in one step against a wake-up, so a waiter either sees the 0 or is woken.
+// owner happens after the previous owner. mnState needs no order beyond that: to the kernel, comparing the
+// word and queueing the sleeper are one atomic step, so a waiter either sees the 0 or is woken.
 //   mnOwner is relaxed. Only the owner stores its own number, and clears it before the release store. So a
 // thread reads its own number exactly if it stored it and still holds the lock, whatever else it may read.
 //   mnDepth is plain: the owner alone reads and writes it.

@@ -7,8 +7,7 @@
 //   Exiting   the body has ended; TLS destructors run, and a thread waits for them  Ended
 //   Killed    the thread makes a few last steps of our own; its stack remains      Reaping
 //   Reaping   a waiter, or the next StartThread, is in pthread_join for it         Ended
-//   Ended     only waiters use the block                                           Starting, after the free
-//   list
+//   Ended     only waiters use the block                                           Starting, when reused
 //
 // A slot points to a block only while the block is Starting or Running, and no longer after DetachThread.
 // A thread whose body ends calls pthread_detach for itself. A killed thread can't, so another thread has to

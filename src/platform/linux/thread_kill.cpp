@@ -29,8 +29,8 @@ void DropThreadKeys() noexcept {
     for (pthread_key_t key = 0; key < PTHREAD_KEYS_MAX; ++key) pthread_setspecific(key, nullptr);
 }
 
-// Asks the thread of `block` to exit and waits until it has done so or has put it off. True if it has to be
-// asked again.
+// Requests that the thread of `block` exit, and waits until it exited or deferred the kill. Returns true if
+// the request must be repeated.
 // Requires: the calling thread is a waiter of the block.
 bool RequestKill(HNativeThread* block) noexcept {
     const bool output_is_held = StandardOutputIsHeld();
