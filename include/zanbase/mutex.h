@@ -28,10 +28,9 @@ struct HNativeLock;
 ///
 /// Misuse is not detected: releasing by a thread that does not own the mutex, releasing too often, and
 /// destroying an owned mutex have undefined behaviour. A thread killed by `HThread::Kill` while it owns a
-/// mutex owns it for ever; a killed waiter does not hold up other waiters on Linux; on Windows it may. Not
-/// async-signal-safe. After
+/// mutex owns it for ever; a killed waiter does not hold up other waiters on Linux; on Windows it may. After
 /// `fork` the child's thread owns what the forking thread owned; mutexes of other threads stay owned for ever
-/// there.
+/// there. Not async-signal-safe.
 class ZANBASE_API HMutex {
 public:
     /// Makes a free mutex. Its lock is a heap block of its own from `HMalloc`, which see for exhausted

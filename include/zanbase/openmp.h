@@ -25,10 +25,6 @@
 /// it, and scopes end in reverse order. The functions are thread-safe, inside parallel regions too.
 ///
 /// Not for the threads of a single region: its `num_threads` clause does that.
-///
-/// A process may have a second OpenMP runtime, if another library was built by another compiler. The scopes
-/// and functions here speak to the runtime that the library was built with, and don't see the teams of
-/// another one: `OMPGetThreadNum` returns 0 in every member of such a team.
 #ifndef ZANBASE_OPENMP_H
 #define ZANBASE_OPENMP_H
 

@@ -8,7 +8,7 @@
 //
 // A waiter does not spin. The owner that wakes a sleeper may acquire the lock again before the sleeper runs.
 // Under contention one thread therefore runs many short critical sections in a row, and the lock's cache line
-// stays in its cache. Spinning was measured and lost: it moves the line and the lock at every release.
+// stays with its processor. Spinning was measured and lost: it moves the line and the lock at every release.
 //
 // Memory order. The acquire loads of 0 in TryAcquireFree and AcquireContended read the value of the release
 // store in Release (or a later value of the same release sequence, which read-modify-writes continue), so an

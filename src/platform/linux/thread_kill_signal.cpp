@@ -32,8 +32,8 @@ bool IsDeliverable(int signal) noexcept {
     return sigismember(&with_it, signal) == 1;
 }
 
-// The highest real-time signal below SIGRTMAX that has no handler; 0 if there is none. A signal in `excluded` is taken only if
-// all others have a handler.
+// The highest real-time signal below SIGRTMAX that has no handler; 0 if there is none. A signal in `excluded`
+// is taken only if all others have a handler.
 int FindUnusedSignal(const sigset_t& excluded) noexcept {
     int excluded_choice = 0;
     for (int signal = SIGRTMAX - 1; signal >= SIGRTMIN; --signal) {
