@@ -33,8 +33,7 @@ struct HNativeLock;
 /// there. Not async-signal-safe.
 class ZANBASE_API HMutex {
 public:
-    /// Makes a free mutex. Its lock is a heap block of its own from `HMalloc`, which see for exhausted
-    /// memory.
+    /// Makes a free mutex. Allocates its lock with `HMalloc`, which tells what happens if memory is exhausted.
     HMutex();
     /// Requires: no thread owns the mutex or waits for it. Not thread-safe.
     ~HMutex();
@@ -43,8 +42,8 @@ public:
     /// calling thread owns it already. Thread-safe.
     void Lock() const;
 
-    /// Acquires one level of ownership if no other thread owns the mutex, and never blocks. True if it did,
-    /// also if the calling thread owned the mutex before: one `Unlock` has to follow. Thread-safe.
+    /// Acquires one level of ownership if no other thread owns the mutex, and never blocks. Returns true if it
+    /// did; then one `Unlock` must follow, also if the calling thread owned the mutex before. Thread-safe.
     [[nodiscard]] bool TryLock() const;
 
     /// Releases one level of ownership. Requires: the calling thread owns the mutex. Thread-safe.

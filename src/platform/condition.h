@@ -15,9 +15,9 @@ void InitCondition(HNativeCondition* condition) noexcept;
 
 // Releases one level of `lock`, sleeps once until a wake-up or for `limit_ms`, and acquires the lock again.
 // True if it was woken; spurious wake-ups are possible. False on a timeout. A limit of 0 does not sleep,
-// consumes no wake-up and returns false. On some systems a waiter that was killed by KillThread can hold up
-// later waiters; a back end where it does not says so. Thread-safe. Requires: the caller owns the lock
-// exactly once; at a deeper level the lock stays owned during the sleep.
+// consumes no wake-up and returns false. A waiter that was killed by KillThread may block later waiters, unless
+// the back end says that it does not. Thread-safe. Requires: the caller owns the lock exactly once; if it owns
+// it more often, the lock stays owned during the sleep.
 bool WaitOnCondition(HNativeCondition* condition, HNativeLock* lock, unsigned int limit_ms) noexcept;
 
 // Wakes one of the threads that sleep now, or all of them; no effect if none does. A thread counts as asleep

@@ -2,8 +2,8 @@
 #ifndef ZANBASE_PLATFORM_LOCK_H
 #define ZANBASE_PLATFORM_LOCK_H
 
-// Storage for one lock. It holds no pointer to itself and needs no more alignment. Only the back end knows
-// its content.
+// Storage for one lock. Its content, which only the back end knows, holds no pointer to itself and needs no
+// alignment beyond 8.
 struct HNativeLock {
     alignas(8) unsigned char storage[64];
 };
@@ -15,8 +15,8 @@ void InitLock(HNativeLock* lock) noexcept;
 void DestroyLock(HNativeLock* lock) noexcept;
 
 // Acquires one level of ownership; waits while another thread owns the lock. A lock whose owner was killed by
-// KillThread stays held for ever. On some systems a killed waiter can hold up later waiters; a back end where
-// it does not says so. Thread-safe, as the next two.
+// KillThread stays held for ever. A killed waiter may block later waiters, unless the back end says that it
+// does not. Thread-safe, as the next two.
 void AcquireLock(HNativeLock* lock) noexcept;
 
 // The same without waiting; false if another thread owns the lock.

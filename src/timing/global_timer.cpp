@@ -19,8 +19,8 @@
 
 namespace {
 
-// The value of GetMicroSeconds as a whole number. A double would be exact for 285 years, but makes a toggle a
-// seventh slower. Differences are right modulo 2^64, also for a clock before 1970.
+// The value of GetMicroSeconds as a whole number. A double would be exact until the year 2255, but a toggle
+// would take a seventh longer. Differences are right modulo 2^64, also for a clock before 1970.
 unsigned long long ReadClock() {
     const WallClock now = ReadWallClock();
     return static_cast<unsigned long long>(now.seconds) * 1000000 + now.milliseconds * 1000ULL;

@@ -1,12 +1,13 @@
-// Rows of slots, one row a thread: slots stay where they are while the table grows and threads use it.
+// Rows of slots, one row for each thread: the address of a slot never changes, so threads can use their slots
+// while the table grows.
 //
 //   mpoTable -> newest table -> segments of row 0, segments of row 1, …   (each a block of kSegmentSlots slots;
 //                                                                          older tables have the same segments)
 //
 // - A slot is written by the thread of its row, or with exclusive access to the table.
-// - A table is not changed once mpoTable points at it. A larger one takes its place, and the older ones stay,
-//   because a thread may still be reading them.
-// - Segments start and end at pairs of cache lines, which processors fetch together, so rows share none.
+// - A table is not changed once mpoTable points at it. Growth replaces it by a larger one and keeps the older
+//   ones, because a thread may still be reading them.
+// - A segment fills whole pairs of cache lines, because processors fetch lines in pairs. So rows share none.
 #ifndef ZANBASE_TIMING_ROW_TABLE_H
 #define ZANBASE_TIMING_ROW_TABLE_H
 
@@ -39,8 +40,8 @@ public:
         return segment->maSlots[slot % kSegmentSlots];
     }
 
-    // Adds fresh slots until there are `rows` rows of at least `slots` slots. One thread at a time, while others
-    // may use their rows; a table that is large enough is left alone.
+    // Adds slots until there are at least `rows` rows of at least `slots` slots. Other threads may use their
+    // rows meanwhile. Requires: one thread at a time calls this.
     void GrowTo(std::size_t rows, std::size_t slots) {
         const Table& old = Newest();
         const std::size_t row_segments = (slots + kSegmentSlots - 1) / kSegmentSlots;
@@ -72,7 +73,7 @@ private:
 
     const Table& Newest() const { return *mpoTable.load(std::memory_order_acquire); }
 
-    std::deque<Table> maTables;          // guarded by what keeps growth to one thread; adding moves none
+    std::deque<Table> maTables;          // accessed by GrowTo alone; push_back does not move the elements
     std::atomic<const Table*> mpoTable;  // never null
 };
 

@@ -10,7 +10,7 @@
 #endif
 #endif
 
-// True if the process runs under the thread sanitizer, be it that only the program was built with it.
+// True if the process runs under the thread sanitizer, also if only the program was built with it.
 extern "C" __attribute__((weak)) void __tsan_init();
 inline bool IsThreadSanitizerOn() noexcept { return __tsan_init != nullptr; }
 

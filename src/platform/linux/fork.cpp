@@ -1,10 +1,12 @@
 // Handlers around fork().
 //
-// After its handlers, fork() waits for the C library's list of streams. fflush(nullptr) owns that list while
-// it waits for a stream, and the owner of a stream may wait for one of our locks: so we must not own a lock
-// and wait for the list. A thread with one of our locks may open a file, which waits for the list: so we must
-// not own the list and wait for a lock. Hence the list is acquired first and the locks are only tried; fork()
-// then acquires the list once more, which is re-entrant.
+// After its handlers, fork() acquires the lock of the C library's list of streams. Two orders would deadlock:
+// - Our locks first, then a wait for the list: fflush(nullptr) owns the list while it waits for a stream, whose
+//   owner may wait for one of our locks.
+// - The list first, then a wait for our locks: a thread that owns one of them may open a file, which waits for
+//   the list.
+// So the list is acquired first and our locks are only tried. fork() then acquires the list once more; its lock
+// is re-entrant.
 #include "platform/fork.h"
 
 #include <pthread.h>
@@ -50,7 +52,7 @@ void InChild() {
 
 }  // namespace
 
-// A registration that fails for lack of memory leaves fork() as it is without it.
+// If the registration fails for lack of memory, fork() acquires no locks.
 void HoldAroundFork(bool (*try_acquire)(), void (*acquire)(), void (*release)()) noexcept {
     gpfnTryAcquire = try_acquire;
     gpfnAcquire = acquire;

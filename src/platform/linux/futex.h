@@ -24,7 +24,7 @@ static_assert(sizeof(FutexWord) == 4 && FutexWord::is_always_lock_free, "the ker
 constexpr int kEverySleeper = 0x7fffffff;
 
 // Wakes up to `most` threads that sleep on `word`; returns how many it woke. Passes only the address to the
-// kernel, so the word may have been destroyed already.
+// kernel, so it is safe on a word that another thread has destroyed.
 inline int WakeSleepers(FutexWord& word, int most) noexcept {
     return static_cast<int>(syscall(SYS_futex, &word, FUTEX_WAKE_PRIVATE, most, nullptr, nullptr, 0));
 }

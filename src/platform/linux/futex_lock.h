@@ -8,16 +8,16 @@
 //
 // A waiter does not spin. The owner that wakes a sleeper may acquire the lock again before the sleeper runs.
 // Under contention one thread therefore runs many short critical sections in a row, and the lock's cache line
-// stays with its processor. Spinning was measured and lost: it moves the line and the lock at every release.
+// stays with its processor. Spinning was measured and is slower: it moves the line and the lock at every
+// release.
 //
-// Memory order. The acquire loads of 0 in TryAcquireFree and AcquireContended read the value of the release
-// store in Release (or a later value of the same release sequence, which read-modify-writes continue), so an
-// owner happens after the previous owner. mnState needs no order beyond that: to the kernel, comparing the
-// word and queueing the sleeper are one atomic step, so a waiter either sees the 0 or is woken.
-//   mnOwner is relaxed. Only the owner stores its own number, and clears it before the release store. So a
-// thread reads its own number exactly if it stored it and still holds the lock, whatever else it may read.
+// Memory order. An acquisition is an acquire load of the 0 that a Release stored with release order: Release
+// happens-before the next acquisition. mnState needs no further order: the kernel compares the word and queues
+// the sleeper in one atomic step, so a waiter reads the 0 or is woken.
+//   mnOwner is relaxed. A thread stores its own number after it has acquired the lock, and clears it before it
+// releases it. So a thread that reads its own number owns the lock; all other values mean that it does not.
 //   mnDepth is plain: the owner alone reads and writes it.
-//   In a process with one thread, plain loads and stores do. Starting the second thread makes them visible.
+//   In a process with one thread relaxed loads and stores suffice; starting a second thread publishes them.
 //
 // An owner is known by a number that is never given to a second thread (system_lock.h). The system's thread
 // identifiers are reused, so the lock of a killed owner would seem to belong to a later thread.
@@ -25,8 +25,8 @@
 // Release does not touch the lock after its store of 0: the next owner may destroy it. The wake-up passes the
 // address alone to the kernel.
 //
-// A thread may be killed at any instruction. From its change of mnState to its store of 0 it holds the lock,
-// which then stays held. A waiter, and an owner that is about to wake one, notes a pending wake-up (futex.h).
+// A thread may be killed at any instruction. If it is killed between its change of mnState and its store of 0,
+// the lock stays held. A waiter, and an owner that is about to wake one, notes a pending wake-up (futex.h).
 #ifndef ZANBASE_PLATFORM_LINUX_FUTEX_LOCK_H
 #define ZANBASE_PLATFORM_LINUX_FUTEX_LOCK_H
 

@@ -40,8 +40,8 @@ const Action& PreviousOf(int signal) noexcept {
     return fault->previous;
 }
 
-// Gives the signal its default action, which follows when the faulting instruction runs again. A signal that
-// was sent is sent again.
+// Gives the signal its default action. A fault takes it when the faulting instruction runs again; a signal
+// that was sent is sent again.
 void RestoreDefaultAction(int signal, bool sent) noexcept {
     Action standard{};
     standard.sa_handler = SIG_DFL;
@@ -77,7 +77,7 @@ void OnFault(int signal, siginfo_t* info, void* context) {
     // While kills are deferred the thread may hold the block mutex: a fault there must not be survived.
     if (sent || frame == nullptr || toSelf.mnKillDeferrals != 0)
         return CallPreviousHandler(signal, info, context, sent);
-    // The fault may be that of a signal handler which interrupted a lock operation or a wait for a thread;
+    // The fault may have occurred in a signal handler that interrupted a lock operation or a wait for a thread;
     // neither continues. Both calls are safe here: the first makes system calls only, and this thread does
     // not hold the block mutex that the second acquires.
     ForwardPendingWakeups();

@@ -20,7 +20,8 @@ void InitLock(HNativeLock* lock) noexcept { new (lock->storage) SystemLock; }
 
 void DestroyLock(HNativeLock*) noexcept {}
 
-// The number is looked up in two places, so that the frequent path calls nothing and saves no registers.
+// Two calls of Acquire instead of Acquire(LockThread()): a call before the frequent path's own work would make
+// that path save registers.
 void AcquireLock(HNativeLock* lock) noexcept {
     if (__builtin_expect(tnLockThread != 0, 1)) return In(lock).Acquire(tnLockThread);
     In(lock).Acquire(NumberLockThread());

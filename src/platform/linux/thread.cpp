@@ -72,7 +72,7 @@ int StartThread(ThreadSlot& slot, void (*body)(void*), void* argument) noexcept 
     if (block == nullptr) return ENOMEM;
     block->mpfnBody = body;
     block->mpoArgument = argument;
-    pthread_t thread{};  // unused: the thread may have ended and its block may be in other use by now
+    pthread_t thread{};  // unused: the thread may have ended and its block may have been reused by then
     const int error = pthread_create(&thread, nullptr, RunThread, block);
     if (error != 0) AbandonBlock(block);
     return error;

@@ -56,7 +56,7 @@ void OnExitKey(void* value) {
     constexpr unsigned int kPass = 3;
     auto* const block = static_cast<HNativeThread*>(value);
     if (toSelf.mpoBlock == block) {
-        // The thread left its body past our frames: by pthread_exit below a C frame without unwind tables.
+        // pthread_exit ended the body below a C frame without unwind tables, so it could not unwind RunBody.
         toSelf.mpoFrame = nullptr;
         if (!CloseBlock(block)) return;
     }
@@ -91,7 +91,7 @@ void ReleaseInParent() noexcept ZANBASE_RELEASE(goBlockMutex) { goBlockMutex.Rel
 
 __attribute__((constructor)) void Prepare() {
     InitLock(&goLock);
-    if (pthread_key_create(&gnExitKey, OnExitKey) != 0) gnExitKey = PTHREAD_KEYS_MAX;  // no such key
+    if (pthread_key_create(&gnExitKey, OnExitKey) != 0) gnExitKey = PTHREAD_KEYS_MAX;  // setting it fails
     pthread_atfork(AcquireBeforeFork, ReleaseInParent, ReleaseInChild);
 }
 
@@ -136,7 +136,7 @@ void EnterBlock(HNativeThread* block) noexcept {
     block->moThread = pthread_self();
     block->mnNumber = CurrentThreadId();
     block->mState = ThreadState::Running;
-    pthread_setspecific(gnExitKey, block);  // without memory for it, only OnExitKey's mend is lost
+    pthread_setspecific(gnExitKey, block);  // if this fails, a pthread_exit past RunBody is not noticed
 }
 
 bool CloseBlock(HNativeThread* block) noexcept {

@@ -5,7 +5,7 @@
 //                                                                                  system made no thread
 //   Running   the thread has made its first step                                   Exiting, Ended or Killed
 //   Exiting   the body has ended; TLS destructors run, and a thread waits for them  Ended
-//   Killed    the thread makes a few last steps of our own; its stack remains      Reaping
+//   Killed    the thread executes the end of ExitKilledThread; its stack remains   Reaping
 //   Reaping   a waiter, or the next StartThread, is in pthread_join for it         Ended
 //   Ended     only waiters use the block                                           Starting, when reused
 //
@@ -78,9 +78,9 @@ struct HNativeThread {
     std::atomic<bool> mbOutputIsHeld;   // StandardOutputIsHeld at the last request
     unsigned int mnKillRequestedAt;     // the tick of the first request
 
-    // Accessed only by the thread's signal handler: the last place seen, and the tick from which on.
-    ThreadPlace moLastPlace;
-    unsigned int mnLastPlaceSince;
+    // Accessed only by the thread's signal handler.
+    ThreadPlace moLastPlace;        // where the handler found the thread last
+    unsigned int mnLastPlaceSince;  // the tick at which it found the thread there first
 };
 
 // Makes `slot` point to a block in state Starting and returns it; null if there is no memory.
@@ -96,8 +96,8 @@ void EnterBlock(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex);
 // run before the block is Ended.
 bool CloseBlock(HNativeThread* block) noexcept;
 
-// Empties the slot and makes the block Killed. Its thread makes no further step in a body, and uses the block
-// no more.
+// Empties the slot and makes the block Killed. Its thread executes no further code of a body and does not
+// access the block again.
 void MarkKilled(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex);
 
 // Makes the block Ended. The caller wakes the waiters after it has released the block mutex.

@@ -1,9 +1,9 @@
 // Asynchronous termination: the handler of a real-time signal exits the thread by the raw exit system call.
 //
-// No destructors, cancellation handlers or TLS destructors run; the C library's per-thread caches leak. A
-// lock of the C library that the thread holds, such as malloc's, would stay held and stop all other threads.
-// So the handler lets a thread that may hold one continue (see thread_kill_safety.h), and KillThread asks
-// again.
+// No destructors, cancellation handlers or TLS destructors run; the C library's per-thread caches leak. A lock
+// of the C library that the thread holds, such as malloc's, would stay held, and other threads would deadlock.
+// So the handler returns if the thread may hold one (see thread_kill_safety.h), and KillThread sends the
+// signal again.
 #include "platform/linux/thread_kill.h"
 
 #include <cerrno>
@@ -29,8 +29,8 @@ void DropThreadKeys() noexcept {
     for (pthread_key_t key = 0; key < PTHREAD_KEYS_MAX; ++key) pthread_setspecific(key, nullptr);
 }
 
-// Requests that the thread of `block` exit, and waits until it exited or deferred the kill. Returns true if
-// the request must be repeated.
+// Requests that the thread of `block` exit, and waits until it has exited or its signal handler has returned.
+// Returns true if the request must be repeated.
 // Requires: the calling thread is a waiter of the block.
 bool RequestKill(HNativeThread* block) noexcept {
     const bool output_is_held = StandardOutputIsHeld();
@@ -44,7 +44,7 @@ bool RequestKill(HNativeThread* block) noexcept {
         if (block->mState == ThreadState::Running) {
             const int signal = KillSignal();
             if (signal == 0) return false;
-            // The thread can't end while this one holds the mutex, so the number is still its own.
+            // The thread can't end while this one holds the mutex, so no other thread has its number.
             if (syscall(SYS_tgkill, getpid(), block->mnNumber, signal) != 0) {
                 if (errno != ESRCH) return true;  // the queue of signals is full
                 MarkKilled(block);                // the thread has called exit(2) by itself

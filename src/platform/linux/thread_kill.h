@@ -16,7 +16,7 @@
 // thread is killed, except under the thread sanitizer: there the thread has to end by a return.
 void RunUntilKilled(void (*body)(HNativeThread*), HNativeThread* block);
 
-// Keeps the calling thread from being killed for a scope. A kill that arrives meanwhile happens at its end.
+// Defers kills of the calling thread for a scope. A kill that arrives meanwhile takes effect at its end.
 class DeferKill {
 public:
     DeferKill() noexcept { Begin(); }

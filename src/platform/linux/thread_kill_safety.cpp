@@ -1,18 +1,18 @@
 // A thread may hold a lock of the C library while it executes the library's code, or code that the kernel
 // provides for it (the vDSO). It can stay there for long only in a system call. These places count as safe:
 //
-// - sched_yield: the library does not call it under a lock, and a thread may do nothing else.
+// - sched_yield: the library does not call it under a lock. A thread may spend all its time there.
 // - A wait of this back end: it uses the library's syscall function, without a lock of the library.
-// - Behind a system call that the signal has made fail with EINTR: the library makes no such call under its
-//   own locks, and the program must not see the error.
+// - The instruction after a system call that the signal has made fail with EINTR. The library makes no such
+//   call under its own locks. The thread is killed there, so the program does not see the error.
 // - The same system call with the same stack for kBlockedMs: the thread waits for input, or for a mutex of
-//   the program. The library's own locks are released sooner, unless the machine is very busy. As long as a
-//   thread holds the lock of stdout or stderr, kOutputMs replaces this limit: a full pipe may be read
-//   meanwhile.
+//   the program. The library's own locks are released sooner, unless the machine is very busy. While a thread
+//   holds the lock of stdout or stderr, the limit is kOutputMs: it may be writing to a full pipe that is read
+//   later.
 //
-// What remains: a thread that waits longer for room in a pipe, or for input of a stream, is killed with the
-// stream locked. So is a thread that executes the program's code under a lock of the library, such as a
-// callback of dl_iterate_phdr.
+// Not prevented: a thread that waits longer for room in a pipe, or for input of a stream, is killed with the
+// stream locked. A thread that executes the program's code under a lock of the library, such as a callback of
+// dl_iterate_phdr, is killed with that lock held.
 #include "platform/linux/thread_kill_safety.h"
 
 #include <algorithm>
@@ -100,8 +100,8 @@ bool IsHeld(std::FILE* stream) noexcept {
 }  // namespace
 
 void FindLibraryCode() noexcept {
-    // Elsewhere a thread is killed wherever it is. The thread sanitizer may show a place that was left long
-    // ago.
+    // Without places, threads are killed wherever they are. Under the thread sanitizer too: it delivers signals
+    // late, with a place that the thread may have left long ago.
     if (!kKnowsPlaces || IsThreadSanitizerOn() || gbSearched.load(std::memory_order_acquire)) return;
     Search search{
         {reinterpret_cast<std::uintptr_t>(&gnu_get_libc_version),

@@ -1,6 +1,6 @@
 // Whether a thread may hold a lock of the C library at the moment it is to be killed.
 //
-// The CMake option ZANBASE_KILL_SAFETY turns the look off. Without it a thread is killed at once wherever it
+// The CMake option ZANBASE_KILL_SAFETY=OFF leaves this check out. Then a thread is killed at once wherever it
 // is, no processor-specific code is built and the first StartThread does not search the loaded libraries; but
 // a thread killed inside malloc or printf leaves their locks held, and other threads deadlock.
 #ifndef ZANBASE_PLATFORM_LINUX_THREAD_KILL_SAFETY_H
@@ -14,8 +14,7 @@ struct HNativeThread;
 // Requires: the calling thread does not hold the block mutex, because the loader's locks are acquired.
 void FindLibraryCode() noexcept;
 
-// True if another thread holds the lock of stdout or stderr. A thread that is to be killed may be that
-// thread.
+// True if another thread holds the lock of stdout or stderr; it may be the thread that is to be killed.
 bool StandardOutputIsHeld() noexcept;
 
 // True if the thread of `block` may hold a lock of the C library and should be asked again a little later.

@@ -28,7 +28,7 @@ extern ZANBASE_FAST_THREAD_LOCAL ThreadSelf toSelf;
 // Enough for a crash handler of the program that runs after the stack is used up.
 constexpr std::size_t kSignalStackBytes = 32768;
 
-// Makes the calling thread run signal handlers on `stack`, of kSignalStackBytes, so that they can run after
+// Makes signal handlers of the calling thread run on `stack`, of kSignalStackBytes, so that they can run after
 // its own stack is used up. Keeps an alternate stack that is set already, such as a sanitizer's.
 void InstallSignalStack(void* stack) noexcept;
 

@@ -7,9 +7,10 @@
 
 namespace {
 
-// Reclaims the stack of a Killed thread. Releases the block mutex meanwhile.
-// Requires: kills are deferred once more than the mutex does, because a second pthread_join can't replace one
-// that was begun.
+// Reclaims the stack of a Killed thread. Releases the block mutex meanwhile, and with it the mutex's deferral
+// of kills.
+// Requires: the caller defers kills itself. If the calling thread were killed in pthread_join, no other thread
+// could join the Killed thread again.
 void Reap(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
     block->mState = ThreadState::Reaping;
     const pthread_t thread = block->moThread;
@@ -22,8 +23,8 @@ void Reap(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
     MarkEnded(block);
 }
 
-// True if the thread of the block has ended; the calling thread is no waiter any more. Otherwise false, with
-// the block's generation in `seen`.
+// If the thread of the block has ended, removes the calling thread as a waiter and returns true. Otherwise
+// returns false, with the block's generation in `seen`.
 bool RemoveWaiterIfEnded(HNativeThread* block, unsigned int& seen) noexcept {
     const DeferKill defer_kill;
     bool is_reaper = false;

@@ -1,4 +1,4 @@
-// Waiting for the end of a thread. Every number of threads may wait for one; each is counted in its block.
+// Waiting for the end of a thread. Any number of threads may wait for one; each is counted in its block.
 #ifndef ZANBASE_PLATFORM_LINUX_THREAD_WAIT_H
 #define ZANBASE_PLATFORM_LINUX_THREAD_WAIT_H
 
@@ -8,21 +8,21 @@
 // empty. A thread does not become a waiter of its own block.
 HNativeThread* AddWaiter(ThreadSlot& slot) noexcept;
 
-// Waits until the thread of `block` has ended. The calling thread is no waiter after that.
-// Requires: it is a waiter of the block.
+// Waits until the thread of `block` has ended, then removes the calling thread as a waiter.
+// Requires: the calling thread is a waiter of the block.
 void WaitForThreadEnd(HNativeThread* block) noexcept;
 
-// Ends the wait of the calling thread, if it is a waiter, because the code that waits will not run again.
+// Removes the calling thread as a waiter, if it is one, because the code that waits will not run again.
 void AbandonWait() noexcept;
 
 // Sleeps until the block's generation differs from `seen`.
 // Requires: the calling thread is a waiter of the block and does not hold the block mutex.
 void WaitForNewGeneration(HNativeThread* block, unsigned int seen) noexcept;
 
-// Wakes the waiters of `block` after a change of its generation. The block may be in other use by now.
+// Wakes the waiters of `block` after a change of its generation. The block may have been reused by then.
 void WakeWaiters(HNativeThread* block) noexcept;
 
-// Makes the waiters look at the block again.
+// Changes the block's generation and wakes its waiters, so that they look at the block again.
 void NotifyWaiters(HNativeThread* block) noexcept;
 
 // Reclaims the stacks of killed threads that have no waiter.
