@@ -1,9 +1,9 @@
-// Runs three threads of an algorithm under every order of their steps. Steps are sequentially consistent: a
-// weaker memory order is not explored; the algorithms' headers argue it.
+// Runs three threads of an algorithm under every order of their steps. Steps are sequentially consistent, except for
+// stores that a model delays (futex_system.h). Loads are never reordered: the algorithms' headers argue that.
 //
-// A thread makes the calls of its script, and each access to shared data is a step. To make the next step the
-// call runs again from its start: it gets the recorded results of its earlier steps, and an exception leaves
-// it before the step after the new one. So a state is plain data, and each state is explored once.
+// A thread makes the calls of its script, and each access to shared data is a step. To make the next step, the call
+// runs again from its start. It gets the recorded results of its earlier steps, makes the new step, and is left by an
+// exception before the step after that. So a state is plain data, and each state is explored once.
 #ifndef ZANBASE_TESTS_EXPLORER_H
 #define ZANBASE_TESTS_EXPLORER_H
 
@@ -15,7 +15,7 @@
 #include <vector>
 
 constexpr std::size_t kThreads = 3;
-constexpr std::size_t kDelayedStores = 2 * kThreads;  // that a model may have
+constexpr std::size_t kDelayedStores = 2 * kThreads;  // the most that a model has at once
 using Value = unsigned long long;
 
 struct State {
@@ -33,9 +33,9 @@ public:
     std::array<std::string, kThreads> scripts;  // a letter each call
     std::function<void(char)> call;
     std::function<const char*(const State&, bool at_the_end)> check;  // what is wrong, or null
-    std::function<bool(State&, std::size_t thread)> kill;  // kills a thread, if set; false: not at this step
-    std::function<bool(State&, std::size_t store)>
-        deliver;  // makes a delayed store, if set; false: not there
+    // Both may be unset. False: not possible in this state.
+    std::function<bool(State&, std::size_t thread)> kill;    // kills a thread
+    std::function<bool(State&, std::size_t store)> deliver;  // makes a delayed store
 
     // What is wrong in some order of steps; empty if nothing is.
     std::string Explore(const State& start) {
@@ -117,7 +117,7 @@ private:
         return true;
     }
 
-    // 64 bits stand for a state: two of a million share them with a chance of 1 to 10^7.
+    // A hash of the state. Of a million states, two have the same hash with a probability of about 10^-7.
     static Value Digest(const State& state) {
         Value digest = 0;
         const auto add = [&](Value value) {
@@ -138,7 +138,7 @@ private:
     const char* mFound = nullptr;
 };
 
-// The only one, and steps on one of its words.
+// The only explorer, and steps on one of its words.
 inline Explorer explorer;
 
 template <class Rule>
