@@ -1,6 +1,5 @@
 // The steps of the two read-write locks, as templates over the lock, so that tests/models can run the shipped
-// code under every order of its steps. `Lock` has the members of HReadPrefMutex; what is called here is all
-// that a type needs of them.
+// code under every order of its steps. `Lock` has those members of HReadPrefMutex that are used here.
 //
 //   State                       mnReaders  mnWriters  moResource  moGate
 //   free                        0          0          free        free
@@ -14,12 +13,11 @@
 // in its last unlock moReaderMutex inside moWriterMutex. No thread waits for moGate while it holds
 // moReaderMutex; otherwise readers could deadlock in ReadUnlock.
 //
-// Which side releases moResource: in the state "write and read" either side may leave first, and the unit has
-// to be released exactly once, by the side that leaves last. Both decide inside moReaderMutex: the writer
-// clears mnWriterThread before it reads mnReaders, and a reader lowers mnReaders before it reads
-// mnWriterThread. So the second of them finds that the first has left, and the first does not find that of
-// the second. mnWriters would not do: it is still above 0 when the writer has already left the unit to the
-// readers.
+// Which side releases moResource: in the state "write and read" either side may leave first. The side that
+// leaves last releases the unit. Both decide inside moReaderMutex: the writer clears mnWriterThread before it
+// reads mnReaders, and a reader lowers mnReaders before it reads mnWriterThread. So only the side that decides
+// second finds that the other has left. Reading mnWriters instead would be wrong: it is still above 0 after the
+// writer has left the unit to the readers.
 //
 // mnWriterThread is relaxed: a thread acts on it only if it equals its own number, which it stored itself, or
 // inside moReaderMutex, which orders it.
