@@ -1,8 +1,9 @@
 /// @file
-/// Budgets for tests: scopes that say whether memory or disk operations stayed within a limit, and where not.
+/// Budgets for tests: scopes that tell whether memory or disk operations stayed within a limit, and which call
+/// sites or files exceeded it.
 ///
-/// A budget counts from its construction. It says `true` or `false` and gives a text, so it serves in any test
-/// framework:
+/// A budget counts from its construction. `Check` returns true or false and `GetText` tells why, so a budget
+/// works with any test framework:
 ///
 ///     HMemoryBudget budget;
 ///     budget.LimitLiveBytes(0).LimitAllocations(100);
@@ -12,10 +13,9 @@
 ///     live bytes: 640, limit 0
 ///       src/parse.cpp:57: 640
 ///
-/// A limit that was not set is not checked. Limits are in bytes or calls; a limit is kept by a figure that is
-/// equal to it. The accounts belong to the whole process: what other threads record counts too. Only what is
-/// fed to the accounts counts. `Check` takes a snapshot; see zanbase/snapshot.h for what that costs and needs.
-/// One budget is used by one thread at a time.
+/// Limits are in bytes or calls; a figure equal to its limit is within it. A limit that was not set is not
+/// checked. The accounts belong to the whole process: what other threads record counts too. What is not recorded
+/// does not count. `Check` takes a snapshot; see zanbase/snapshot.h for what that requires.
 ///
 /// Requires: within the scope nothing calls `Push`, `Pop` or a reset of the account.
 #ifndef ZANBASE_BUDGET_H
@@ -32,11 +32,11 @@
 /// A limit that nothing exceeds.
 constexpr long long kNoLimit = 0x7FFFFFFFFFFFFFFF;
 
-/// Watches the allocation tracker.
+/// Watches the allocation tracker. Not thread-safe: one thread at a time uses an object.
 ///
-/// For the peak within the scope it sets the tracker's peak to the current total, and at its end to the higher
-/// of the old and the new; so a usage report within the scope shows the scope's peak.
-/// Requires: budgets for memory end in the reverse order of their beginning.
+/// To measure the peak within the scope, the constructor sets the tracker's peak to the current total; the
+/// destructor sets it to the higher one of the old and the new peak. So a usage report within the scope shows
+/// the scope's peak. Requires: budgets for memory are destroyed in the reverse order of their construction.
 class ZANBASE_API HMemoryBudget {
 public:
     /// Starts to count.
@@ -68,7 +68,7 @@ private:
     std::string moText;
 };
 
-/// Watches the disk ledger.
+/// Watches the disk ledger. Not thread-safe: one thread at a time uses an object.
 class ZANBASE_API HDiskIOBudget {
 public:
     /// Starts to count.

@@ -9,8 +9,8 @@
 ///     HDiskIOUsageReport(stdout);
 ///
 /// **Handles.** A handle is only compared. Requires: it is unique among the files in use until the close is
-/// recorded. The address of the caller's own object for the open file is; a `FILE*` or a descriptor is not,
-/// because another thread can get the same one between the close and its record.
+/// recorded. Use the address of the caller's own object for the open file. A `FILE*` or a descriptor is not
+/// unique: another thread can get the same one after the close and before the close is recorded.
 ///
 /// **Units.** Names are kept as spelled: two spellings of one path are two files. Times are seconds as the
 /// caller measured them, of any sign, and are not checked. Counts wrap at 32 bits, byte sums at 64.
@@ -88,13 +88,13 @@ ZANBASE_API void HDiskIOReset();
 /// that owns the stream may record.
 ZANBASE_API bool HDiskIOReportFile(std::FILE* stream, const std::string& name);
 
-/// Prints a table of sums over all files, or nothing if there is no file. `stream`, locks and threads as for
-/// `HDiskIOReportFile`.
+/// Prints a table of sums over all files, or nothing if there is no file. Thread-safe. Requirements and locks are
+/// those of `HDiskIOReportFile`.
 ZANBASE_API void HDiskIOSummaryReport(std::FILE* stream);
 
 /// Prints every file that moved bytes as `HDiskIOReportFile` does, fewest bytes first, equal numbers in the
 /// order of the names; if no file moved bytes, one line says so. Prints nothing if there is no file.
-/// `stream`, locks and threads as for `HDiskIOReportFile`.
+/// Thread-safe. Requirements and locks are those of `HDiskIOReportFile`.
 ZANBASE_API void HDiskIOUsageReport(std::FILE* stream);
 
 /// @}

@@ -30,7 +30,7 @@
 /// If `value` lies strictly between -2^31 and 2^31 - 1 and is whole, or exceeds a whole number by less than
 /// 1e-11 and has a magnitude above 0.5, the text is that integer without blanks. Any other value is
 /// right-aligned in 24 characters: by "%24.15e" if its magnitude is above 1e7 or below 1e-7, else by
-/// "%24.11f". Text beyond the buffer is cut, which needs a locale whose decimal sign has several bytes.
+/// "%24.11f". A longer text is cut; that happens only in a locale whose decimal sign has several bytes.
 ZANBASE_API const char* FormatDouble(double value, char* buffer) noexcept;
 
 /// Prints `value` by `format`, a `printf` format for one `double`, changes every `E` and `e` of the text to

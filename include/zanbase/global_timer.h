@@ -33,14 +33,15 @@ struct GlobalTimerSnapshot;
 /// Destructors of static objects and `atexit` handlers may use the timers only if they were constructed or
 /// registered after the first `GetInstance`.
 ///
-/// **Thread numbers.** Threads with the same OpenMP number share slots and must toggle one after the other:
-/// outside parallel regions every thread has number 0, and nested teams number theirs from 0 again. The same
-/// holds in a process with two OpenMP runtimes (libgomp of g++ and libomp of clang): members of a team of the
-/// runtime that this library was not linked with all have number 0 here. Build all parts with one runtime. In
-/// a parallel region of the caller, `OMPGetThreadNum() != omp_get_thread_num()` on some member shows two
-/// runtimes.
+/// **Thread numbers.** Threads with the same OpenMP number share slots and must toggle one after the other.
+/// Outside parallel regions every thread has number 0, and nested teams number theirs from 0 again. In a process
+/// with two OpenMP runtimes all members of a team of the other runtime have number 0, too; zanbase/openmp.h tells
+/// how to notice that.
 ///
 /// Not for short code: a pair of toggles costs about two clock readings.
+///
+/// Thread-safety: `GetInstance`, `RegisterNewTimer` and `Toggle` are thread-safe, with the limits told there;
+/// `Report` and `ResetAll` are not.
 class ZANBASE_API GlobalTimer {
 public:
     /// The one instance, created by the first call. Thread-safe. After a `std::bad_alloc` the next call tries

@@ -46,6 +46,8 @@
 /// passes after `Start` and one for each true result of `Signal` are done, and `IsProcessing` returns false.
 /// Otherwise the worker may call `Process` after the subclass is destroyed. A subclass that counts its passes
 /// can wait for this in its own destructor.
+///
+/// Thread-safe, as `HThread`.
 class ZANBASE_API HHibernateThread : public HThread {
 public:
     /// Creates a worker at normal priority. Does not start it.
@@ -60,8 +62,8 @@ public:
     /// no effect. Thread-safe.
     bool Signal() const;
 
-    /// False while the worker hibernates, otherwise true, also before `Start`. The result may be out of date
-    /// at once; false is while another thread calls `Signal` or a requested pass has not begun. Thread-safe.
+    /// False while the worker hibernates, otherwise true, also before `Start`. False may be out of date at once
+    /// if another thread calls `Signal` or if a requested pass has not begun yet. Thread-safe.
     [[nodiscard]] bool IsProcessing() const;
 
 protected:

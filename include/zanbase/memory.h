@@ -107,7 +107,7 @@ public:
 
     /// Prints on `stream` what each call site allocated and freed, smallest first, then the totals in K and
     /// the peak. Prints nothing if the usage table is empty. Sites below 1/10240 of the total bytes are
-    /// printed as one sum. `stream`, locks and threads as for `LeakReport`.
+    /// printed as one sum. Thread-safe. Requirements and locks are those of `LeakReport`.
     static void UsageReport(std::FILE* stream);
 
     /// Does nothing: there is no state to copy.

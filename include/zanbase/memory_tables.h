@@ -1,7 +1,7 @@
 /// @file
-/// For code that reads the tracker's tables through a class derived from `HMemory`: Boost's map and the saved
-/// state, complete. Not part of zanbase/zanbase.h, because it needs Boost, and the very version of it that
-/// the library was built with: the layout of the maps is that version's.
+/// For code that reads the tracker's tables through a class derived from `HMemory`: includes Boost's map and
+/// defines the saved state. Not part of zanbase/zanbase.h, because it requires Boost, in the version that the
+/// library was built with: each version has a layout of its own.
 #ifndef ZANBASE_MEMORY_TABLES_H
 #define ZANBASE_MEMORY_TABLES_H
 

@@ -15,10 +15,10 @@
 ///
 /// Copies and assignments copy the recorded values, so the destructor of a copy restores the same setting.
 ///
-/// Two OpenMP runtimes in one process (libgomp of g++ and libomp of clang) know nothing of each other:
-/// members of a team of the runtime that this library was not linked with all have thread number 0 here, and
-/// its settings are not changed by these scopes. Build all parts with one runtime. In a parallel region of
-/// the caller, `OMPGetThreadNum() != omp_get_thread_num()` on some member shows two runtimes.
+/// Two OpenMP runtimes can be in one process (libgomp of g++ and libomp of clang), and this library uses the one
+/// that it was linked with. In a team of the other runtime every member has thread number 0 here, and these
+/// scopes do not change that runtime's settings. Build all parts with one runtime. If `OMPGetThreadNum() !=
+/// omp_get_thread_num()` on a thread of a parallel region of the caller, there are two runtimes.
 ///
 /// Thread-safety: the settings belong to the calling thread inside the runtime. Scopes on different threads
 /// are independent; one scope object belongs to one thread. Requires: a scope ends on the thread that started
@@ -35,7 +35,8 @@
 /// @addtogroup parallel
 /// @{
 
-/// Sets the runtime's dynamic adjustment of team sizes for a block. One object belongs to one thread.
+/// Sets the runtime's dynamic adjustment of team sizes for a block. Not thread-safe: one object belongs to one
+/// thread.
 class ZANBASE_API OMPDynamic {
 public:
     /// Requests dynamic adjustment, or with false none.
@@ -53,7 +54,8 @@ private:
     bool mbPrevious;
 };
 
-/// Sets the number of threads of later parallel regions for a block. One object belongs to one thread.
+/// Sets the number of threads of later parallel regions for a block. Not thread-safe: one object belongs to one
+/// thread.
 class ZANBASE_API OMPThreadCount {
 public:
     /// Requests `count` threads, clamped to the range from 1 to `OMPGetMaxThreads()`.
@@ -72,10 +74,11 @@ private:
 };
 
 /// Sets nested parallelism for a block and, if `enable` is true, also the thread count to
-/// `OMPGetMaxThreads()`. With false it leaves the thread count alone. One object belongs to one thread.
+/// `OMPGetMaxThreads()`. With false it leaves the thread count alone. Not thread-safe: one object belongs to one
+/// thread.
 ///
-/// The thread count has a scope of its own. Copies and assigned objects share it, and its last owner ends it.
-/// An assignment first gives up the scope that its target had, which ends if it has no other owner.
+/// The thread count has an `OMPThreadCount` of its own. Copies and assigned objects share it; the destructor of
+/// the last owner ends it. An assignment first releases the target's share of its old one.
 class ZANBASE_API OMPNested {
 public:
     /// Requests nesting, or with false none. Throws `std::bad_alloc` and changes no setting if there is no
@@ -97,7 +100,7 @@ private:
 
 /// Returns the thread limit of the library's scopes, at least 1: the value that `OMPSetMaxThreads` set, else
 /// the environment variable `OMP_NUM_THREADS` if it is a positive number, else the number of logical
-/// processors. The first call settles it; the environment is not read again. Thread-safe.
+/// processors. The first call reads the environment; later calls do not. Thread-safe.
 [[nodiscard]] ZANBASE_API int OMPGetMaxThreads();
 
 /// Sets that limit, to 1 if `limit` is less. Affects scopes that start later; calls nothing in the runtime.

@@ -76,8 +76,10 @@ protected:
 /// reader to enter: the two can deadlock.
 ///
 /// Downgrade from writing to reading without a writer in between: `WriteLock`, `ReadLock`, `WriteUnlock`, and
-/// `ReadUnlock` at the end. From that `ReadLock` on other threads' readers enter as well, so call it only
-/// when writing has finished. The two locks may also be released in the other order.
+/// `ReadUnlock` at the end. After that `ReadLock` other readers can enter too, so call it only when writing has
+/// finished. The two locks may also be released in the other order.
+///
+/// Thread-safe, as `HReadWriteMutex`.
 class ZANBASE_API HReadPrefMutex : public HReadWriteMutex {
 public:
     /// Makes a free lock; see `HMutex` and `HSemaphore` for exhausted memory.
@@ -105,11 +107,12 @@ private:
         moSpareCount;  // saves the next first reader an allocation; guarded by moReaderMutex
 };
 
-/// The kind that prefers writers: while a writer waits, no thread enters that is not reading already. The
-/// readers inside leave, and the writer enters. Writers without a gap keep readers out for ever.
+/// The kind that prefers writers: while a writer waits, only threads that are reading already can acquire
+/// another read lock. The writer enters when the readers have left. Writers that overlap without a gap keep
+/// readers out for ever.
 ///
 /// A thread that holds the write lock and asks for a read lock deadlocks with itself; `HReadPrefMutex` allows
-/// it.
+/// it. Thread-safe, as `HReadWriteMutex`.
 class ZANBASE_API HWritePrefMutex : public HReadWriteMutex {
 public:
     /// Makes a free lock; see `HMutex` and `HSemaphore` for exhausted memory.

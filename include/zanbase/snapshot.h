@@ -1,6 +1,6 @@
 /// @file
 /// The three accounts (tracker, disk ledger, timers) as values that can be compared, added up and written.
-/// Not part of zanbase/zanbase.h: a program that only feeds the accounts has no use for it.
+/// Not part of zanbase/zanbase.h: a program that only records does not need it.
 ///
 /// A snapshot is a plain value: it owns its texts, shares nothing with the account, and any code may fill one.
 ///
@@ -17,8 +17,7 @@
 ///
 /// Figures are signed, because differences can be negative, and wrap at 64 bits; a byte count of 2^63 or more
 /// shows as a negative number. If memory runs out, `std::bad_alloc` reaches the caller, no lock stays held, and
-/// the snapshots are unchanged. Different threads may use different snapshots at once; one snapshot is
-/// thread-safe for reading only.
+/// the snapshots are unchanged.
 ///
 /// A program whose `operator new` records in the tracker pauses that while it takes a snapshot; see
 /// `HTrackerPause` in zanbase/adapters/tracked_memory.h.
@@ -33,7 +32,7 @@
 /// @addtogroup snapshots
 /// @{
 
-/// What the allocation tracker holds.
+/// What the allocation tracker holds. Thread-safe for different objects, and for reading one object.
 struct HMemorySnapshot {
     /// One call site. Two rows of one `Take` can have the same text and line, because a site in the tracker is
     /// the address of the text.
@@ -52,7 +51,7 @@ struct HMemorySnapshot {
     long long mnTotal = 0;    ///< bytes recorded and not yet freed
     long long mnPeak = 0;     ///< the highest total; of merged snapshots an upper bound
 
-    /// The tracker's state, copied under its mutex; empty before the first `HMemory::Alloc`. Any thread.
+    /// The tracker's state, copied under its mutex; empty before the first `HMemory::Alloc`. Thread-safe.
     [[nodiscard]] ZANBASE_API static HMemorySnapshot Take();
     /// This snapshot less `earlier`; see above.
     [[nodiscard]] ZANBASE_API HMemorySnapshot Since(const HMemorySnapshot& earlier) const;
@@ -60,7 +59,7 @@ struct HMemorySnapshot {
     ZANBASE_API void Merge(const HMemorySnapshot& other);
 };
 
-/// What the disk ledger holds.
+/// What the disk ledger holds. Thread-safe for different objects, and for reading one object.
 struct HDiskIOSnapshot {
     /// One kind of operation.
     struct Operation {
@@ -81,7 +80,7 @@ struct HDiskIOSnapshot {
 
     std::vector<Row> maRows;  ///< in the order of the names, byte by byte
 
-    /// The ledger's state, copied under its mutex; empty if there is no ledger, and makes none. Any thread.
+    /// The ledger's state, copied under its mutex; empty before the first recording. Thread-safe.
     [[nodiscard]] ZANBASE_API static HDiskIOSnapshot Take();
     /// This snapshot less `earlier`; see above.
     [[nodiscard]] ZANBASE_API HDiskIOSnapshot Since(const HDiskIOSnapshot& earlier) const;
@@ -89,7 +88,8 @@ struct HDiskIOSnapshot {
     ZANBASE_API void Merge(const HDiskIOSnapshot& other);
 };
 
-/// What the timers have added up. Open intervals count for nothing, as in the printed report.
+/// What the timers have added up, without open intervals. Thread-safe for different objects, and for reading one
+/// object.
 struct GlobalTimerSnapshot {
     /// One timer.
     struct Row {
@@ -100,8 +100,8 @@ struct GlobalTimerSnapshot {
 
     std::vector<Row> maRows;  ///< in order of registration after `Take`
 
-    /// The timers' state. Makes the instance if there is none.
-    /// Requires: no other call of `GlobalTimer` is in progress, as for `GlobalTimer::Report`.
+    /// The timers' state. Creates the instance if there is none. Not thread-safe. Requires: no other call of
+    /// `GlobalTimer` is in progress.
     [[nodiscard]] ZANBASE_API static GlobalTimerSnapshot Take();
     /// This snapshot less `earlier`; see above.
     [[nodiscard]] ZANBASE_API GlobalTimerSnapshot Since(const GlobalTimerSnapshot& earlier) const;

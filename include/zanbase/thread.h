@@ -62,7 +62,7 @@ enum HThreadPriority : unsigned int {
 ///
 /// **Fork.** In the child every object is idle, except that of the thread that called `fork`.
 ///
-/// Use `HHibernateThread` for a worker that is woken repeatedly. Don't use a thread each for many short jobs.
+/// Use `HHibernateThread` for a worker that is woken repeatedly. Don't start a thread for each of many short jobs.
 class ZANBASE_API HThread {
 public:
     /// Creates an idle object with the given priority. Creates no thread.

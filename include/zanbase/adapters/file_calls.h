@@ -1,5 +1,5 @@
 /// @file
-/// The functions that recorded files stand on: those of the C library and those of the system.
+/// The functions that recorded files call: those of the C library and those of the system.
 #ifndef ZANBASE_ADAPTERS_FILE_CALLS_H
 #define ZANBASE_ADAPTERS_FILE_CALLS_H
 
@@ -13,31 +13,31 @@
 /// @addtogroup adapters
 /// @{
 
-// A type like these two can stand for any other file layer below `HRecorded`: `Open` gives `kClosed` after a
-// failure and the other functions -1, with the reason in `errno`. They are called with an open file only.
+// `HRecorded` works over any other file layer through a type with these members. After a failure `Open` returns
+// `kClosed` and the other functions -1, with the reason in `errno`. They are called with an open file only.
 
-/// The functions of the C library below `HRecordedFile`.
+/// The functions of the C library below `HRecordedFile`. Thread-safe for different files.
 struct HStdioCalls {
     using Native = std::FILE*;                  ///< the open file
     using Mode = const char*;                   ///< of `std::fopen`
     static constexpr Native kClosed = nullptr;  ///< no file
     /// As `std::fopen`.
     static Native Open(const char* name, Mode mode) { return std::fopen(name, mode); }
-    /// Bytes read; less than `size` at the end of the file.
+    /// Returns the bytes read; fewer than `size` at the end of the file.
     static long long Read(Native file, void* block, std::size_t size) {
         std::clearerr(file);
         return Result(file, std::fread(block, 1, size, file));
     }
-    /// Bytes taken by the stream's buffer or the system.
+    /// Returns the bytes that the stream's buffer or the system accepted.
     static long long Write(Native file, const void* block, std::size_t size) {
         std::clearerr(file);
         return Result(file, std::fwrite(block, 1, size, file));
     }
-    /// The new position; `origin` is `SEEK_SET`, `SEEK_CUR` or `SEEK_END`.
+    /// Returns the new position; `origin` is `SEEK_SET`, `SEEK_CUR` or `SEEK_END`.
     static long long Seek(Native file, long long offset, int origin) {
         return fseeko64(file, offset, origin) == 0 ? ftello64(file) : -1;
     }
-    /// 0; the file is closed also if that failed.
+    /// Returns 0 on success. The file is closed also after a failure.
     static int Close(Native file) { return std::fclose(file); }
 
 private:
@@ -52,7 +52,7 @@ struct HOpenMode {
     int mnPermissions = 0666;  ///< of a new file
 };
 
-/// The system's functions below `HRecordedDescriptor`.
+/// The system's functions below `HRecordedDescriptor`. Thread-safe for different files.
 struct HDescriptorCalls {
     using Native = int;                    ///< the descriptor
     using Mode = HOpenMode;                ///< flags and permissions

@@ -32,7 +32,7 @@
 /// @{
 
 /// A `HMutex` as a lockable of the standard. It is re-entrant for its owner; a wait on a condition variable
-/// releases one level only, so the waiting thread must own it exactly once.
+/// releases one level only, so the waiting thread must own it exactly once. Thread-safe.
 class ZANBASE_CAPABILITY("mutex") HLockable {
 public:
     HLockable() = default;
@@ -55,7 +55,7 @@ private:
 
 /// A read-write lock as a shared lockable of the standard. `Kind` is `HWritePrefMutex` or `HReadPrefMutex`.
 /// There is no `try_lock` and no `try_lock_shared`, because the locks have no such step: so `std::scoped_lock`
-/// takes it alone and not together with others.
+/// takes it alone and not together with others. Thread-safe.
 template <class Kind>
 class ZANBASE_CAPABILITY("shared_mutex") HBasicSharedLockable {
 public:
@@ -84,7 +84,8 @@ using HSharedLockable = HBasicSharedLockable<HWritePrefMutex>;
 /// The shared lockable that prefers readers.
 using HReadPrefSharedLockable = HBasicSharedLockable<HReadPrefMutex>;
 
-/// Holds a lock exclusively for a scope, as `std::lock_guard` does, with annotations.
+/// Holds a lock exclusively for a scope, as `std::lock_guard` does, with annotations. Not thread-safe: one object
+/// belongs to one thread.
 template <class Lock>
 class ZANBASE_SCOPED_CAPABILITY HLockGuard {
 public:
@@ -99,7 +100,7 @@ private:
     Lock& moLock;
 };
 
-/// Holds a lock shared for a scope, with annotations.
+/// Holds a lock shared for a scope, with annotations. Not thread-safe: one object belongs to one thread.
 template <class Lock>
 class ZANBASE_SCOPED_CAPABILITY HSharedLockGuard {
 public:

@@ -19,8 +19,7 @@
 /// the end of the file. `Write` writes all or fails; if the function below writes less, it is called again,
 /// and each call is recorded. A call that a signal interrupts before it did anything is made again.
 ///
-/// After a read, a `HRecordedFile` needs a seek before it is written, and after a write before it is read, as C
-/// has it for every stream.
+/// Between a read and a write of a `HRecordedFile`, in either order, a seek is required, as for every stream of C.
 ///
 /// An object may be used by one thread at a time, different objects by different threads. Its handle in the
 /// ledger is a block of its own that is released after the close was recorded, so no other file can have
@@ -46,7 +45,7 @@
 /// @addtogroup adapters
 /// @{
 
-/// Owns an open file, or nothing. Objects can be moved.
+/// Owns an open file, or nothing. Objects can be moved. Thread-safe for different objects.
 template <class Calls>
 class HRecorded {
 public:
@@ -54,6 +53,7 @@ public:
 
     /// An object that is not open.
     HRecorded() = default;
+    /// Takes what the other object owns.
     HRecorded(HRecorded&&) noexcept = default;
     /// Takes what `other` owns and closes the file that this object owned.
     HRecorded& operator=(HRecorded&& other) noexcept {

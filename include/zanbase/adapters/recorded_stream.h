@@ -26,7 +26,9 @@
 /// Positions are bytes of the file; there is one position for reading and writing. Where the file has none (a
 /// pipe), `tellg`, `seekg` and `sync` fail and lose nothing that was read. A failure below shows as the end of
 /// the file or as the stream's `badbit`, and its reason in `GetError`. The bytes of a failed write are lost. The
-/// destructor writes what is left and ignores errors: call `Close` where data must be safe. One thread at a time.
+/// destructor writes what is left and ignores errors: call `Close` where data must be safe.
+///
+/// Not thread-safe: one thread at a time uses an object.
 class HRecordedStreambuf : public std::streambuf {
 public:
     /// Takes over `file`; if that is not open, nothing can be read or written.

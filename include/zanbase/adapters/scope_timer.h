@@ -6,9 +6,9 @@
 ///         …
 ///     }
 ///
-/// What holds for `GlobalTimer::Toggle` holds here: threads that OpenMP numbers alike, such as all threads
-/// outside of parallel regions, must not be in the same region at the same time; and a region that is entered
-/// again on the same thread before it was left stops the timer instead of nesting.
+/// A region has the limits of `GlobalTimer::Toggle`. Threads with the same OpenMP number, such as all threads
+/// outside of parallel regions, must not be in the same region at the same time. Regions of one name do not
+/// nest: entering one again on the same thread stops the timer.
 ///
 /// examples/adapters/scope_timer.cpp shows both forms.
 #ifndef ZANBASE_ADAPTERS_SCOPE_TIMER_H
@@ -23,7 +23,8 @@
 /// @addtogroup adapters
 /// @{
 
-/// Starts a timer on the calling thread and stops it at the end of the scope.
+/// Starts a timer on the calling thread and stops it at the end of the scope. Thread-safe, with the limits of
+/// `GlobalTimer::Toggle`.
 class HTimerScope {
 public:
     /// Starts timer `id`, which comes from `GlobalTimer::RegisterNewTimer` and is stopped on this thread.
@@ -40,8 +41,8 @@ private:
     unsigned long long mnId;
 };
 
-/// The identifier of the timer called `name`, which is registered at the first call with this name. Any thread
-/// may call it at any time, also while others toggle. Names that were registered directly are not looked up.
+/// The identifier of the timer called `name`, which is registered at the first call with this name. Names that
+/// were registered directly are not looked up. Thread-safe, also while other threads toggle.
 inline unsigned long long HTimerNamed(const std::string& name) {
     // Never destroyed, so that regions work while the process ends.
     static const HMutex& mutex = *new HMutex;
@@ -64,8 +65,8 @@ inline unsigned long long HTimerNamed(const std::string& name) {
 #define ZANBASE_JOIN(left, right) ZANBASE_JOIN_NAMES(left, right)
 /// @endcond
 
-/// Times the rest of the enclosing scope as `name`. Each use looks its timer up once, at the first pass; the
-/// same name anywhere in the program is the same timer. A macro, because that needs a static of each use.
+/// Times the rest of the enclosing scope as `name`, as `HTimerScope`. The same name anywhere in the program is
+/// the same timer. A macro, because each use has a static variable of its own for the timer's identifier.
 #define HTimedRegion(name)                                                                      \
     static const unsigned long long ZANBASE_JOIN(knZanbaseTimer, __LINE__) = HTimerNamed(name); \
     const HTimerScope ZANBASE_JOIN(zanbase_timer_scope_, __LINE__)(ZANBASE_JOIN(knZanbaseTimer, __LINE__))
