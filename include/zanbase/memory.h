@@ -67,6 +67,8 @@ class unordered_map;
 ///         in_tracker = false;
 ///     }
 ///
+/// Make the first call in `main`: an allocator also serves libraries that are initialised before this one.
+///
 /// The class has static members only and is not made to be instantiated. It detects no faults: a block freed
 /// twice or never recorded is not noticed. Use a sanitizer to find those.
 class ZANBASE_API HMemory {
@@ -98,7 +100,8 @@ public:
     /// Prints a table of the live blocks on `stream`: a row for each call site, the one that holds most bytes
     /// last, then the totals. Prints nothing if no block is live. The stream is not flushed. Requires:
     /// `stream` is open for writing, and its own write functions don't call `Push`, `Pop`, `Reset` or
-    /// `UsageReset`.
+    /// `UsageReset`. They may record in the disk ledger, unless `operator new` or the stream of a ledger's
+    /// report records here: with both, two threads can deadlock.
     ///
     /// Thread-safe. The calling thread owns the stream's lock (`flockfile`) and then the tracker's mutex
     /// until the table is written: no other output gets into it, `Alloc` and `Free` wait, and a thread that

@@ -17,8 +17,8 @@
 ///
 /// Two OpenMP runtimes can be in one process (libgomp of g++ and libomp of clang), and this library uses the one
 /// that it was linked with. In a team of the other runtime every member has thread number 0 here, and these
-/// scopes do not change that runtime's settings. Build all parts with one runtime. If `OMPGetThreadNum() !=
-/// omp_get_thread_num()` on a thread of a parallel region of the caller, there are two runtimes.
+/// scopes do not change that runtime's settings. Build all parts with one runtime. If `OMPGetNumThreads()` is 1
+/// in a parallel region of the caller that has several threads, there are two runtimes.
 ///
 /// Thread-safety: the settings belong to the calling thread inside the runtime. Scopes on different threads
 /// are independent; one scope object belongs to one thread. Requires: a scope ends on the thread that started

@@ -50,7 +50,8 @@ enum HThreadPriority : unsigned int {
 /// standard output. So does a machine fault: an invalid memory access, an integer division by zero, an
 /// illegal instruction, an exhausted stack. A fault abandons the frames of `Run` without unwinding them: no
 /// destructor runs, and locks stay held. A fault inside `malloc` or `fwrite` leaves the heap or the stream
-/// locked; then the next thread that allocates, or calls `fflush(nullptr)`, deadlocks. On Linux:
+/// locked; then the next thread that allocates, or uses the stream, deadlocks, as do `fflush(nullptr)` and,
+/// after a fault inside a write to `stdout`, `exit`. On Linux:
 ///   - `Run` must not block SIGSEGV, SIGBUS, SIGFPE or SIGILL: the system ends the process at a fault whose
 ///     signal is blocked. A mask inherited from the thread that called `Start` does no harm.
 ///   - A handler for these signals that the program installs after the first `Start` is called first. It must
