@@ -2,7 +2,7 @@
 // takes, and that nothing is left of it.
 //
 // Recording starts in main: objects that are built earlier may allocate before the library is ready.
-#include <zanbase/adapters/tracked_memory.h>
+#include <zanbase/adapters/tracked_block.h>
 
 #include <atomic>
 #include <cstdio>

@@ -20,7 +20,7 @@
 /// the snapshots are unchanged.
 ///
 /// A program whose `operator new` records in the tracker pauses that while it takes a snapshot; see
-/// `HTrackerPause` in zanbase/adapters/tracked_memory.h.
+/// `HTrackerPause` in zanbase/adapters/tracked_block.h.
 #ifndef ZANBASE_SNAPSHOT_H
 #define ZANBASE_SNAPSHOT_H
 

@@ -1,0 +1,124 @@
+/// @file
+/// The pieces of tracked memory: the call site, the pause, and functions that record one block. They are for
+/// code that has an allocator of its own, or that replaces the global `operator new`.
+///
+///     void* Allocate(std::size_t size, const HCallSite& site = HCallSite::Here()) {
+///         return HTrackedAllocation(
+///             size, site, [&] { return pool.Take(size); }, [](void* block) { pool.Give(block); });
+///     }
+///     void Deallocate(void* block) {
+///         HTrackedDeallocation(block, [](void* given) { pool.Give(given); });
+///     }
+///
+/// Record a block after it was allocated, and its end before it is given back, so that no other thread can
+/// record the same address in between. If the tracker has no memory for a record, `std::bad_alloc` reaches the
+/// caller. If a free can't be recorded, the record stays. Any thread may call these functions.
+///
+/// examples/adapters/operator_new.cpp replaces the global operators.
+#ifndef ZANBASE_ADAPTERS_TRACKED_BLOCK_H
+#define ZANBASE_ADAPTERS_TRACKED_BLOCK_H
+
+#include <cstddef>
+#include <new>
+
+#include "zanbase/memory.h"
+
+#if __cplusplus >= 202002L
+#include <version>
+#endif
+#ifdef __cpp_lib_source_location
+#include <source_location>
+#endif
+
+/// @addtogroup adapters
+/// @{
+
+/// A call site for the tracker. The text must stay readable as long as the tracker holds it; texts of
+/// `__builtin_FILE` and of `std::source_location` do.
+struct HCallSite {
+    const char* mpcFile;  ///< not owned, not null
+    int mnLine;           ///< line in that file
+
+    /// The place of the call; as a default argument, the place of the call that uses it.
+    static constexpr HCallSite Here(const char* file = __builtin_FILE(), int line = __builtin_LINE()) {
+        return {file, line};
+    }
+
+#ifdef __cpp_lib_source_location
+    /// The place that `where` tells.
+    static constexpr HCallSite At(const std::source_location& where) {
+        return {where.file_name(), static_cast<int>(where.line())};
+    }
+#endif
+};
+
+/// While one of these exists on a thread, blocks are not recorded on that thread, neither by the functions
+/// below nor by the adapters over them. Pauses nest. An object belongs to the thread that made it.
+///
+/// In a program whose `operator new` records, put a pause around the tracker's own operations (reports,
+/// snapshots, `Push`, `Pop`, the resets): those allocate and free while they walk over its tables.
+/// Requires: no block that was recorded is freed during the pause; its record would stay.
+class HTrackerPause {
+public:
+    /// Starts a pause.
+    HTrackerPause() noexcept { ++mnPauses; }
+    /// Ends it.
+    ~HTrackerPause() { --mnPauses; }
+    HTrackerPause(const HTrackerPause&) = delete;
+    HTrackerPause& operator=(const HTrackerPause&) = delete;
+
+    /// True if the calling thread has a pause.
+    [[nodiscard]] static bool IsActive() noexcept { return mnPauses != 0; }
+
+private:
+    static inline thread_local int mnPauses = 0;
+};
+
+/// Records the block at `ptr`, unless the thread has a pause. What the tracker allocates for its record is
+/// not recorded, so a replaced `operator new` may call this.
+inline void HTrackAlloc(void* ptr, std::size_t size, const HCallSite& site) {
+    if (HTrackerPause::IsActive()) return;
+    const HTrackerPause pause;
+    HMemory::Alloc(ptr, size, site.mpcFile, site.mnLine);
+}
+
+/// Records that the block at `ptr` is given back, unless the thread has a pause. Call it before the block is
+/// given back. If the tracker has no memory for it, the record stays.
+inline void HTrackFree(void* ptr) noexcept {
+    if (HTrackerPause::IsActive()) return;
+    const HTrackerPause pause;
+    try {
+        HMemory::Free(ptr);
+    } catch (const std::bad_alloc&) {
+    }
+}
+
+/// Calls `allocate`, records its block of `size` bytes and returns it. If that can't be recorded, calls
+/// `deallocate` with the block and passes the exception on. For code that wraps another allocator, which may
+/// be an `operator new` that records: it is called within a pause.
+template <class Allocate, class Deallocate>
+auto HTrackedAllocation(std::size_t size, const HCallSite& site, Allocate allocate, Deallocate deallocate) {
+    const bool is_recorded = !HTrackerPause::IsActive();
+    const HTrackerPause pause;
+    const auto block = allocate();
+    if (!is_recorded) return block;
+    try {
+        HMemory::Alloc(block, size, site.mpcFile, site.mnLine);
+    } catch (...) {
+        deallocate(block);
+        throw;
+    }
+    return block;
+}
+
+/// Records that `block` is given back, then calls `deallocate` with it within a pause.
+template <class Block, class Deallocate>
+void HTrackedDeallocation(Block block, Deallocate deallocate) {
+    HTrackFree(block);
+    const HTrackerPause pause;
+    deallocate(block);
+}
+
+/// @}
+
+#endif
