@@ -51,13 +51,21 @@ TEST(TrackedMemory, RecordsAtTheLineOfTheCall) {
 
 TEST(TrackedMemory, FollowsAnObjectThroughItsSecondBase) {
     {
-        const HTrackedPtr<Other> object = HMakeTracked<Derived>({"a.cpp", 1});
+        const HTrackedPtr<const Other> object = HMakeTracked<Derived>({"a.cpp", 1});
         EXPECT_EQ(Sites(), "1:1/32 of 1 ");
     }
     EXPECT_EQ(Sites(), "1:0/0 of 1 ");
     EXPECT_THROW((void)HMakeTracked<Thrower>({"a.cpp", 1}), int);
     EXPECT_EQ(Sites(), "1:0/0 of 2 ");
     HMemory::Reset();
+}
+
+TEST(TrackedMemory, CopiesAContainerWithTheUpstreamForCopies) {
+    std::pmr::monotonic_buffer_resource arena;
+    using Allocator = HTrackedAllocator<int, std::pmr::polymorphic_allocator<int>>;
+    const std::vector<int, Allocator> numbers(Allocator(HCallSite::Here(), &arena));
+    const auto copy = numbers;  // NOLINT(performance-unnecessary-copy-initialization)
+    EXPECT_EQ(copy.get_allocator().GetUpstream().resource(), std::pmr::get_default_resource());
 }
 
 TEST(TrackedMemory, GivesBackWhatWasNeverRecorded) {

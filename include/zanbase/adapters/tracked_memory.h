@@ -85,7 +85,7 @@ public:
         : moUpstream(upstream), moSite(site) {}
     /// For another type, the same site and a copy of the upstream.
     template <class Other, class OtherUpstream>
-    HTrackedAllocator(const HTrackedAllocator<Other, OtherUpstream>& other)
+    HTrackedAllocator(const HTrackedAllocator<Other, OtherUpstream>& other) noexcept
         : moUpstream(other.GetUpstream()), moSite(other.GetSite()) {}
 
     /// Room for `count` objects.
@@ -97,6 +97,11 @@ public:
     /// Gives the room back.
     void deallocate(T* block, std::size_t count) {
         HTrackedDeallocation(block, [&](T* given) { Traits::deallocate(moUpstream, given, count); });
+    }
+
+    /// For a copy of a container: the same site, and the upstream that `Upstream` selects for copies.
+    [[nodiscard]] HTrackedAllocator select_on_container_copy_construction() const {
+        return {moSite, Traits::select_on_container_copy_construction(moUpstream)};
     }
 
     /// What it takes from.
@@ -128,20 +133,23 @@ struct HTrackedDelete {
 
     /// Destroys `object`, which is not null, and records that its block is given back.
     void operator()(T* object) const noexcept {
-        void* block = object;
-        if constexpr (std::is_polymorphic_v<T>) block = dynamic_cast<void*>(object);  // the whole object
+        const volatile void* block = object;
+        if constexpr (std::is_polymorphic_v<T>) {
+            block = dynamic_cast<const volatile void*>(object);  // of the whole object
+        }
         object->~T();
-        HTrackedDeallocation(block, [](void* given) { ::operator delete(given); });
+        HTrackedDeallocation(const_cast<void*>(block), [](void* given) { ::operator delete(given); });
     }
 };
 
-/// Owns one object that the tracker knows.
+/// Owns one object that the tracker knows. For arrays use a container.
 template <class T>
 using HTrackedPtr = std::unique_ptr<T, HTrackedDelete<T>>;
 
 /// Makes a `T` of `arguments` and records its block at `site`.
 template <class T, class... Arguments>
 [[nodiscard]] HTrackedPtr<T> HMakeTracked(const HCallSite& site, Arguments&&... arguments) {
+    static_assert(!std::is_array_v<T>, "for an array use a container");
     static_assert(alignof(T) <= __STDCPP_DEFAULT_NEW_ALIGNMENT__, "for a stricter alignment use a container");
     using Block = std::unique_ptr<void, void (*)(void*)>;
     Block block(
