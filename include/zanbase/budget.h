@@ -36,7 +36,9 @@ constexpr long long kNoLimit = 0x7FFFFFFFFFFFFFFF;
 ///
 /// To measure the peak within the scope, the constructor sets the tracker's peak to the current total; the
 /// destructor sets it to the higher one of the old and the new peak. So a usage report within the scope shows
-/// the scope's peak. Requires: budgets for memory are destroyed in the reverse order of their construction.
+/// the scope's peak.
+/// Requires: budgets for memory are destroyed in the reverse order of their construction, and `Check` is called
+/// for the latest one only.
 class ZANBASE_API HMemoryBudget {
 public:
     /// Starts to count.

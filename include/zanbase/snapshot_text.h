@@ -3,8 +3,9 @@
 ///
 /// Every writer flushes the stream and returns true if the stream took the whole text. It returns false if the
 /// stream failed, unless the stream is set to throw; then that exception reaches the caller. Writers use neither
-/// the stream's number format nor its locale, and write rows in the order of the snapshot. Open files as binary,
-/// so that line ends stay a single "\n" on every system.
+/// the stream's number format nor its locale, and write rows in the order of the snapshot. If memory runs
+/// out, `std::bad_alloc` reaches the caller, possibly after a part of the text. Open files as binary, so that
+/// line ends stay a single "\n" on every system.
 ///
 ///     std::ofstream file("memory.json", std::ios::binary);
 ///     if (!HWriteJson(file, HMemorySnapshot::Take())) std::perror("memory.json");

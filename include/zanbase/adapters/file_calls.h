@@ -1,5 +1,7 @@
 /// @file
 /// The functions that recorded files call: those of the C library and those of the system.
+///
+/// examples/adapters/recorded_file.cpp uses both.
 #ifndef ZANBASE_ADAPTERS_FILE_CALLS_H
 #define ZANBASE_ADAPTERS_FILE_CALLS_H
 

@@ -1,5 +1,7 @@
 /// @file
 /// A stream buffer over a recorded file, so that what `std::istream` and `std::ostream` do is in the ledger.
+///
+/// examples/adapters/recorded_file.cpp writes and reads a file through it.
 #ifndef ZANBASE_ADAPTERS_RECORDED_STREAM_H
 #define ZANBASE_ADAPTERS_RECORDED_STREAM_H
 
