@@ -62,15 +62,15 @@ BENCHMARK_TEMPLATE(ConditionPingPong, Ours)->UseRealTime();
 BENCHMARK_TEMPLATE(ConditionPingPong, Standard)->UseRealTime();
 
 template <class Pair>
-void SignalForNobody(benchmark::State& state) {
+void SignalWithoutWaiter(benchmark::State& state) {
     Pair pair;
     for (auto _ : state) pair.Signal();
 }
-BENCHMARK_TEMPLATE(SignalForNobody, Ours);
-BENCHMARK_TEMPLATE(SignalForNobody, Standard);
+BENCHMARK_TEMPLATE(SignalWithoutWaiter, Ours);
+BENCHMARK_TEMPLATE(SignalWithoutWaiter, Standard);
 
 const bool rows =
     AddRatio("ConditionPingPong<Ours>/real_time", "ConditionPingPong<Standard>/real_time", 1.0) &&
-    AddRatio("SignalForNobody<Ours>", "SignalForNobody<Standard>", 0);
+    AddRatio("SignalWithoutWaiter<Ours>", "SignalWithoutWaiter<Standard>", 0);
 
 }  // namespace

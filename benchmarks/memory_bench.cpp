@@ -79,7 +79,7 @@ struct OurTracker {
 PlainTracker plain_tracker;
 OurTracker our_tracker;
 
-enum Order { kNewest, kAny };  // which block goes next
+enum Order { kNewest, kAny };  // which block is freed next
 
 // `live` blocks of 128 call sites, at addresses as an allocator gives them; each step drops one and records
 // one.

@@ -18,6 +18,6 @@ int main() {
     while (std::getchar() != '\n' && std::feof(stdin) == 0) {
     }
     DestroyConsole();
-    std::printf("nobody sees this\n");
+    std::printf("this is dropped\n");
     return 0;
 }

@@ -35,8 +35,8 @@ struct GlobalTimerSnapshot;
 ///
 /// **Thread numbers.** Threads with the same OpenMP number share slots and must toggle one after the other.
 /// Outside parallel regions every thread has number 0, and nested teams number theirs from 0 again. In a process
-/// with two OpenMP runtimes all members of a team of the other runtime have number 0, too; zanbase/openmp.h tells
-/// how to notice that.
+/// with two OpenMP runtimes all members of a team of the other runtime have number 0, too; zanbase/openmp.h shows
+/// how to detect that.
 ///
 /// Not for short code: a pair of toggles costs about two clock readings.
 ///

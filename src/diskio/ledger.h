@@ -44,7 +44,7 @@ struct DiskIOBinding {
     DiskIOUsage* mpoUsage = nullptr;  // not owned: an element of the file table
 };
 
-// Ordered by unsigned bytes; a name comes before its continuations. An element never moves.
+// Ordered by unsigned bytes; a name precedes names that it begins. The address of an element never changes.
 using DiskIOFileMap = std::map<std::string, DiskIOUsage>;
 
 // Hashed: no code iterates over the handles, so their order is not needed.

@@ -6,11 +6,11 @@
 #include <cstdio>
 #include <string>
 
-// A byte count in the largest of the units K, M and G (powers of 1024) that it is greater than, with two
-// decimals; up to 1024 bytes a plain number: "1024", "1.00K", "1024.00K", "1.00M".
+// A byte count as text. Up to 1024 bytes it is a plain number; a larger one has two decimals and the largest
+// unit that it exceeds, of K, M and G (powers of 1024): "1024", "1.00K", "1024.00K", "1.00M".
 std::string SizeText(std::size_t bytes);
 
-// The same for a count of K, which never comes out as a plain number: "0.00K", "1024.00K", "1.00M".
+// The same for a count of K, which always has a unit: "0.00K", "1024.00K", "1.00M".
 std::string KiloSizeText(double kilobytes);
 
 // `text` filled with blanks to `width`, on the left if `rightAlign`, else on the right. Nothing is ever cut.

@@ -1,4 +1,4 @@
-// Contract: the re-entrant lock under HMutex, and the numbers by which locks know their owners.
+// Contract: the re-entrant lock under HMutex, and the numbers that identify owners of locks.
 #ifndef ZANBASE_PLATFORM_LOCK_H
 #define ZANBASE_PLATFORM_LOCK_H
 

@@ -14,9 +14,8 @@ struct ChildResult {
 };
 
 // Runs `body` in a child process and ends that with `exit`, so that exit handlers and static destructors run; the
-// exit code is what `body` returns. To be called before this process has started a thread. On a system without fork
-// the child is a second run of the same test: it comes to the same call again, and runs only that body. There what
-// the test has done before the call is done in the child too.
+// exit code is what `body` returns. Requires: this process has not started a thread. On a system without fork the
+// child is a second run of the same test up to this call, of which it runs the body only.
 ChildResult RunInChild(const std::function<int()>& body);
 
 #endif

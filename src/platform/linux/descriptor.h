@@ -7,7 +7,7 @@
 #include <fcntl.h>
 #include <unistd.h>
 
-// Owns a descriptor and closes it in the destructor; -1 stands for none.
+// Owns a descriptor and closes it in the destructor; -1 is none.
 class Descriptor {
 public:
     explicit Descriptor(int descriptor) noexcept : mnDescriptor(descriptor) {}

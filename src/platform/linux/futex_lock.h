@@ -3,7 +3,7 @@
 // mnState is 0: free, 1: held, 2: held, and threads may sleep on it.
 //
 //   0 -> 1   Acquire, TryAcquire                  1 -> 2   a waiter is about to sleep
-//   0 -> 2   Acquire by a waiter, which can't know whether others sleep
+//   0 -> 2   Acquire by a waiter: others may still sleep
 //   1 -> 0   Release                              2 -> 0   Release, which then wakes one sleeper
 //
 // A waiter does not spin. The owner that wakes a sleeper may acquire the lock again before the sleeper runs.
@@ -19,8 +19,8 @@
 //   mnDepth is plain: the owner alone reads and writes it.
 //   In a process with one thread relaxed loads and stores suffice; starting a second thread publishes them.
 //
-// An owner is known by a number that is never given to a second thread (system_lock.h). The system's thread
-// identifiers are reused, so the lock of a killed owner would seem to belong to a later thread.
+// An owner is identified by a number that is never given to a second thread (system_lock.h). The system reuses
+// its thread identifiers, so the lock of a killed owner would seem to belong to a later thread.
 //
 // Release does not touch the lock after its store of 0: the next owner may destroy it. The wake-up passes the
 // address alone to the kernel.

@@ -2,20 +2,19 @@
 //
 // mnUnits is the number of free units; its highest bit says that threads may sleep.
 //
-//   n -> n - 1            TryAcquire              n -> n + 1          Release
-//   0 -> bit              a waiter is about to sleep
-//   bit + n -> n + 1      Release, which then wakes one sleeper
-//   n -> bit + n - 1      Acquire by a waiter, which can't know whether others sleep
+//   n -> n + 1         Release                     bit + n -> n + 1   Release, which then wakes one sleeper
+//   n -> n - 1         TryAcquire; the bit stays   0 -> bit           a waiter is about to sleep
+//   n -> bit + n - 1   Acquire by a waiter: others may still sleep. It does the same if the bit is set.
 //
-// A woken waiter acquires a unit and sets the bit, or sets the bit before it sleeps again. So while sleepers
-// exist and the bit is clear, a woken waiter is on its way to set it. Several units may have been released by
-// then: a woken waiter that leaves units behind wakes the next sleeper.
+// Release clears the bit and wakes one sleeper. That one sets the bit again, when it acquires a unit or before
+// it sleeps again. So if sleepers exist and the bit is clear, a woken waiter is about to set it. More units may
+// have been released meanwhile without a wake-up: a woken waiter that leaves units wakes the next sleeper.
 //
-// Memory order. Every change is a compare-and-exchange with acq_rel. The release half publishes what the
-// thread did before Release; the acquire half of the change that takes the unit makes it visible. All changes
-// are read-modify-writes, so they continue the release sequence of each earlier Release: the thread that
-// acquires any later unit happens after that Release too. Loads are relaxed: they only choose the value that
-// the next change expects, and a failed change reads again.
+// Memory order. Every change is a compare-and-exchange with acq_rel. The release half publishes what the thread
+// did before Release; the acquire half of a later change makes it visible. All changes are read-modify-writes,
+// so each of them continues the release sequence of all earlier ones: every Release happens-before each later
+// acquisition. Loads are relaxed: they only choose the value that the next change expects, and a failed change
+// reads again.
 //
 // Release does not touch the semaphore after its change: the thread that acquires the unit may destroy it.
 //

@@ -1,4 +1,4 @@
-// The lock inside a HNativeLock, and the numbers by which locks know their owners.
+// The lock inside a HNativeLock, and the numbers that identify owners of locks.
 #ifndef ZANBASE_PLATFORM_LINUX_SYSTEM_LOCK_H
 #define ZANBASE_PLATFORM_LINUX_SYSTEM_LOCK_H
 

@@ -38,7 +38,7 @@ DWORD CallGuarded(void (*body)(void*), void* argument);
 
 }  // extern "C"
 
-// The row: from, to, filter, and where to go on.
+// The row of the table of handlers: start and end of the guarded code, filter, and where to continue.
 asm(R"(
     .text
     .p2align 4
