@@ -17,7 +17,8 @@ bool Fails() {
     ++attempts;
     if (attempts_to_fail == 0) return false;
     --attempts_to_fail;
-    return fails_by_exception ? throw std::bad_alloc() : true;
+    if (fails_by_exception) throw std::bad_alloc();
+    return true;
 }
 
 }  // namespace

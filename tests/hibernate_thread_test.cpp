@@ -32,12 +32,6 @@ struct Worker : HHibernateThread {
     std::atomic<unsigned long long> mnNumber{0};
 };
 
-TEST(HHibernateThread, AcceptsNoSignalBeforeItsStart) {
-    Worker worker([](int) {});
-    EXPECT_TRUE(worker.IsProcessing());
-    EXPECT_FALSE(worker.Signal());
-}
-
 TEST(HHibernateThread, AcceptsNoSignalDuringAPass) {
     const HSemaphore entered(0), go_on(0);
     Worker worker([&](int) {

@@ -14,14 +14,16 @@
 #include "support/faults.h"
 #include "support/run_in_child.h"
 
-int described = 0;  // processors that have a file: those from number 4 on, two to a core
+int described = 0;  // processors that have a file: those from number 4 on, two for each core
 
 extern "C" std::FILE* __wrap_fopen(const char* path, const char*) {
     int number = 0;
     std::sscanf(path, "/sys/devices/system/cpu/cpu%d/topology", &number);
-    static std::string list;  // outlives the stream
-    list = std::to_string(number / 2 * 2) + ",9999";
-    return number < 4 || number >= 4 + described ? nullptr : fmemopen(list.data(), list.size(), "r");
+    if (number < 4 || number >= 4 + described) return nullptr;
+    static std::string processors_of_core;  // outlives the stream
+    const int first = number - number % 2;
+    processors_of_core = std::to_string(first) + ",9999";
+    return fmemopen(processors_of_core.data(), processors_of_core.size(), "r");
 }
 
 TEST(LinuxProcessors, AreCountedAtTheFirstOfTheirCore) {
@@ -118,7 +120,8 @@ TEST(LinuxGuard, LeavesToOthersWhatIsNotItsOwn) {
         const ChildResult child = RunInChild([&] {
             signal(SIGSEGV, each.handler);
             if (!RunGuarded(Fault, nullptr)) return 1;
-            each.is_sent ? void(RunGuarded(Send, nullptr)) : Fault(nullptr);
+            if (each.is_sent) RunGuarded(Send, nullptr);
+            if (!each.is_sent) Fault(nullptr);
             return 0;
         });
         EXPECT_EQ(child.exit_code, each.exit_code) << &each - cases;

@@ -79,18 +79,20 @@ TEST(HThread, TakesItsPriorityWheneverItIsSet) {
         number = static_cast<id_t>(HThread::GetCurrentThreadId());
         leave.Lock();
     });
-    for (unsigned int step = 0; step < 18; ++step) {
-        const auto priority = static_cast<HThreadPriority>(step / 2);
-        runner.SetPriority(step % 2 == 0 ? priority : HThreadPriorityNormal);
-        number = 0;
-        runner.Start(true);
-        runner.SetPriority(priority);
-        const int due = may_raise ? nices[priority] : std::max(nices[priority], 0);
-        while (number == 0 || getpriority(PRIO_PROCESS, number) != due) std::this_thread::yield();
-        setpriority(PRIO_PROCESS, number, 19);
-        runner.SetPriority(priority);  // the one it has: no system call
-        EXPECT_EQ(getpriority(PRIO_PROCESS, number), 19);
-        leave.Unlock();
-        runner.Wait();
+    for (unsigned int value = 0; value < std::size(nices); ++value) {  // the last two are no priorities
+        const auto priority = static_cast<HThreadPriority>(value);
+        const int due = may_raise ? nices[value] : std::max(nices[value], 0);
+        for (const bool is_set_before : {true, false}) {
+            runner.SetPriority(is_set_before ? priority : HThreadPriorityNormal);
+            number = 0;
+            runner.Start(true);
+            runner.SetPriority(priority);
+            while (number == 0 || getpriority(PRIO_PROCESS, number) != due) std::this_thread::yield();
+            setpriority(PRIO_PROCESS, number, 19);
+            runner.SetPriority(priority);  // the one it has: no system call
+            EXPECT_EQ(getpriority(PRIO_PROCESS, number), 19);
+            leave.Unlock();
+            runner.Wait();
+        }
     }
 }

@@ -7,7 +7,6 @@
 
 #include "platform/clock.h"
 #include "platform/guard.h"
-#include "platform/processors.h"
 #include "platform/semaphore.h"
 #include "platform/thread.h"
 #include "support/faults.h"
@@ -26,11 +25,6 @@ TEST(PlatformClock, SleepsNoLessThanAsked) {
     const unsigned int start = ReadTicks();
     for (const unsigned int ms : {0U, 1U, 29U}) SleepFor(ms);
     EXPECT_GE(ReadTicks() - start, 30U);
-}
-
-TEST(PlatformProcessors, AreKnownAndAtLeastAsManyAsCores) {
-    EXPECT_GE(CountLogicalProcessors(), 1);
-    EXPECT_LE(CountProcessorCores(), CountLogicalProcessors());
 }
 
 TEST(PlatformSemaphore, KeepsItsMostUnits) {

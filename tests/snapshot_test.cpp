@@ -95,16 +95,6 @@ TEST(DiskIOSnapshot, HoldsSubtractsAndAddsFiles) {
     HDiskIOReset();
 }
 
-TEST(GlobalTimerSnapshot, HoldsTimersInOrderOfRegistration) {
-    GlobalTimer::GetInstance().RegisterNewTimer("walk");
-    GlobalTimer::GetInstance().RegisterNewTimer("read");
-    const GlobalTimerSnapshot timers = GlobalTimerSnapshot::Take();
-    ASSERT_EQ(timers.maRows.size(), 2U);
-    EXPECT_EQ(timers.maRows[0].moName, "walk");
-    EXPECT_EQ(timers.maRows[1].moName, "read");
-    EXPECT_FALSE(timers.maRows[0].maThreadSeconds.empty());
-}
-
 // The later snapshot has a thread more, and a timer without a difference.
 TEST(GlobalTimerSnapshot, SubtractsAndAddsThreadByThread) {
     GlobalTimerSnapshot sum{{{"read", 1, {1}}, {"idle", 3, {3}}}};

@@ -25,22 +25,34 @@ char* At(std::size_t number) { return &array[number * size]; }  // the model use
 int Compare(std::size_t a, std::size_t b) { return Compare(At(a), At(b)); }
 void Swap(std::size_t a, std::size_t b) { std::swap_ranges(At(a), At(a) + size, At(b)); }
 
+std::size_t MedianOf(std::size_t a, std::size_t b, std::size_t c) {
+    std::size_t larger = a, smaller = b;
+    if (Compare(a, b) <= 0) std::swap(larger, smaller);
+    if (Compare(larger, c) <= 0) return larger;
+    return Compare(smaller, c) < 0 ? c : smaller;
+}
+
+// Moves the elements below that at `mid` before it and those above it behind it; smaller parts first.
 void Partition(std::size_t lo, std::size_t hi) {
     if (hi - lo < 4) return;
     std::size_t mid = lo + (hi - lo) / 2, i = lo, j = hi - 1;
-    if (hi - lo >= 6) {
-        std::size_t median = Compare(lo, mid) > 0 ? lo : mid;
-        if (Compare(median, j) > 0 && Compare(median = lo + mid - median, j) < 0) median = j;
-        Swap(median, mid);
-    }
-    for (; i < j; i += i != mid, j -= j != mid) {
+    if (hi - lo >= 6) Swap(MedianOf(lo, mid, j), mid);
+    while (i < j) {
         while (i < mid && Compare(i, mid) <= 0) ++i;
         while (j > mid && Compare(mid, j) <= 0) --j;
         Swap(i, j);
-        mid = i == mid ? j : j == mid ? i : mid;
+        if (i == mid) {
+            mid = j;
+        } else if (j == mid) {
+            mid = i;
+        }
+        if (i != mid) ++i;
+        if (j != mid) --j;
     }
-    if (hi - mid - 1 < mid - lo) return Partition(mid + 1, hi), Partition(lo, mid);
-    Partition(lo, mid), Partition(mid + 1, hi);
+    const bool is_upper_smaller = hi - mid - 1 < mid - lo;
+    if (is_upper_smaller) Partition(mid + 1, hi);
+    Partition(lo, mid);
+    if (!is_upper_smaller) Partition(mid + 1, hi);
 }
 
 void Sort(std::size_t count) {
@@ -49,9 +61,10 @@ void Sort(std::size_t count) {
     for (std::size_t e = 1; e < std::min<std::size_t>(count, 4); ++e)
         if (Compare(smallest, e) > 0) smallest = e;
     Swap(smallest, 0);
-    for (std::size_t p = 1, q = 1; p < count; q = ++p) {
-        while (Compare(q - 1, p) > 0) --q;
-        std::rotate(At(q), At(p), At(p) + size);
+    for (std::size_t next = 1; next < count; ++next) {
+        std::size_t place = next;
+        while (Compare(place - 1, next) > 0) --place;
+        std::rotate(At(place), At(next), At(next) + size);
     }
 }
 

@@ -3,7 +3,6 @@
 
 #include <gtest/gtest.h>
 
-#include <csignal>
 #include <stdexcept>
 #include <thread>
 #include <vector>
@@ -78,14 +77,6 @@ TEST(HThread, SurvivesAnExhaustedStack) {
     EXPECT_EQ(child.exit_code, 0) << child.err;
     const std::string unknown = "HThread::_Run_() Unknown exception.\n";
     EXPECT_EQ(child.out, unknown + unknown + unknown);
-}
-
-TEST(HThread, LeavesAbortToTheProcess) {
-    const ChildResult child = RunInChild([] {
-        Runner([] { std::abort(); }).RunToEnd();
-        return 0;
-    });
-    EXPECT_EQ(child.signal, SIGABRT);
 }
 
 // Counts when it is destroyed, after some time.

@@ -26,10 +26,13 @@ struct TrackerModel {
     void Check() const {
         const HMemorySnapshot snapshot = HMemorySnapshot::Take();
         Require(snapshot.mnTotal == state.total && snapshot.mnPeak == state.peak);
-        long long blocks = 0, bytes = 0, sum = 0;
-        for (const auto& row : snapshot.maRows) blocks += row.mnLiveBlocks, bytes += row.mnLiveBytes;
-        for (const auto& block : state.blocks) sum += block.second;
-        Require(blocks == static_cast<long long>(state.blocks.size()) && bytes == sum);
+        long long blocks = 0, bytes = 0, expected_bytes = 0;
+        for (const auto& row : snapshot.maRows) {
+            blocks += row.mnLiveBlocks;
+            bytes += row.mnLiveBytes;
+        }
+        for (const auto& block : state.blocks) expected_bytes += block.second;
+        Require(blocks == static_cast<long long>(state.blocks.size()) && bytes == expected_bytes);
     }
 
     void Alloc(void* block, int size) {

@@ -98,7 +98,9 @@ void OperateFromSeveralThreads() {
                 counter.due += counter.Signal() ? 1 : 0;
                 if (random() % 4 == 0) allocating.Wait();
                 const std::lock_guard<std::mutex> lock(mutex);
-                random() % 3 == 0 ? allocating.Kill() : void(allocating.Start(true));
+                const bool kills = random() % 3 == 0;
+                if (kills) allocating.Kill();
+                if (!kills) allocating.Start(true);
                 allocating.SetPriority(static_cast<HThreadPriority>(random() % 8));
             }
         });
