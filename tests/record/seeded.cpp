@@ -3,6 +3,7 @@
 #include <dlfcn.h>
 
 #include <algorithm>
+#include <cstdint>
 #include <cstdlib>
 #include <fstream>
 #include <memory>
@@ -25,6 +26,7 @@ void Operators() {
     gSink = new (std::nothrow) char[5];  // row 1 5 1 5
     gSink = new Wide;                    // row 1 128 1 128
     gSink = new Wide[2];                 // row 1 256 1 256
+    if (reinterpret_cast<std::uintptr_t>(gSink) % alignof(Wide) != 0) std::abort();
     for (int i = 0; i < 3; ++i) {
         long* volatile number = new long;  // row 3 24 0 0
         delete number;

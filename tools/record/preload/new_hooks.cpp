@@ -22,6 +22,8 @@ void* TakeForRecorder(std::size_t size) {
 template <class Function, class... Arguments>
 [[gnu::always_inline]] inline void* New(NextFunction<Function>& next, std::size_t size,
                                         Arguments... arguments) {
+    // The runtime's form for arrays jumps to the plain one, whose caller is this library then.
+    if (gThread.has_request && !gThread.inside) return next(size, arguments...);
     const Frame caller = CallerOfHook();
     if (IsOwnCode(caller.pc) || next.Get() == nullptr) return TakeForRecorder(size);
     if (!Wants(kMemory)) return next(size, arguments...);

@@ -19,12 +19,16 @@ NextFunction<ssize_t(int, void*, size_t, off_t, size_t)> gPread64Chk{"__pread64_
 NextFunction<ssize_t(int, const iovec*, int)> gReadv{"readv"};
 NextFunction<ssize_t(int, const iovec*, int, off_t)> gPreadv{"preadv"};
 NextFunction<ssize_t(int, const iovec*, int, off_t)> gPreadv64{"preadv64"};
+NextFunction<ssize_t(int, const iovec*, int, off_t, int)> gPreadv2{"preadv2"};
+NextFunction<ssize_t(int, const iovec*, int, off_t, int)> gPreadv64v2{"preadv64v2"};
 NextFunction<ssize_t(int, const void*, size_t)> gWrite{"write"};
 NextFunction<ssize_t(int, const void*, size_t, off_t)> gPwrite{"pwrite"};
 NextFunction<ssize_t(int, const void*, size_t, off_t)> gPwrite64{"pwrite64"};
 NextFunction<ssize_t(int, const iovec*, int)> gWritev{"writev"};
 NextFunction<ssize_t(int, const iovec*, int, off_t)> gPwritev{"pwritev"};
 NextFunction<ssize_t(int, const iovec*, int, off_t)> gPwritev64{"pwritev64"};
+NextFunction<ssize_t(int, const iovec*, int, off_t, int)> gPwritev2{"pwritev2"};
+NextFunction<ssize_t(int, const iovec*, int, off_t, int)> gPwritev64v2{"pwritev64v2"};
 NextFunction<off_t(int, off_t, int)> gLseek{"lseek"};
 NextFunction<off_t(int, off_t, int)> gLseek64{"lseek64"};
 NextFunction<ssize_t(int, off_t*, int, off_t*, size_t, unsigned int)> gCopyFileRange{"copy_file_range"};
@@ -85,6 +89,14 @@ ssize_t preadv64(int file, const iovec* parts, int count, off64_t place) {
     return Do(kRead, gPreadv64, file, parts, count, place);
 }
 
+ssize_t preadv2(int file, const iovec* parts, int count, off_t place, int flags) {
+    return Do(kRead, gPreadv2, file, parts, count, place, flags);
+}
+
+ssize_t preadv64v2(int file, const iovec* parts, int count, off64_t place, int flags) {
+    return Do(kRead, gPreadv64v2, file, parts, count, place, flags);
+}
+
 ssize_t write(int file, const void* from, size_t bytes) { return Do(kWrite, gWrite, file, from, bytes); }
 
 ssize_t pwrite(int file, const void* from, size_t bytes, off_t place) {
@@ -103,6 +115,14 @@ ssize_t pwritev(int file, const iovec* parts, int count, off_t place) {
 
 ssize_t pwritev64(int file, const iovec* parts, int count, off64_t place) {
     return Do(kWrite, gPwritev64, file, parts, count, place);
+}
+
+ssize_t pwritev2(int file, const iovec* parts, int count, off_t place, int flags) {
+    return Do(kWrite, gPwritev2, file, parts, count, place, flags);
+}
+
+ssize_t pwritev64v2(int file, const iovec* parts, int count, off64_t place, int flags) {
+    return Do(kWrite, gPwritev64v2, file, parts, count, place, flags);
 }
 
 off_t lseek(int file, off_t place, int from) noexcept { return Do(kSeek, gLseek, file, place, from); }
