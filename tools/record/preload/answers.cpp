@@ -1,6 +1,6 @@
 // The table of answers: open hashing with linear probing. A slot's answer is written before its key, and a
-// key is never replaced by another one, so readers need no lock. A full table is replaced; the old one stays,
-// since a reader may still be in it.
+// slot keeps its key, so readers need no lock. A full table is replaced; the old one stays, since a reader may
+// still be in it.
 #include "answers.h"
 
 #include <array>
@@ -19,11 +19,10 @@ struct Slot {
 
 struct AnswerTable {
     unsigned int bits;  // of the number of slots
-    std::size_t count;  // of slots with a key, retired ones included; guarded by the lock of the sites
+    std::size_t count;  // of slots with a key; guarded by the lock of the sites
     Slot* slots;
 };
 
-constexpr std::uintptr_t kRetiredKey = 1;  // no return address; matches nothing
 std::array<Slot, 1024> gFirstSlots;
 AnswerTable gFirstTable{10, 0, gFirstSlots.data()};
 std::atomic<AnswerTable*> gAnswers{&gFirstTable};
@@ -42,6 +41,7 @@ Slot& SlotOf(const AnswerTable& table, std::uintptr_t key) {
 void Put(AnswerTable& table, std::uintptr_t key, Answer answer) {
     Slot& slot = SlotOf(table, key);
     slot.answer.store(answer, std::memory_order_relaxed);
+    if (slot.key == key) return;
     slot.key.store(key, std::memory_order_release);
     ++table.count;
 }
@@ -53,7 +53,7 @@ bool Grow() {
     if (table == nullptr || fresh == nullptr) return false;
     *table = {old.bits + 1, 0, fresh};
     for (std::size_t i = 0; i < SlotsOf(old); ++i)
-        if (old.slots[i].key > kRetiredKey) Put(*table, old.slots[i].key, old.slots[i].answer);
+        if (old.slots[i].answer != 0) Put(*table, old.slots[i].key, old.slots[i].answer);
     gAnswers.store(table, std::memory_order_release);
     return true;
 }
@@ -88,8 +88,8 @@ void Remember(std::uintptr_t key, Answer answer) {
 void RetireAnswers(std::uintptr_t first, std::uintptr_t end) {
     const AnswerTable& table = *gAnswers;
     for (std::size_t i = 0; i < SlotsOf(table); ++i) {
-        std::atomic<std::uintptr_t>& key = table.slots[i].key;
-        if (key >= first && key < end) key = kRetiredKey;
+        const std::uintptr_t key = table.slots[i].key;
+        if (key >= first && key < end) table.slots[i].answer = 0;
     }
 }
 

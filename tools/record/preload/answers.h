@@ -28,7 +28,7 @@ FrameRule UnpackRule(Answer answer);
 // it; 0 if there is none. Any thread may call it at any time.
 Answer AnswerFor(std::uintptr_t key);
 
-// Requires: `key` is greater than 1 and has no answer; the thread holds the lock of the sites. An answer that
+// Requires: `key` is not 0 and has no answer; the thread holds the lock of the sites. An answer that
 // finds no room is not kept.
 void Remember(std::uintptr_t key, Answer answer);
 

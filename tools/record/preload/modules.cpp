@@ -85,6 +85,7 @@ void ReadMapping(const char* line, const char* line_end, ModuleList& found) {
     module->start = start;
     module->end = end;
     module->offset = offset;
+    module->identity.assign(static_cast<const char*>(rest), line_end);
     module->path.assign(path, line_end);
     module->name = module->path.substr(module->path.rfind('/') + 1);
     module->runtime = IsRuntime(module->name);
@@ -92,7 +93,8 @@ void ReadMapping(const char* line, const char* line_end, ModuleList& found) {
 }
 
 bool IsSame(const Module& one, const Module& other) {
-    return one.loaded && one.start == other.start && one.end == other.end && one.path == other.path;
+    return one.start == other.start && one.end == other.end && one.offset == other.offset &&
+           one.identity == other.identity;
 }
 
 Module* Find(std::uintptr_t pc) {
@@ -127,13 +129,13 @@ std::vector<const Module*> RefreshModules() {
     std::vector<const Module*> gone;
     if (found.empty()) return gone;
     for (const auto& module : Modules()) {
-        if (!module->loaded) continue;
+        const bool was_loaded = module->loaded;
         const auto same = std::find_if(found.begin(), found.end(),
                                        [&](const auto& other) { return IsSame(*module, *other); });
-        if (same != found.end()) {
+        module->loaded = same != found.end();
+        if (module->loaded) {
             found.erase(same);
-        } else {
-            module->loaded = false;
+        } else if (was_loaded) {
             gone.push_back(module.get());
         }
     }

@@ -19,6 +19,7 @@ struct Module {
     std::uintptr_t start;
     std::uintptr_t end;
     std::uint64_t offset;  // in the file, of the byte at `start`
+    std::string identity;  // device, inode and path as the kernel lists them
     std::string path;
     std::string name;      // the path's last part
     bool runtime = false;  // part of the C or C++ runtime: a site is looked for in its callers
@@ -38,7 +39,8 @@ struct Module {
 // The module at `pc`, opened, or null. Reads the list of mappings again if none is known there.
 Module* FindModule(std::uintptr_t pc);
 
-// Reads the list of mappings again; returns the modules that have gone since.
+// Reads the list of mappings again; returns the modules that have gone since. One that comes back to its old
+// place is the same again.
 std::vector<const Module*> RefreshModules();
 
 // Adds the name of a function whose calls are credited to its caller.

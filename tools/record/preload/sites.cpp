@@ -4,6 +4,8 @@
 #include <algorithm>
 #include <array>
 #include <cstdio>
+#include <map>
+#include <tuple>
 #include <unordered_map>
 #include <unordered_set>
 
@@ -41,10 +43,16 @@ const char* Intern(std::string text) {
     return texts->insert(std::move(text)).first->c_str();
 }
 
-// Sites beyond the largest number share it.
+// Addresses of one line share a site, as do sites beyond the largest number.
 SiteId AddSite(const Site& site) {
+    using Key = std::tuple<std::uintptr_t, const Module*, const char*, int>;
+    static auto* const known = new std::map<Key, SiteId>;
+    const Key key =
+        site.file != nullptr ? Key{0, nullptr, site.file, site.line} : Key{site.pc, site.module, nullptr, 0};
+    const auto [entry, added] = known->try_emplace(key, static_cast<SiteId>(Sites().size()));
+    if (!added) return entry->second;
     if (Sites().size() < kSites) Sites().push_back(site);
-    return static_cast<SiteId>(Sites().size() - 1);
+    return entry->second = static_cast<SiteId>(Sites().size() - 1);
 }
 
 bool IsSkipped(const Module& module, std::uint64_t address) {
