@@ -46,7 +46,7 @@ cpp) # rows by line, also of libraries that are loaded at the same address one a
     "$@" -fPIC -shared -DPLUG_IN_NAME='"two.c"' -DPLUG_IN_COUNT=4 "$here/plug_in.cpp" -o two.so
     expect 0 "$record" --csv --output report ./seeded_cpp ./one.so ./two.so
     check_rows seeded.cpp
-    same <(echo 1 6 36 6 36) <(reported one.c) one.c
+    same <(echo 1 12 72 12 72) <(reported one.c) one.c
     same <(echo 1 4 16 4 16) <(reported two.c) two.c
     ;;
 options) # comparison, budgets, a report on a signal, children, an allocator behind the recorder
@@ -102,6 +102,14 @@ hostile) # what can't be recorded is said; programs that make it hard end as the
     says 'left no report'
     expect 0 "$record" --output /dev/full ./small leak 1
     says 'cannot write /dev/full: No space left on device'
+    expect 0 "$record" --output report bash -c 'ulimit -f 1'
+    says 'cannot write .*/report: File too large'
+    # standard error is a pipe without a reader
+    expect 0 bash -c 'mkfifo pipe; exec 3<>pipe 4>pipe 3<&-; "$0" ./small leak 1 2>&4' "$record"
+    expect 0 "$record" --csv --output report ./small exhaust 1000
+    says "small\.c\",[0-9]*,$(cat out),$(cat out)000," report
+    expect 0 "$record" ./small occupy
+    says 'Memory Leak Report'
     expect 0 "$record" --output report ./small leak 1 $(seq 100000)
     says 'Memory Leak Report' report
     expect 0 "$record" --output report bash -c "exec 0<&- 1>&- 2>&-; exec 3<&-; ulimit -n 16; :"

@@ -5,6 +5,7 @@
 #include <stdio.h>
 #include <stdlib.h>
 #include <string.h>
+#include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -44,6 +45,21 @@ static void Threads(int count) {
     }
 }
 
+static void Exhaust(size_t size) {
+    const struct rlimit limit = {1 << 27, 1 << 27};
+    int count = 0;
+    if (setrlimit(RLIMIT_AS, &limit) != 0) abort();
+    while ((gSink = malloc(size)) != NULL) ++count;
+    printf("%d\n", count);
+}
+
+// Puts a file of its own behind every number, then allocates.
+static void Occupy(void) {
+    FILE* file = tmpfile();
+    for (int number = 3; number < 1024; ++number) dup2(fileno(file), number);
+    gSink = malloc(1);
+}
+
 // One child allocates by itself, the other starts this program anew.
 static void Children(char* program) {
     if (fork() == 0) {
@@ -72,6 +88,8 @@ int main(int count, char** words) {
     if (strcmp(what, "status") == 0) return gSink = malloc(1), number;
     if (strcmp(what, "threads") == 0) Threads(number);
     if (strcmp(what, "children") == 0) Children(words[0]);
+    if (strcmp(what, "exhaust") == 0) Exhaust((size_t)number);
+    if (strcmp(what, "occupy") == 0) Occupy();
     if (strcmp(what, "signal") == 0) Signal();
     if (strcmp(what, "fault") == 0) raise(SIGSEGV);
     if (strcmp(what, "replaced") == 0) execl("/bin/true", "true", NULL);

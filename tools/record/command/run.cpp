@@ -87,10 +87,10 @@ int Conclude(const std::string& path, int status, const std::string& result) {
     bool broke = false;
     for (std::size_t at = 0; at < result.size();) {
         const std::size_t end = result.find('\n', at);
-        const std::string line = result.substr(at, end - at);
+        const std::string line = result.substr(at, end + 1 - at);
         at = end + 1;
         if (line == kReportedLine) continue;
-        Say(line);
+        Say(line.substr(0, line.size() - 1));
         broke = true;
     }
     return broke && exit_status == 0 ? kBudgetBroke : exit_status;

@@ -11,7 +11,7 @@ namespace recorder {
 constexpr char kSettingsVariable[] = "ZANBASE_RECORD";
 
 // What the library writes to the command once a report was made; lines about broken budgets follow.
-constexpr char kReportedLine[] = "reported";
+constexpr char kReportedLine[] = "reported\n";
 
 enum class Format { kTables, kJson, kCsv, kFolded };
 

@@ -136,7 +136,7 @@ void CountOpen(int descriptor, const char* path, std::uint64_t nanoseconds) {
 FileRecord* ForgetDescriptor(int descriptor) {
     Mark* const mark = MarkOf(descriptor);
     if (mark == nullptr || mark->load(std::memory_order_acquire) == nullptr) return nullptr;
-    if (syscall(SYS_getpid) != gProcess.load(std::memory_order_relaxed)) return nullptr;
+    if (IsVforkChild()) return nullptr;
     FileRecord* const file = mark->exchange(nullptr, std::memory_order_acq_rel);
     return file == &gNoFile ? nullptr : file;
 }
@@ -144,9 +144,11 @@ FileRecord* ForgetDescriptor(int descriptor) {
 void CopyDescriptor(int descriptor, int copy) {
     FileRecord* const file = FileOf(descriptor);
     Mark* const mark = MarkOf(copy);
-    if (mark == nullptr || syscall(SYS_getpid) != gProcess.load(std::memory_order_relaxed)) return;
+    if (mark == nullptr || IsVforkChild()) return;
     mark->store(file != nullptr ? file : &gNoFile, std::memory_order_release);
 }
+
+bool IsVforkChild() { return syscall(SYS_getpid) != gProcess.load(std::memory_order_relaxed); }
 
 // The first numbers cover what programs are started with in practice; a look costs less than reading the
 // folder.

@@ -47,12 +47,16 @@ void CountOperation(FileRecord& file, DiskOperation operation, std::uint64_t byt
 // `descriptor` was opened as `path`, which may be null. Counts it, and marks the descriptor.
 void CountOpen(int descriptor, const char* path, std::uint64_t nanoseconds);
 
-// Takes the mark away; returns the record that it led to, or null. A child of vfork, whose descriptors are
-// its own but whose memory is its parent's, leaves the mark and gets null.
+// Takes the mark away; returns the record that it led to, or null. A child of vfork leaves the mark and gets
+// null.
 FileRecord* ForgetDescriptor(int descriptor);
 
 // `copy` now stands for what `descriptor` stands for.
 void CopyDescriptor(int descriptor, int copy);
+
+// True in a child of vfork, whose descriptors are its own but whose memory is its parent's; also in a child that
+// is not recorded.
+bool IsVforkChild();
 
 // Descriptors that the program was started with are not opens of its own.
 void MarkInheritedDescriptors();

@@ -40,7 +40,6 @@ namespace {
 
 NextFunction<int(void*)> gDlclose{"dlclose"};
 NextFunction<void(int)> gExitNow{"_exit"};
-NextFunction<void(int)> gQuickExit{"quick_exit"};
 
 Settings* gSettings = nullptr;  // made at the start, never destroyed
 int gProcess = 0;
@@ -106,6 +105,7 @@ void RestoreEnvironment() {
 
 void StartRecording() {
     __cxa_atexit(&FinishAtExit, nullptr, nullptr);
+    at_quick_exit(&Finish);
     pthread_atfork(&PrepareFork, &EndForkInParent, &EndForkInChild);
     TakeDescriptors(*gSettings);
     for (const std::string& name : gSettings->skipped_functions) SkipFunction(name);
@@ -120,7 +120,10 @@ void StartRecording() {
         if (!HookStreams())
             Say("this C library's streams can't be recorded; of those, opens are counted only");
     }
-    if (gSettings->memory) StartReadingModules();
+    if (gSettings->memory) {
+        ReserveMemory();
+        StartReadingModules();
+    }
 }
 
 __attribute__((constructor)) void Start() {
@@ -200,12 +203,6 @@ void _exit(int status) {
 void _Exit(int status) noexcept {
     Finish();
     gExitNow(status);
-    __builtin_unreachable();
-}
-
-void quick_exit(int status) noexcept {
-    Finish();
-    gQuickExit(status);
     __builtin_unreachable();
 }
 

@@ -8,6 +8,7 @@
 
 #include "disk_operation.h"
 #include "next_function.h"
+#include "report_output.h"
 
 namespace recorder {
 namespace {
@@ -47,6 +48,10 @@ int OpenFile(NextFunction<Function>& next, const char* path, Arguments... argume
 int Copied(int descriptor, int copy) {
     if (copy >= 0 && copy != descriptor && Wants(kDisk)) CopyDescriptor(descriptor, copy);
     return copy;
+}
+
+void MakeRoomFor(int copy) {
+    if (IsOwnDescriptor(copy) && !IsVforkChild()) VacateDescriptor(copy);
 }
 
 // A mode is there only where a file may be made.
@@ -160,9 +165,13 @@ void closefrom(int first) noexcept { close_range(first < 0 ? 0U : static_cast<un
 
 int dup(int descriptor) noexcept { return Copied(descriptor, gDup(descriptor)); }
 
-int dup2(int descriptor, int copy) noexcept { return Copied(descriptor, gDup2(descriptor, copy)); }
+int dup2(int descriptor, int copy) noexcept {
+    MakeRoomFor(copy);
+    return Copied(descriptor, gDup2(descriptor, copy));
+}
 
 int dup3(int descriptor, int copy, int flags) noexcept {
+    MakeRoomFor(copy);
     return Copied(descriptor, gDup3(descriptor, copy, flags));
 }
 

@@ -5,7 +5,10 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
+#include <csignal>
 #include <cstring>
+#include <ctime>
+#include <string_view>
 
 #include <fcntl.h>
 #include <sys/resource.h>
@@ -13,15 +16,53 @@
 #include <unistd.h>
 
 #include "disk_operation.h"
+#include "pool.h"
 #include "report.h"
 
 namespace recorder {
 namespace {
 
 int gError = STDERR_FILENO;  // a copy with a high number: programs close standard error before they exit
+int gResult = -1;            // the result's descriptor
 std::array<unsigned int, 2> gOwn{~0U, ~0U};
 
-bool WriteAll(int file, const std::string& text) {
+constexpr std::size_t kReserveBytes = std::size_t{1} << 23;
+void* gReserve = nullptr;
+
+void ListOwn() {
+    gOwn = {gError != STDERR_FILENO ? static_cast<unsigned int>(gError) : ~0U,
+            static_cast<unsigned int>(gResult)};
+    std::sort(gOwn.begin(), gOwn.end());
+}
+
+// A pipe without a reader and a limit on files raise signals in the thread that writes, which would end a
+// program that has ended well. Keeps `errno`.
+class WriteSignalsHeld {
+public:
+    WriteSignalsHeld() {
+        sigemptyset(&moHeld);
+        sigaddset(&moHeld, SIGPIPE);
+        sigaddset(&moHeld, SIGXFSZ);
+        pthread_sigmask(SIG_BLOCK, &moHeld, &moBefore);
+    }
+    ~WriteSignalsHeld() {
+        const int error = errno;
+        const timespec now{};
+        while (sigtimedwait(&moHeld, nullptr, &now) > 0) {
+        }
+        pthread_sigmask(SIG_SETMASK, &moBefore, nullptr);
+        errno = error;
+    }
+    WriteSignalsHeld(const WriteSignalsHeld&) = delete;
+    WriteSignalsHeld& operator=(const WriteSignalsHeld&) = delete;
+
+private:
+    sigset_t moHeld{};
+    sigset_t moBefore{};
+};
+
+bool WriteAll(int file, std::string_view text) {
+    const WriteSignalsHeld scope;
     std::size_t written = 0;
     while (written < text.size()) {
         const long step = syscall(SYS_write, file, text.data() + written, text.size() - written);
@@ -70,22 +111,30 @@ const std::array<unsigned int, 2>& OwnDescriptors() { return gOwn; }
 void TakeDescriptors(const Settings& settings) {
     const int error = MoveHigh(STDERR_FILENO);
     if (error >= 0) gError = error;
-    const int result = settings.result_descriptor;
-    if (!settings.follow && result >= 0) fcntl(result, F_SETFD, FD_CLOEXEC);
-    gOwn = {error >= 0 ? static_cast<unsigned int>(error) : ~0U, static_cast<unsigned int>(result)};
-    std::sort(gOwn.begin(), gOwn.end());
+    gResult = settings.result_descriptor;
+    if (!settings.follow && gResult >= 0) fcntl(gResult, F_SETFD, FD_CLOEXEC);
+    ListOwn();
 }
+
+void VacateDescriptor(int number) {
+    for (int* const own : {&gError, &gResult})
+        if (*own == number) *own = fcntl(number, F_DUPFD_CLOEXEC, number + 1);
+    ListOwn();
+}
+
+void ReserveMemory() { gReserve = MapPages(kReserveBytes); }
 
 void Say(const std::string& text) { WriteAll(gError, "zanbase-record: " + text + "\n"); }
 
 void Report(const Settings& settings, int process, bool is_last) {
+    if (is_last && gReserve != nullptr) UnmapPages(gReserve, kReserveBytes);
     try {
         std::string broken;
         WriteReport(settings, process, ReportText(settings, is_last ? &broken : nullptr));
-        if (is_last && settings.result_descriptor >= 0)
-            WriteAll(settings.result_descriptor, std::string(kReportedLine) + "\n" + broken);
+        if (is_last) WriteAll(gResult, std::string(kReportedLine) + broken);
     } catch (...) {
         WriteAll(gError, "zanbase-record: memory ran out, so there is no report\n");
+        if (is_last) WriteAll(gResult, kReportedLine);
     }
 }
 

@@ -12,6 +12,12 @@ namespace recorder {
 // descriptor from programs that are not recorded. From then on OwnDescriptors tells both.
 void TakeDescriptors(const Settings& settings);
 
+// The program is about to put another file at `number`, which is one of OwnDescriptors: that moves elsewhere.
+void VacateDescriptor(int number);
+
+// Keeps memory for the last report of a program that uses up its own.
+void ReserveMemory();
+
 // Writes a line to standard error as the program found it.
 void Say(const std::string& text);
 
