@@ -151,6 +151,8 @@ void AddBlock(const void* block, std::size_t size, SiteId site) {
 }
 
 DroppedBlock DropBlock(const void* block) {
+    // The allocator's words before the block are needed next; they arrive while the table is read.
+    __builtin_prefetch(static_cast<const char*>(block) - sizeof(std::size_t));
     Shard& shard = ShardOf(block);
     DroppedBlock dropped{};
     {
