@@ -82,6 +82,7 @@ options) # comparison, budgets, a report on a signal, children, an allocator beh
     expect 0 env LD_PRELOAD=./allocator.so "$record" --csv --output report ./small leak 10
     says 'small\.c",[0-9]*,10,160,160,0,10,0' report
     says 'blocks from the allocator: yes' out
+    says "small\.c\",1,[^,]*,1,[^,]*,0,[^,]*,1,[^,]*,$(wc -c <"$here/small.c")," report
     ;;
 hostile) # what can't be recorded is said; programs that make it hard end as they do alone
     "$@" "$here/small.c" -pthread -o small

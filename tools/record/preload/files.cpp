@@ -29,7 +29,7 @@ std::array<std::atomic<Mark*>, kMarkPages> gMarks;
 SpinLock gLock;  // guards the chains; records never leave them
 std::array<FileRecord*, kChains> gChains;
 
-std::atomic<int> gProcess{0};
+std::atomic<int> gProcess{0};  // 0 until the library's constructor has run
 
 // Null if the number is out of range or memory ran out.
 Mark* MarkOf(int descriptor) {
@@ -148,7 +148,10 @@ void CopyDescriptor(int descriptor, int copy) {
     mark->store(file != nullptr ? file : &gNoFile, std::memory_order_release);
 }
 
-bool IsVforkChild() { return syscall(SYS_getpid) != gProcess.load(std::memory_order_relaxed); }
+bool IsVforkChild() {
+    const int process = gProcess.load(std::memory_order_relaxed);
+    return process != 0 && syscall(SYS_getpid) != process;
+}
 
 // The first numbers cover what programs are started with in practice; a look costs less than reading the
 // folder.

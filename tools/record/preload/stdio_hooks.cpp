@@ -51,8 +51,11 @@ int CloseStream(std::FILE* stream) {
 template <class Function, class... Arguments>
 std::FILE* OpenStream(NextFunction<Function>& next, const char* path, Arguments... arguments) {
     const auto descriptor_of = [](std::FILE* stream) { return stream != nullptr ? stream->_fileno : -1; };
-    return Open(
+    const bool sees_close = HookStreams();
+    std::FILE* const opened = Open(
         path, [&] { return next(arguments...); }, descriptor_of);
+    if (!sees_close) ForgetDescriptor(descriptor_of(opened));
+    return opened;
 }
 
 using Entry = void (*)();
@@ -65,6 +68,7 @@ Entry AsEntry(Function* function) {
 }
 
 bool ReplaceEntries(const char* table_name) {
+    const InsideScope scope;
     auto* const table = static_cast<Entry*>(dlsym(RTLD_NEXT, table_name));
     if (table == nullptr) return false;
     const Entry expected[kSlots] = {AsEntry(gFileRead.Get()), AsEntry(gFileWrite.Get()),
@@ -85,7 +89,10 @@ bool ReplaceEntries(const char* table_name) {
 
 }  // namespace
 
-bool HookStreams() { return ReplaceEntries("_IO_file_jumps") && ReplaceEntries("_IO_wfile_jumps"); }
+bool HookStreams() {
+    static const bool hooked = ReplaceEntries("_IO_file_jumps") && ReplaceEntries("_IO_wfile_jumps");
+    return hooked;
+}
 
 }  // namespace recorder
 
