@@ -2,6 +2,11 @@
 #ifndef ZANBASE_TESTS_ENVIRONMENT_H
 #define ZANBASE_TESTS_ENVIRONMENT_H
 
+#include <cstdio>
+
+// Opens an empty file for reading and writing, of this process alone, that is deleted when it is closed.
+std::FILE* OpenTemporaryFile();
+
 // Sets an environment variable, or removes it if `value` is null.
 void SetEnvironment(const char* name, const char* value);
 

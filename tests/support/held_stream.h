@@ -15,7 +15,7 @@
 // A report that holds a mutex of `record` while it waits is a deadlock.
 template <class Report>
 std::string WrittenAfter(void (*record)(), Report report) {
-    std::FILE* const stream = std::tmpfile();
+    std::FILE* const stream = OpenTemporaryFile();
     std::atomic<unsigned long long> id{0};
     LockStream(stream);
     std::thread reporter([&] {

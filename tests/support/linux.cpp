@@ -21,6 +21,8 @@ namespace {
 sem_t held, released;
 }
 
+std::FILE* OpenTemporaryFile() { return std::tmpfile(); }
+
 void SetEnvironment(const char* name, const char* value) {
     if (value == nullptr) {
         unsetenv(name);
@@ -52,7 +54,7 @@ void HoldThread(unsigned long long thread) {
 void ReleaseThread(unsigned long long) { sem_post(&released); }
 
 ChildResult RunInChild(const std::function<int()>& body) {
-    std::FILE* const files[] = {std::tmpfile(), std::tmpfile()};
+    std::FILE* const files[] = {OpenTemporaryFile(), OpenTemporaryFile()};
     std::fflush(nullptr);
     const pid_t child = fork();
     if (child == 0) {

@@ -52,10 +52,12 @@ int RunThisTestAgain(std::FILE* const (&files)[2]) {
     const int kept[] = {_dup(1), _dup(2)};
     for (int i = 0; i < 2; ++i) _dup2(_fileno(files[i]), i + 1);
     const intptr_t code = _spawnl(_P_WAIT, program.c_str(), program.c_str(), filter.c_str(), nullptr);
+    const DWORD error = code == -1 ? GetLastError() : ERROR_SUCCESS;
     for (int i = 0; i < 2; ++i) {
         _dup2(kept[i], i + 1);
         _close(kept[i]);
     }
+    EXPECT_EQ(error, ERROR_SUCCESS) << "the system can't start the child";
     return static_cast<int>(code);
 }
 
@@ -93,6 +95,14 @@ const bool kConditionOutlivesKills = false;
 const bool kExhaustedStackIsAFault = false;  // Wine ends the process
 const bool kKillRunsTlsDestructors = false;
 
+// Two processes that call the runtime's tmpfile() under Wine at once can get the same file, or none.
+std::FILE* OpenTemporaryFile() {
+    char folder[MAX_PATH], name[MAX_PATH];
+    GetTempPathA(sizeof folder, folder);
+    GetTempFileNameA(folder, "zan", 0, name);
+    return std::fopen(name, "w+bD");
+}
+
 void SetEnvironment(const char* name, const char* value) { _putenv_s(name, value != nullptr ? value : ""); }
 
 void AwaitSleepOf(unsigned long long thread) {
@@ -111,7 +121,7 @@ ChildResult RunInChild(const std::function<int()>& body) {
         if (call == wanted) std::exit(RunAsChild(body));
         return {};
     }
-    std::FILE* const files[] = {std::tmpfile(), std::tmpfile()};
+    std::FILE* const files[] = {OpenTemporaryFile(), OpenTemporaryFile()};
     SetEnvironment(kChildVariable, call.c_str());
     const int code = RunThisTestAgain(files);
     SetEnvironment(kChildVariable, nullptr);

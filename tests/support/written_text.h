@@ -5,6 +5,8 @@
 #include <cstdio>
 #include <string>
 
+#include "support/environment.h"
+
 // All that was written to `file`, which is closed.
 inline std::string TakeText(std::FILE* file) {
     std::string text;
@@ -16,7 +18,7 @@ inline std::string TakeText(std::FILE* file) {
 
 template <class Report>
 std::string WrittenBy(Report report) {
-    std::FILE* const file = std::tmpfile();
+    std::FILE* const file = OpenTemporaryFile();
     report(file);
     return TakeText(file);
 }
