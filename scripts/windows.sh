@@ -14,7 +14,8 @@ prepare_windows() {
     fi
     unset DISPLAY
     export WINEPREFIX=$top/build/wine WINEARCH=win64 WINEDEBUG=-all WINESERVER=/usr/lib/wine/wineserver64
-    export WINEDLLOVERRIDES='mscoree,mshtml=;winemenubuilder.exe=d'
+    # Without its debugger, which would show a crash in a dialog and wait, a crash ends the process.
+    export WINEDLLOVERRIDES='mscoree,mshtml=;winemenubuilder.exe,winedbg.exe=d'
     export WINEPATH="Z:$top/build/windows-root/bin;Z:$top/build/$1/src"
 }
 
