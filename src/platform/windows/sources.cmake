@@ -10,7 +10,9 @@ set(ZANBASE_PLATFORM_SOURCES
     processors.cpp
     semaphore.cpp
     stream.cpp
-    thread.cpp)
+    thread.cpp
+    thread_block.cpp
+    thread_self.cpp)
 
 find_package(Intl REQUIRED)
 set_property(TARGET Intl::Intl PROPERTY IMPORTED_GLOBAL TRUE)  # for the tests too

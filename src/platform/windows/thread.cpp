@@ -1,22 +1,9 @@
-// Threads of the system, each with a block that its slot leads to.
-//
-// A block belongs to its users together: its thread until that has left the body or was killed, and each thread that
-// waits for it. The last one frees it. A waiter that is killed never gives up its share, so its block stays.
+// Threads of the system, each with a block to which its slot points.
 #include "platform/thread.h"
 
 #include <new>
 
-#include "platform/windows/spin_lock.h"
-
-// All but the handle is guarded by goBlocks.
-struct HNativeThread {
-    ThreadSlot* mpoSlot;  // null once the thread has no owner
-    void (*mpfnBody)(void*);
-    void* mpoArgument;
-    HANDLE mpoHandle = nullptr;
-    DWORD mnId = 0;  // 0 until the thread is about to enter its body
-    int mnUsers = 1;
-};
+#include "platform/windows/thread_block.h"
 
 namespace {
 
@@ -27,48 +14,29 @@ constexpr int kPriorities[] = {THREAD_PRIORITY_IDLE,         THREAD_PRIORITY_LOW
                                THREAD_PRIORITY_ABOVE_NORMAL, THREAD_PRIORITY_HIGHEST,
                                THREAD_PRIORITY_TIME_CRITICAL};
 
-// A thread is killed under this lock, and so none is killed that holds it.
-SpinLock goBlocks;
-
-// Requires: goBlocks is held.
-void EmptySlot(HNativeThread* block) noexcept {
-    if (block->mpoSlot != nullptr) block->mpoSlot->store(nullptr, std::memory_order_release);
-    block->mpoSlot = nullptr;
-}
-
-// Requires: goBlocks is not held.
-void GiveUpShare(HNativeThread* block) noexcept {
-    {
-        const SpinLockHold hold(goBlocks);
-        if (--block->mnUsers != 0) return;
-    }
-    CloseHandle(block->mpoHandle);
-    delete block;
-}
-
 DWORD WINAPI Enter(void* argument) {
     const auto block = static_cast<HNativeThread*>(argument);
     ULONG bytes = kFaultStackBytes;
     SetThreadStackGuarantee(&bytes);
     {
-        const SpinLockHold hold(goBlocks);  // waits until StartThread has filled the slot
+        const SpinLockHold hold(goBlockLock);  // waits until StartThread has filled the slot
         block->mnId = GetCurrentThreadId();
     }
     block->mpfnBody(block->mpoArgument);
     {
-        const SpinLockHold hold(goBlocks);
+        const SpinLockHold hold(goBlockLock);
         EmptySlot(block);
     }
-    GiveUpShare(block);
+    RemoveUser(block);
     return 0;
 }
 
 void WaitForEnd(HNativeThread* block) noexcept {
     WaitForSingleObject(block->mpoHandle, INFINITE);
-    GiveUpShare(block);
+    RemoveUser(block);
 }
 
-// Requires: goBlocks is held; the thread is in its body and is not the calling one.
+// Requires: goBlockLock is held; the thread is in its body and is not the calling one.
 void Terminate(HNativeThread* block) noexcept {
     TerminateThread(block->mpoHandle, 0);
     WaitForSingleObject(block->mpoHandle, INFINITE);
@@ -80,7 +48,7 @@ void Terminate(HNativeThread* block) noexcept {
 int StartThread(ThreadSlot& slot, void (*body)(void*), void* argument) noexcept {
     const auto block = new (std::nothrow) HNativeThread{&slot, body, argument};
     if (block == nullptr) return ERROR_NOT_ENOUGH_MEMORY;
-    const SpinLockHold hold(goBlocks);
+    const SpinLockHold hold(goBlockLock);
     block->mpoHandle = CreateThread(nullptr, 0, Enter, block, 0, nullptr);
     if (block->mpoHandle == nullptr) {
         const DWORD error = GetLastError();
@@ -104,7 +72,7 @@ std::string SystemErrorText(int error) {
 void JoinThread(ThreadSlot& slot) noexcept {
     HNativeThread* block = nullptr;
     {
-        const SpinLockHold hold(goBlocks);
+        const SpinLockHold hold(goBlockLock);
         block = slot.load(std::memory_order_relaxed);
         if (block == nullptr || block->mnId == GetCurrentThreadId()) return;
         ++block->mnUsers;
@@ -117,7 +85,7 @@ void KillThread(ThreadSlot& slot) noexcept {
     HNativeThread* block = nullptr;
     DWORD id = 0;
     {
-        const SpinLockHold hold(goBlocks);
+        const SpinLockHold hold(goBlockLock);
         block = slot.load(std::memory_order_relaxed);
         if (block == nullptr) return;
         id = block->mnId;
@@ -131,24 +99,17 @@ void KillThread(ThreadSlot& slot) noexcept {
         }
     }
     if (id == 0) return WaitForEnd(block);
-    GiveUpShare(block);  // for the thread
+    RemoveUser(block);  // for the thread
     if (id == GetCurrentThreadId()) TerminateThread(GetCurrentThread(), 0);
 }
 
 void DetachThread(ThreadSlot& slot) noexcept {
-    const SpinLockHold hold(goBlocks);
+    const SpinLockHold hold(goBlockLock);
     if (HNativeThread* const block = slot.load(std::memory_order_relaxed)) EmptySlot(block);
 }
 
 void SetNativePriority(ThreadSlot& slot, int level) noexcept {
-    const SpinLockHold hold(goBlocks);
+    const SpinLockHold hold(goBlockLock);
     if (HNativeThread* const block = slot.load(std::memory_order_relaxed))
         SetThreadPriority(block->mpoHandle, kPriorities[level]);
 }
-
-// The system ends a thread without an exception.
-void RethrowThreadExit() {}
-
-unsigned int CurrentThreadId() noexcept { return GetCurrentThreadId(); }
-
-void YieldThread() noexcept { SwitchToThread(); }
