@@ -7,7 +7,9 @@
 #include <thread>
 #include <vector>
 
+#include "platform/stream.h"
 #include "platform/thread.h"
+#include "platform/windows/standard_stream.h"
 #include "support/run_in_child.h"
 #include "support/runner.h"
 #include "zanbase/semaphore.h"
@@ -133,6 +135,33 @@ TEST(WindowsConsole, IsAWindowWithAllStreamsButAClosedOne) {
     if (child.err.empty()) GTEST_SKIP() << "there is no display for a window";
     EXPECT_EQ(child.err, "created 1, has text, input -1, visible 0 1, destroyed 1, late 4");
     EXPECT_EQ(child.out, "earlier");
+}
+
+// A pipe is full, and another thread uses a second stream: the console takes the first one only.
+TEST(WindowsConsole, WaitsForNoReaderAndNoFullPipe) {
+    HANDLE reader = nullptr, writer = nullptr;
+    CreatePipe(&reader, &writer, nullptr, 1);
+    DWORD written = 0;
+    WriteFile(writer, ".", 1, &written, nullptr);
+    std::FILE* const full = _fdopen(_open_osfhandle(reinterpret_cast<std::intptr_t>(writer), 0), "w");
+    std::fputs("lost", full);
+    std::FILE* const used = OpenTemporaryFile();
+    std::FILE* const targets[] = {OpenTemporaryFile(), OpenTemporaryFile()};
+    const HSemaphore locked(0), leave(0);
+    std::thread user([&] {
+        const StreamLock lock(used);
+        locked.Unlock();
+        leave.Lock();
+    });
+    locked.Lock();
+    RedirectStream(full, targets[0]);
+    RedirectStream(used, targets[1]);
+    std::fputs("moved", full);
+    leave.Unlock();
+    user.join();
+    std::fputs("stays", used);
+    EXPECT_EQ(TakeText(targets[0]), "moved");
+    EXPECT_EQ(TakeText(targets[1]), "");
 }
 
 }  // namespace

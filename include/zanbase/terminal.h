@@ -57,7 +57,8 @@ ZANBASE_API const char* IMPGetMajorRev();
 /// user closes the window, reading gives end-of-file and writing fails.
 ///
 /// On Windows the console is one of the system's, with a window. It can't be made where the process has one already,
-/// as a program started from a command prompt has. There the waits above have no bound.
+/// as a program started from a command prompt has. A stream that another thread uses for longer than a second keeps
+/// its file on Windows.
 ///
 /// Not for programs that need single keys or the mouse: the console transfers lines of text.
 /// Thread-safety: one thread at a time calls the three console operations. Other threads may use the streams.

@@ -7,6 +7,7 @@
 #include <fcntl.h>
 #include <io.h>
 
+#include "platform/windows/standard_stream.h"
 #include "platform/windows/system.h"
 
 namespace {
@@ -22,8 +23,6 @@ std::array<StandardStream, 3> StandardStreams() noexcept {
         {{stdin, STD_INPUT_HANDLE, "r"}, {stdout, STD_OUTPUT_HANDLE, "w"}, {stderr, STD_ERROR_HANDLE, "w"}}};
 }
 
-bool IsClosed(std::FILE* stream) noexcept { return stream->_flag == 0; }
-
 bool UsesConsole(std::FILE* stream) noexcept {
     const auto handle = reinterpret_cast<HANDLE>(_get_osfhandle(_fileno(stream)));
     DWORD mode = 0;
@@ -38,11 +37,8 @@ std::FILE* OpenHandle(HANDLE handle, const char* mode) noexcept {
 // The streams are objects of the runtime with fixed places, so one of the console is copied over each.
 void Connect(const StandardStream& standard) noexcept {
     if (IsClosed(standard.stream)) return;
-    std::FILE* const console = OpenHandle(GetStdHandle(standard.handle_number), standard.mode);
-    if (console == nullptr) return;
-    std::fflush(standard.stream);
-    *standard.stream = *console;
-    std::setvbuf(standard.stream, nullptr, _IONBF, 0);
+    const std::FILE* const console = OpenHandle(GetStdHandle(standard.handle_number), standard.mode);
+    if (console != nullptr) RedirectStream(standard.stream, console);
 }
 
 // The window is known by a title that no other has, for the time that a look for it takes.
@@ -75,9 +71,7 @@ bool CloseConsole() noexcept {
         uses_console[i] = !IsClosed(streams[i].stream) && UsesConsole(streams[i].stream);
     if (FreeConsole() == 0) return false;
     for (std::size_t i = 0; i < streams.size(); ++i) {
-        if (!uses_console[i]) continue;
-        if (std::freopen("NUL", streams[i].mode, streams[i].stream) != nullptr)
-            std::setvbuf(streams[i].stream, nullptr, _IONBF, 0);
+        if (uses_console[i]) RedirectStream(streams[i].stream, nullptr);
     }
     return true;
 }

@@ -9,6 +9,7 @@ set(ZANBASE_PLATFORM_SOURCES
     messages.cpp
     processors.cpp
     semaphore.cpp
+    standard_stream.cpp
     stream.cpp
     thread.cpp
     thread_block.cpp
