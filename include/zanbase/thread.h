@@ -102,14 +102,14 @@ public:
     ///   - If the thread blocks all signals, `Kill` waits until it unblocks them or ends. `Kill` also waits
     ///     for the end of the thread if the program has a handler for every real-time signal.
     ///   - A thread inside the C library may hold a lock there, such as that of `malloc`. It is terminated
-    ///     once it has left, mostly within microseconds. It is terminated inside the library if it is not
-    ///     found outside for ten seconds, or if it waits at one system call for ten milliseconds; the latter
-    ///     is one second while a thread holds the lock of `stdout` or `stderr`.
-    ///   - So these locks can stay held: that of `stdin`, if the thread waits in `fgets(stdin)` or
-    ///     `getline(cin)`, after which every `fflush(nullptr)` deadlocks; that of a stream, if the thread
-    ///     waits in `printf` for room in a pipe; those of the resolver, if it waits in `getaddrinfo`; the
-    ///     loader's, if it runs in a callback of `dl_iterate_phdr`. Before the call end such a wait, by
-    ///     closing the other end of the pipe for instance.
+    ///     once it has left the library, mostly within microseconds. Two limits end this delay: ten seconds in
+    ///     all, and ten milliseconds in one system call (one second while a thread holds the lock of `stdout`
+    ///     or `stderr`). Then the thread is terminated inside the library.
+    ///   - So a thread that waits in a system call can leave these locks held: that of `stdin` in
+    ///     `fgets(stdin)` or `getline(cin)`, after which every `fflush(nullptr)` deadlocks; that of a stream in
+    ///     `printf` to a full pipe; those of the resolver in `getaddrinfo`. End such a wait before the call,
+    ///     for instance by closing the other end of the pipe. A callback of `dl_iterate_phdr` leaves the
+    ///     loader's lock held.
     ///   - Other threads that wait on a `std::condition_variable` together with the thread may miss wake-ups
     ///     from then on. The mutexes, semaphores and condition variables of this library are not affected.
     ///   - Memory leaks: the thread's cache of freed blocks (0.7 kB, and up to 234 kB that the thread has

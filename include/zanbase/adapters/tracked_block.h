@@ -12,7 +12,7 @@
 ///
 /// Record a block after it was allocated, and its end before it is given back, so that no other thread can
 /// record the same address in between. If the tracker has no memory for a record, `std::bad_alloc` reaches the
-/// caller. If a free can't be recorded, the record stays. Any thread may call these functions.
+/// caller. If a free can't be recorded, the record stays.
 ///
 /// examples/adapters/operator_new.cpp replaces the global operators.
 #ifndef ZANBASE_ADAPTERS_TRACKED_BLOCK_H
@@ -34,7 +34,7 @@
 /// @{
 
 /// A call site for the tracker. The text must stay readable as long as the tracker holds it; texts of
-/// `__builtin_FILE` and of `std::source_location` do.
+/// `__builtin_FILE` and of `std::source_location` do. Thread-safe, as any plain value.
 struct HCallSite {
     const char* mpcFile;  ///< not owned, not null
     int mnLine;           ///< line in that file
@@ -53,7 +53,7 @@ struct HCallSite {
 };
 
 /// While one of these exists on a thread, blocks are not recorded on that thread, neither by the functions
-/// below nor by the adapters over them. Pauses nest. An object belongs to the thread that made it.
+/// below nor by the adapters over them. Pauses nest. Not thread-safe: an object belongs to the thread that made it.
 ///
 /// In a program whose `operator new` records, put a pause around the tracker's own operations (reports,
 /// snapshots, `Push`, `Pop`, the resets): those allocate and free while they walk over its tables.
@@ -75,7 +75,7 @@ private:
 };
 
 /// Records the block at `ptr`, unless the thread has a pause. What the tracker allocates for its record is
-/// not recorded, so a replaced `operator new` may call this.
+/// not recorded, so a replaced `operator new` may call this. Thread-safe.
 inline void HTrackAlloc(void* ptr, std::size_t size, const HCallSite& site) {
     if (HTrackerPause::IsActive()) return;
     const HTrackerPause pause;
@@ -83,7 +83,7 @@ inline void HTrackAlloc(void* ptr, std::size_t size, const HCallSite& site) {
 }
 
 /// Records that the block at `ptr` is given back, unless the thread has a pause. Call it before the block is
-/// given back. If the tracker has no memory for it, the record stays.
+/// given back. If the tracker has no memory for it, the record stays. Thread-safe.
 inline void HTrackFree(void* ptr) noexcept {
     if (HTrackerPause::IsActive()) return;
     const HTrackerPause pause;
@@ -94,8 +94,8 @@ inline void HTrackFree(void* ptr) noexcept {
 }
 
 /// Calls `allocate`, records its block of `size` bytes and returns it. If that can't be recorded, calls
-/// `deallocate` with the block and passes the exception on. For code that wraps another allocator, which may
-/// be an `operator new` that records: it is called within a pause.
+/// `deallocate` with the block and passes the exception on. Both are called within a pause, so they may use an
+/// `operator new` that records. Thread-safe if both are.
 template <class Allocate, class Deallocate>
 auto HTrackedAllocation(std::size_t size, const HCallSite& site, Allocate allocate, Deallocate deallocate) {
     const bool is_recorded = !HTrackerPause::IsActive();
@@ -111,7 +111,7 @@ auto HTrackedAllocation(std::size_t size, const HCallSite& site, Allocate alloca
     return block;
 }
 
-/// Records that `block` is given back, then calls `deallocate` with it within a pause.
+/// Records that `block` is given back, then calls `deallocate` with it within a pause. Thread-safe if that is.
 template <class Block, class Deallocate>
 void HTrackedDeallocation(Block block, Deallocate deallocate) {
     HTrackFree(block);

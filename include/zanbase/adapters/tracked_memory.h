@@ -1,6 +1,6 @@
 /// @file
-/// Memory that the allocation tracker knows of without a line of feeding: a memory resource, an allocator and an
-/// owning pointer.
+/// Memory that is recorded in the allocation tracker by itself: a memory resource, an allocator and an owning
+/// pointer.
 ///
 ///     HTrackedResource memory;                          // blocks are recorded at this file and line
 ///     std::pmr::vector<int> numbers(&memory);
@@ -10,8 +10,7 @@
 ///
 /// All of them record as zanbase/adapters/tracked_block.h says. If the tracker has no memory for a record, the
 /// block is given back and `std::bad_alloc` reaches the caller. What is freed and was never recorded (because
-/// it was allocated during a pause, or the tables were reset) is given back all the same. Any thread may use
-/// any of them, where what they allocate from is thread-safe.
+/// it was allocated during a pause, or the tables were reset) is given back all the same.
 ///
 /// examples/adapters/tracked_memory.cpp shows all of them.
 #ifndef ZANBASE_ADAPTERS_TRACKED_MEMORY_H
@@ -30,7 +29,7 @@
 /// @{
 
 /// A memory resource that takes blocks from `upstream` and records them at one call site, by default the line
-/// that makes the resource.
+/// that makes the resource. Thread-safe if `upstream` is.
 class HTrackedResource : public std::pmr::memory_resource {
 public:
     /// Takes from the default resource of the moment.
@@ -60,8 +59,8 @@ private:
     HCallSite moSite;
 };
 
-/// An allocator that takes from `Upstream` and records at one call site. It has no default constructor: a
-/// container that made its own would tell a line of the standard library.
+/// An allocator that takes from `Upstream` and records at one call site. It has no default constructor:
+/// constructed by a container it would record a line of the standard library. Thread-safe if `Upstream` is.
 template <class T, class Upstream = std::allocator<T>>
 class HTrackedAllocator {
     using Traits = std::allocator_traits<Upstream>;
@@ -123,7 +122,8 @@ private:
     HCallSite moSite;
 };
 
-/// Destroys an object of `HMakeTracked`. Where `T` is a base of the object's class, it has a virtual destructor.
+/// Destroys an object of `HMakeTracked`. Thread-safe for different objects. Requires: if `T` is a base of the
+/// object's class, it has a virtual destructor.
 template <class T>
 struct HTrackedDelete {
     HTrackedDelete() = default;
@@ -146,7 +146,7 @@ struct HTrackedDelete {
 template <class T>
 using HTrackedPtr = std::unique_ptr<T, HTrackedDelete<T>>;
 
-/// Makes a `T` of `arguments` and records its block at `site`.
+/// Makes a `T` of `arguments` and records its block at `site`. Thread-safe.
 template <class T, class... Arguments>
 [[nodiscard]] HTrackedPtr<T> HMakeTracked(const HCallSite& site, Arguments&&... arguments) {
     static_assert(!std::is_array_v<T>, "for an array use a container");
