@@ -32,8 +32,8 @@ void JoinThread(ThreadSlot& slot) noexcept;
 // itself.
 void KillThread(ThreadSlot& slot) noexcept;
 
-// Empties the slot. The thread runs on and can't be reached any more; threads already in JoinThread keep
-// waiting.
+// Empties the slot. The thread continues, and no function can affect it any more; threads already in JoinThread
+// keep waiting.
 void DetachThread(ThreadSlot& slot) noexcept;
 
 // Sets the priority of the thread in the slot: a level from 0 (idle) to 6 (time-critical); 3 is the priority

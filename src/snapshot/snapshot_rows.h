@@ -15,7 +15,7 @@ inline long long Combined(long long left, long long right, int sign) {
 
 inline double Combined(double left, double right, int sign) { return left + sign * right; }
 
-// What an account says about its rows in a type `Rules`:
+// `Rules` describes the rows of an account:
 //   Row                                            the type of a row
 //   static bool KeyLess(const Row&, const Row&)    a strict order of the keys
 //   static Row WithoutFigures(const Row&)          the key alone, all figures 0

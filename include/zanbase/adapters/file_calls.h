@@ -1,6 +1,9 @@
 /// @file
 /// The functions that recorded files call: those of the C library and those of the system.
 ///
+/// `HRecorded` works over any other file layer through a type with the same members. After a failure `Open` returns
+/// `kClosed` and the other functions -1, with the reason in `errno`. They are called with an open file only.
+///
 /// examples/adapters/recorded_file.cpp uses both.
 #ifndef ZANBASE_ADAPTERS_FILE_CALLS_H
 #define ZANBASE_ADAPTERS_FILE_CALLS_H
@@ -14,9 +17,6 @@
 
 /// @addtogroup adapters
 /// @{
-
-// `HRecorded` works over any other file layer through a type with these members. After a failure `Open` returns
-// `kClosed` and the other functions -1, with the reason in `errno`. They are called with an open file only.
 
 /// The functions of the C library below `HRecordedFile`. Thread-safe for different files.
 struct HStdioCalls {

@@ -64,7 +64,7 @@ bool IsRegularFile(int descriptor) noexcept {
 }
 
 // Opens the file of `descriptor` again for writes that never block: O_NONBLOCK on the descriptor itself would
-// affect every process that shares it. Sockets can't be opened so; they get a plain copy of the descriptor.
+// affect every process that shares it. Sockets can't be opened again; they get a plain copy of the descriptor.
 int OpenForPieces(int descriptor) noexcept {
     char path[40];
     std::snprintf(path, sizeof path, "/proc/self/fd/%d", descriptor);

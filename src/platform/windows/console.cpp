@@ -34,14 +34,14 @@ std::FILE* OpenHandle(HANDLE handle, const char* mode) noexcept {
     return descriptor < 0 ? nullptr : _fdopen(descriptor, mode);
 }
 
-// The streams are objects of the runtime with fixed places, so one of the console is copied over each.
+// The streams are objects of the runtime at fixed addresses, so a stream of the console is copied over each.
 void Connect(const StandardStream& standard) noexcept {
     if (IsClosed(standard.stream)) return;
     const std::FILE* const console = OpenHandle(GetStdHandle(standard.handle_number), standard.mode);
     if (console != nullptr) RedirectStream(standard.stream, console);
 }
 
-// The window is known by a title that no other has, for the time that a look for it takes.
+// A temporary title, which no other window has, identifies the window while it is searched for.
 HWND FindConsoleWindow() noexcept {
     constexpr DWORD kTitleBytes = 1024;
     constexpr DWORD kMillisecondsUntilSet = 40;

@@ -7,7 +7,8 @@
 
 namespace {
 
-constexpr ULONG kFaultStackBytes = 16 * 1024;  // what a used-up stack leaves to the filter of machine faults
+// Reserved for the filter of machine faults in an exhausted stack.
+constexpr ULONG kFaultStackBytes = 16 * 1024;
 
 constexpr int kPriorities[] = {THREAD_PRIORITY_IDLE,         THREAD_PRIORITY_LOWEST,
                                THREAD_PRIORITY_BELOW_NORMAL, THREAD_PRIORITY_NORMAL,
@@ -62,7 +63,7 @@ int StartThread(ThreadSlot& slot, void (*body)(void*), void* argument) noexcept 
 std::string SystemErrorText(int error) {
     constexpr DWORD kFlags =
         FORMAT_MESSAGE_ALLOCATE_BUFFER | FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_IGNORE_INSERTS;
-    char* text = nullptr;  // the system writes a pointer where it asks for a text
+    char* text = nullptr;  // ALLOCATE_BUFFER: the system stores a pointer in it
     FormatMessageA(kFlags, nullptr, static_cast<DWORD>(error), 0, reinterpret_cast<char*>(&text), 0, nullptr);
     std::string copy = text != nullptr ? text : "";
     LocalFree(text);
@@ -80,7 +81,8 @@ void JoinThread(ThreadSlot& slot) noexcept {
     WaitForEnd(block);
 }
 
-// A thread that is not in its body yet may hold the loader's lock. So its body is taken away, and it ends by itself.
+// A thread that is not in its body yet may hold the loader's lock. So it is not terminated: its body is removed, and it
+// ends by itself.
 void KillThread(ThreadSlot& slot) noexcept {
     HNativeThread* block = nullptr;
     DWORD id = 0;
