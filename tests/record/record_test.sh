@@ -109,8 +109,10 @@ hostile) # what can't be recorded is said; programs that make it hard end as the
     expect 0 bash -c 'mkfifo pipe; exec 3<>pipe 4>pipe 3<&-; "$0" ./small leak 1 2>&4' "$record"
     expect 0 "$record" --csv --output report ./small exhaust 1000
     says "small\.c\",[0-9]*,$(cat out),$(cat out)000," report
-    expect 0 "$record" ./small occupy
+    expect 0 "$record" bash -c 'for number in {900..1023}; do eval "exec $number>occupied"; done'
     says 'Memory Leak Report'
+    expect 0 timeout 60 "$record" --csv --output report ./small tick
+    says "/log\",1,.*,$(wc -c <log),[^,]*,$(wc -c <log)\$" report
     expect 0 "$record" --output report ./small leak 1 $(seq 100000)
     says 'Memory Leak Report' report
     expect 0 "$record" --output report bash -c "exec 0<&- 1>&- 2>&-; exec 3<&-; ulimit -n 16; :"

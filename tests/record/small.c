@@ -6,6 +6,7 @@
 #include <stdlib.h>
 #include <string.h>
 #include <sys/resource.h>
+#include <sys/time.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -51,19 +52,31 @@ static void Threads(int count) {
     }
 }
 
+static FILE* gLog;
+static volatile int gTicks;
+
+static void Mark(int signal) {
+    gTicks += signal != 0;
+    if (write(fileno(gLog), "", 1) != 1) abort();
+}
+
+// Writes in a signal handler too, in a process that has threads.
+static void Tick(void) {
+    const struct itimerval often = {{0, 100}, {0, 100}};
+    Threads(1);
+    gLog = fopen("log", "w");
+    signal(SIGALRM, Mark);
+    setitimer(ITIMER_REAL, &often, NULL);
+    while (gTicks < 2000) Mark(0);
+    signal(SIGALRM, SIG_IGN);
+}
+
 static void Exhaust(size_t size) {
     const struct rlimit limit = {1 << 27, 1 << 27};
     int count = 0;
     if (setrlimit(RLIMIT_AS, &limit) != 0) abort();
     while ((gSink = malloc(size)) != NULL) ++count;
     printf("%d\n", count);
-}
-
-// Puts a file of its own behind every number, then allocates.
-static void Occupy(void) {
-    FILE* file = tmpfile();
-    for (int number = 3; number < 1024; ++number) dup2(fileno(file), number);
-    gSink = malloc(1);
 }
 
 // One child allocates by itself, the other starts this program anew.
@@ -94,8 +107,8 @@ int main(int count, char** words) {
     if (strcmp(what, "status") == 0) return gSink = malloc(1), number;
     if (strcmp(what, "threads") == 0) Threads(number);
     if (strcmp(what, "children") == 0) Children(words[0]);
+    if (strcmp(what, "tick") == 0) Tick();
     if (strcmp(what, "exhaust") == 0) Exhaust((size_t)number);
-    if (strcmp(what, "occupy") == 0) Occupy();
     if (strcmp(what, "signal") == 0) Signal();
     if (strcmp(what, "fault") == 0) raise(SIGSEGV);
     if (strcmp(what, "replaced") == 0) execl("/bin/true", "true", NULL);

@@ -13,6 +13,7 @@
 #include <unistd.h>
 
 #include "pool.h"
+#include "spin_lock.h"
 #include "thread_state.h"
 
 namespace recorder {
@@ -119,11 +120,10 @@ FileRecord* FileOf(int descriptor) {
 
 void CountOperation(FileRecord& file, DiskOperation operation, std::uint64_t bytes,
                     std::uint64_t nanoseconds) {
-    const SpinLockScope lock(file.lock);
-    OperationSum& sum = file.sums[static_cast<std::size_t>(operation)];
-    ++sum.count;
-    sum.bytes += bytes;
-    sum.nanoseconds += nanoseconds;
+    OperationCounters& counters = file.counters[static_cast<std::size_t>(operation)];
+    AddTo(counters.count, std::uint64_t{1});
+    AddTo(counters.nanoseconds, nanoseconds);
+    if (bytes != 0) AddTo(counters.bytes, bytes);
 }
 
 void CountOpen(int descriptor, const char* path, std::uint64_t nanoseconds) {
@@ -177,8 +177,11 @@ std::vector<NamedSums> ListFiles() {
     const SpinLockScope lock(gLock);
     for (FileRecord* const chain : gChains) {
         for (FileRecord* file = chain; file != nullptr; file = file->next) {
-            const SpinLockScope file_lock(file->lock);
-            files.push_back({file->name, file->sums});
+            files.push_back({file->name, {}});
+            for (std::size_t i = 0; i < kDiskOperations; ++i) {
+                const OperationCounters& counters = file->counters[i];
+                files.back().sums[i] = {counters.count, counters.nanoseconds, counters.bytes};
+            }
         }
     }
     return files;
@@ -189,8 +192,11 @@ void ResetFilesInChild() {
     gLock.Release();
     for (FileRecord* const chain : gChains) {
         for (FileRecord* file = chain; file != nullptr; file = file->next) {
-            file->lock.Release();
-            file->sums = {};
+            for (OperationCounters& counters : file->counters) {
+                counters.count = 0;
+                counters.nanoseconds = 0;
+                counters.bytes = 0;
+            }
         }
     }
 }

@@ -7,11 +7,10 @@
 #define ZANBASE_RECORD_FILES_H
 
 #include <array>
+#include <atomic>
 #include <cstdint>
 #include <string>
 #include <vector>
-
-#include "spin_lock.h"
 
 namespace recorder {
 
@@ -25,10 +24,16 @@ struct OperationSum {
 };
 using FileSums = std::array<OperationSum, kDiskOperations>;
 
+// Has no lock, as programs may read and write in a signal handler.
+struct OperationCounters {
+    std::atomic<std::uint64_t> count;
+    std::atomic<std::uint64_t> nanoseconds;
+    std::atomic<std::uint64_t> bytes;
+};
+
 // Lives as long as the process.
 struct FileRecord {
-    SpinLock lock;
-    FileSums sums;  // guarded by lock
+    std::array<OperationCounters, kDiskOperations> counters;
     const char* name;
     std::uint64_t device;  // these tell files apart without reading their names; constant, as is `name`
     std::uint64_t inode;

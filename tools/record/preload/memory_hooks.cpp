@@ -47,10 +47,18 @@ bool IsForLookUp(const void* block) {
     return block;
 }
 
+// A signal handler that allocates meanwhile must not find the table halfway through a change.
+[[gnu::always_inline]] inline DroppedBlock Dropped(const void* block) {
+    gThread.inside = true;
+    const DroppedBlock dropped = DropBlock(block);
+    gThread.inside = false;
+    return dropped;
+}
+
 // A reallocation that fails leaves the block as it was; with a size of 0 it freed it.
 [[gnu::always_inline]] inline void* Reallocate(void* old, std::size_t size) {
     if (old == nullptr || !Wants(kMemory)) return Recorded(gRealloc(old, size), size);
-    const DroppedBlock dropped = DropBlock(old);
+    const DroppedBlock dropped = Dropped(old);
     void* const block = gRealloc(old, size);
     if (block == nullptr && size != 0 && dropped.found) {
         const InsideScope scope;
@@ -86,7 +94,7 @@ void* reallocarray(void* old, std::size_t count, std::size_t size) noexcept {
 
 void free(void* block) noexcept {
     if (block == nullptr || IsForLookUp(block)) return;
-    if (Wants(kMemory)) DropBlock(block);
+    if (Wants(kMemory)) Dropped(block);
     gFree(block);
 }
 

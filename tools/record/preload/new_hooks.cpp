@@ -45,8 +45,8 @@ template <class Function, class... Arguments>
         next(block, arguments...);
         return;
     }
-    DropBlock(block);
     const InsideScope scope;
+    DropBlock(block);
     next(block, arguments...);
 }
 
