@@ -64,7 +64,7 @@ TEST(TrackedMemory, CopiesAContainerWithTheUpstreamForCopies) {
     std::pmr::monotonic_buffer_resource arena;
     using Allocator = HTrackedAllocator<int, std::pmr::polymorphic_allocator<int>>;
     const std::vector<int, Allocator> numbers(Allocator(HCallSite::Here(), &arena));
-    const auto copy = numbers;  // NOLINT(performance-unnecessary-copy-initialization)
+    const auto copy = numbers;
     EXPECT_EQ(copy.get_allocator().GetUpstream().resource(), std::pmr::get_default_resource());
 }
 

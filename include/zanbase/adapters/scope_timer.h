@@ -67,7 +67,7 @@ inline unsigned long long HTimerNamed(const std::string& name) {
 
 /// Times the rest of the enclosing scope as `name`, as `HTimerScope`. The same name anywhere in the program is
 /// the same timer. A macro, because each use has a static variable of its own for the timer's identifier.
-/// Use it at most once on a line.
+/// It evaluates `name` at the first pass only, and can be used once on a line.
 #define HTimedRegion(name)                                                                      \
     static const unsigned long long ZANBASE_JOIN(knZanbaseTimer, __LINE__) = HTimerNamed(name); \
     const HTimerScope ZANBASE_JOIN(zanbase_timer_scope_, __LINE__)(ZANBASE_JOIN(knZanbaseTimer, __LINE__))
