@@ -1,4 +1,4 @@
-// A pair of toggles beside the two clock readings that it can't do without, and how it scales over a team.
+// A pair of toggles beside the two clock readings that it requires, and how it scales over a team.
 #include "zanbase/global_timer.h"
 
 #include <benchmark/benchmark.h>

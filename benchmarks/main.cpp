@@ -105,7 +105,7 @@ bool AddMeanRatio(const std::string& ours, const std::string& peer, const std::v
 }
 
 int main(int argc, char** argv) {
-    // Defaults first, so that a flag of the caller's comes later and wins.
+    // Defaults first: a later flag of the caller overrides them.
     std::vector<std::string> flags = {argv[0], "--benchmark_repetitions=9", "--benchmark_min_time=0.03",
                                       "--benchmark_enable_random_interleaving=true"};
     flags.insert(flags.end(), argv + 1, argv + argc);
@@ -114,7 +114,7 @@ int main(int argc, char** argv) {
     int count = static_cast<int>(pointers.size());
     benchmark::Initialize(&count, pointers.data());
     if (benchmark::ReportUnrecognizedArguments(count, pointers.data())) return 1;
-    // The first thread raises the price of a lock for good, so what is measured without threads runs before.
+    // Locks cost more once a process has had a second thread, so what is measured with one thread runs before.
     BestTimes times;
     std::string filter = benchmark::GetBenchmarkFilter();
     if (filter.empty()) {

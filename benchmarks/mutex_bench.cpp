@@ -1,5 +1,5 @@
 // HMutex beside the standard library's re-entrant mutex: a free pair before and after the process has had a
-// second thread, threads that compete for the mutex, and what that does to the tracker, which holds one.
+// second thread, threads that compete for the mutex, and the tracker, which holds one, on one thread and on two.
 #include "zanbase/mutex.h"
 
 #include <benchmark/benchmark.h>
@@ -44,7 +44,7 @@ void MutexPair(benchmark::State& state) {
     }
 }
 
-// main runs it before the process starts its first thread, which raises the price of a lock for good.
+// main runs it before the process starts its first thread: locks cost more from then on.
 template <class Mutex>
 void MutexPairWithoutThreads(benchmark::State& state) {
     if (__libc_single_threaded == 0) return state.SkipWithError("the process has had threads");

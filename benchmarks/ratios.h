@@ -8,7 +8,7 @@
 
 // Adds a row: the time of the benchmark named `ours` over that of the one named `peer` (full names as the run
 // prints them, arguments and thread counts included). `goal` is the highest ratio aimed at; 0 means none.
-// Returns true, so that it can stand at namespace scope.
+// Returns true, so that a variable at namespace scope can be initialised with it.
 // `file` gives the row its family.
 bool AddRatio(const std::string& ours, const std::string& peer, double goal,
               const char* file = __builtin_FILE());

@@ -70,7 +70,7 @@ void WritePair(benchmark::State& state) {
 }
 
 // Two threads enter and leave in turns that overlap; the measured one enters from time to time as the other
-// kind. The stream ends after kStreamMs, and with it a wait that would have no end.
+// kind. The stream ends after kStreamMs, so that every wait ends.
 constexpr int kStreamMs = 100;
 
 double MsSince(std::chrono::steady_clock::time_point start) {

@@ -1,4 +1,4 @@
-// Containers and an object whose memory is recorded without a line of feeding. Prints what is live at each line.
+// Containers and an object whose memory is recorded by adapters. Prints what is live at each line.
 #include <zanbase/adapters/tracked_memory.h>
 
 #include <cstdio>

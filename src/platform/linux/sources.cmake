@@ -20,10 +20,10 @@ set(ZANBASE_PLATFORM_SOURCES
     thread_self.cpp
     thread_wait.cpp)
 
-# Lets a killed thread first leave the C library, so that it leaves none of the library's locks held. Without it a
-# kill takes effect at once, and 150 lines that know the processor are not built; but a process with a thread killed
-# inside malloc or printf deadlocks.
-option(ZANBASE_KILL_SAFETY "Look at where a thread is before it is killed" ON)
+# Delays a kill while the thread may hold a lock of the C library, so that none of these locks stays held. OFF: kills
+# take effect at once, and 200 lines that depend on the processor and the C library are not built; but a process in
+# which a thread was killed inside malloc or printf deadlocks.
+option(ZANBASE_KILL_SAFETY "Delay a kill while the thread may hold a lock of the C library" ON)
 if(ZANBASE_KILL_SAFETY)
     list(APPEND ZANBASE_PLATFORM_SOURCES thread_kill_safety.cpp)
     add_compile_definitions(ZANBASE_KILL_SAFETY)
