@@ -27,7 +27,8 @@ def common_spelling(text):
 def defined_names(headers):
     """The names of the classes and enumerations that the headers define."""
     text = "".join(path.read_text() for path in pathlib.Path(headers).rglob("*.h"))
-    return set(re.findall(r"^\s*(?:class|struct|enum)\s+(?:ZANBASE_API\s+)?(?:\w+::)*(\w+)[^;(]*?\{", text, re.M))
+    return set(re.findall(r"^\s*(?:enum\s+class|class|struct|enum)\s+(?:ZANBASE_API\s+)?(?:\w+::)*(\w+)[^;(]*?\{",
+                          text, re.M))
 
 
 class Interface:
