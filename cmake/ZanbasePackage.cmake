@@ -23,9 +23,10 @@ set(CPACK_COMPONENT_RUNTIME_DESCRIPTION "The shared library.")
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_NAME libzanbase-dev)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SECTION libdevel)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_DEPENDS "libzanbase0 (= ${PROJECT_VERSION})")
+set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SHLIBDEPS ON)  # what the recorder needs
 # For code that reads the tracker's tables, which needs the very version that the library was built with.
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SUGGESTS "libboost${Boost_VERSION_MAJOR}.${Boost_VERSION_MINOR}-dev")
-set(CPACK_COMPONENT_DEVELOPMENT_DESCRIPTION "Headers, CMake package, pkg-config file, and examples.")
+set(CPACK_COMPONENT_DEVELOPMENT_DESCRIPTION "Headers, CMake package, pkg-config file, recorder, and examples.")
 
 # The licence in the form that Debian wants: indented, with a point on each empty line.
 file(READ LICENSE license)
