@@ -1,5 +1,6 @@
 // Any sequence of operations of the tracker, the ledger and the timers, beside models of a few lines.
 #include <algorithm>
+#include <array>
 #include <cstdlib>
 #include <map>
 #include <string>
@@ -70,9 +71,8 @@ struct TrackerModel {
 };
 
 struct LedgerModel {
-    struct Record {
-        long long opens = 0, reads = 0, bytes = 0;
-    };
+    // Of opens, closes, seeks, reads and writes the number; of reads and writes the bytes.
+    using Record = std::array<long long, 7>;
     struct State {
         std::map<std::string, Record> records;
         std::map<void*, std::string> names;
@@ -84,16 +84,19 @@ struct LedgerModel {
         const HDiskIOSnapshot snapshot = HDiskIOSnapshot::Take();
         Require(snapshot.maRows.size() == state.records.size());
         for (const auto& row : snapshot.maRows) {
-            const Record& record = state.records.at(row.moName);
-            Require(row.moOpen.mnCount == record.opens && row.moRead.mnCount == record.reads);
-            Require(row.moRead.mnBytes == record.bytes);
+            const Record found{row.moOpen.mnCount, row.moClose.mnCount, row.moSeek.mnCount,
+                               row.moRead.mnCount, row.moWrite.mnCount, row.moRead.mnBytes,
+                               row.moWrite.mnBytes};
+            Require(found == state.records.at(row.moName));
+            Require(row.moSeek.mdSeconds == static_cast<double>(row.moSeek.mnCount));
         }
+        for (const auto& [handle, name] : state.names) Require(HDiskIOGetFilename(handle) == name);
     }
 
     void Open(const std::string& name, void* handle) {
         HDiskIOOpen(name, handle, 1);
         state.names[handle] = name;
-        ++state.records[name].opens;
+        ++state.records[name][0];
     }
 
     void Map(const std::string& name, void* handle) {
@@ -101,12 +104,16 @@ struct LedgerModel {
         state.names[handle] = name;
     }
 
-    void Read(void* handle, unsigned int bytes) {
-        HDiskIORead(handle, bytes, 1);
-        const auto record = state.records.find(state.names[handle]);
+    void Operate(void* handle, std::size_t operation, unsigned int bytes) {
+        if (operation == 1) HDiskIOClose(handle, 1);
+        if (operation == 2) HDiskIOSeek(handle, 1);
+        if (operation == 3) HDiskIORead(handle, bytes, 1);
+        if (operation == 4) HDiskIOWrite(handle, bytes, 1);
+        const auto bound = state.names.find(handle);
+        const auto record = state.records.find(bound == state.names.end() ? std::string() : bound->second);
         if (record == state.records.end()) return;
-        ++record->second.reads;
-        record->second.bytes += bytes;
+        ++record->second[operation];
+        if (operation >= 3) record->second[operation + 2] += bytes;
     }
 
     void Push() {
@@ -127,22 +134,33 @@ struct LedgerModel {
     }
 };
 
-unsigned long long timer_count = 0;  // of the process: timers stay
+// Of the process: timers stay. Which run, and what each has added up.
+std::vector<bool> timer_runs;
+std::vector<double> timer_seconds;
 
 void Time(int operand) {
     GlobalTimer& timers = GlobalTimer::GetInstance();
-    if (timer_count < 32) {
-        Require(timers.RegisterNewTimer(std::to_string(timer_count)) == timer_count);
-        ++timer_count;
+    if (timer_runs.size() < 32) {
+        Require(timers.RegisterNewTimer(std::to_string(timer_runs.size())) == timer_runs.size());
+        timer_runs.push_back(false);
+        timer_seconds.push_back(0);
     }
-    if (operand % 8 == 0) {
+    const std::size_t timer = static_cast<std::size_t>(operand) % timer_runs.size();
+    if (operand % 64 == 0) {
         timers.ResetAll();
-        for (const auto& row : GlobalTimerSnapshot::Take().maRows) Require(row.mdSeconds == 0);
+        timer_runs.assign(timer_runs.size(), false);
+        timer_seconds.assign(timer_seconds.size(), 0);
     }
-    timers.Toggle(static_cast<unsigned long long>(operand) % timer_count);
+    timers.Toggle(timer);
+    timer_runs[timer] = !timer_runs[timer];
     const GlobalTimerSnapshot snapshot = GlobalTimerSnapshot::Take();
-    Require(snapshot.maRows.size() == timer_count &&
-            snapshot.maRows.back().moName == std::to_string(timer_count - 1));
+    Require(snapshot.maRows.size() == timer_runs.size());
+    for (std::size_t id = 0; id < timer_runs.size(); ++id) {
+        const bool has_stopped = id == timer && !timer_runs[id];
+        Require(snapshot.maRows[id].moName == std::to_string(id));
+        if (has_stopped) timer_seconds[id] = std::max(timer_seconds[id], snapshot.maRows[id].mdSeconds);
+        Require(snapshot.maRows[id].mdSeconds == timer_seconds[id]);
+    }
 }
 
 }  // namespace
@@ -179,7 +197,7 @@ extern "C" int LLVMFuzzerTestOneInput(const unsigned char* data, std::size_t siz
                 ledger.Map(name, place);
                 break;
             case 8:
-                ledger.Read(place, static_cast<unsigned int>(operand));
+                ledger.Operate(place, static_cast<std::size_t>(1 + operand / 16 % 4), data[i + 1]);
                 break;
             case 9:
                 ledger.Push();
