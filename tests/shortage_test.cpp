@@ -6,12 +6,16 @@
 #include <atomic>
 #include <cstdlib>
 #include <functional>
+#include <iostream>
 #include <new>
 #include <sstream>
 #include <string>
 #include <thread>
+#include <vector>
 
 #include "support/runner.h"
+#include "zanbase/adapters/tracked_memory.h"
+#include "zanbase/budget.h"
 #include "zanbase/snapshot_text.h"
 #include "zanbase/zanbase.h"
 
@@ -117,7 +121,7 @@ void ToggleInTeam() {
 const std::string kName(100, 'n');  // longer than a string keeps in itself
 char blocks[64];
 
-// A read-write lock is not among them: after a shortage in `ReadLock` it can't be used, as its header says.
+// After a shortage in `ReadLock` a read-write lock can't be used, as its header says; so it ends with its row.
 const Operation kOperations[] = {
     {"Alloc",
      [] {
@@ -130,6 +134,10 @@ const Operation kOperations[] = {
     {"LeakReport", [] { HMemory::LeakReport(stderr); }},
     {"UsageReport", [] { HMemory::UsageReport(stderr); }},
     {"HMemorySnapshot::Take", [] { static_cast<void>(HMemorySnapshot::Take()); }},
+    {"HMemorySnapshot::Since", [] { static_cast<void>(HMemorySnapshot::Take().Since({})); }},
+    {"HMemoryBudget", [] { static_cast<void>(HMemoryBudget().LimitLiveBytes(-1).Check()); }},
+    {"HWriteCsv", [] { HWriteCsv(std::cout, HMemorySnapshot::Take()); }},
+    {"HTrackedAllocator", [] { std::vector<int, HTrackedAllocator<int>>(9, HCallSite::Here()); }},
     {"HDiskIOOpen", [] { HDiskIOOpen("a new " + kName, &blocks[1], 1); }},
     {"_HDiskIOMapFD", [] { _HDiskIOMapFD("another " + kName, &blocks[2]); }},
     {"HDiskIOPush", HDiskIOPush, 1, HDiskIOPop},
@@ -137,13 +145,23 @@ const Operation kOperations[] = {
     {"HDiskIOReportFile", [] { HDiskIOReportFile(stderr, kName); }},
     {"HDiskIOUsageReport", [] { HDiskIOUsageReport(stderr); }},
     {"HDiskIOSnapshot::Take", [] { static_cast<void>(HDiskIOSnapshot::Take()); }},
+    {"HDiskIOSnapshot::Since", [] { static_cast<void>(HDiskIOSnapshot::Take().Since({})); }},
+    {"HDiskIOBudget", [] { static_cast<void>(HDiskIOBudget().LimitOpens(-1).Check()); }},
+    {"HDiskIOSummaryReport", [] { HDiskIOSummaryReport(stderr); }},
     {"RegisterNewTimer", [] { GlobalTimer::GetInstance().RegisterNewTimer(kName); }, 9},
     {"Toggle", ToggleInTeam},
     {"GlobalTimerSnapshot::Take", [] { static_cast<void>(GlobalTimerSnapshot::Take()); }},
+    {"GlobalTimerSnapshot::Since", [] { static_cast<void>(GlobalTimerSnapshot::Take().Since({})); }},
+    {"Report", [] { GlobalTimer::GetInstance().Report(); }},
+    {"HWriteChromeTrace", [] { HWriteChromeTrace(std::cout, GlobalTimerSnapshot::Take()); }},
     {"HMutex", [] { const HMutex mutex; }},
     {"HCondVar", [] { const HCondVar condition; }},
     {"HSemaphore", [] { const HSemaphore semaphore(1); }},
-    {"HReadPrefMutex", [] { const HReadPrefMutex mutex; }},
+    {"HReadPrefMutex, ReadLock",
+     [] {
+         const HReadPrefMutex mutex;
+         const HReaderLock lock(&mutex);
+     }},
     {"Start", [] { Runner([] {}).RunToEnd(); }},
     {"OMPNested", [] { const OMPNested nested(true); }},
     {"MkString", [] { static_cast<void>(MkString("%s", kName.c_str())); }},

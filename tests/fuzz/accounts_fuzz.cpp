@@ -15,15 +15,41 @@ void Require(bool holds) {
     if (!holds) std::abort();
 }
 
-struct TrackerModel {
-    struct State {
-        std::map<void*, long long> blocks;
-        long long total = 0, peak = 0;
-    };
-    State state;
-    std::vector<State> saved;
-    bool exists = false;
+// Makes a push, a pop and a reset on the real account and on the state of the model.
+template <class State>
+struct Model {
+    void (*const push)();
+    void (*const pop)();
+    void (*const reset)();
+    State state = {};
+    std::vector<State> saved = {};
 
+    void Push() {
+        push();
+        saved.push_back(std::exchange(state, {}));
+    }
+    void Pop() {
+        pop();
+        if (saved.empty()) return;
+        state = saved.back();
+        saved.pop_back();
+    }
+    void Reset() {
+        reset();
+        state = {};
+    }
+    void Empty() {
+        while (!saved.empty()) Pop();
+        Reset();
+    }
+};
+
+struct TrackerState {
+    std::map<void*, long long> blocks;
+    long long total = 0, peak = 0;
+};
+
+struct TrackerModel : Model<TrackerState> {
     void Check() const {
         const HMemorySnapshot snapshot = HMemorySnapshot::Take();
         Require(snapshot.mnTotal == state.total && snapshot.mnPeak == state.peak);
@@ -38,7 +64,6 @@ struct TrackerModel {
 
     void Alloc(void* block, int size) {
         HMemory::Alloc(block, static_cast<std::size_t>(size), size % 2 == 0 ? "even" : "odd", size % 5);
-        exists = true;
         state.blocks.emplace(block, size);
         state.total += size;
         state.peak = std::max(state.peak, state.total);
@@ -51,35 +76,17 @@ struct TrackerModel {
         state.total -= found->second;
         state.blocks.erase(found);
     }
-
-    void Push() {
-        HMemory::Push();
-        if (exists) saved.push_back(std::exchange(state, {}));
-    }
-
-    void Pop() {
-        HMemory::Pop();
-        if (saved.empty()) return;
-        state = saved.back();
-        saved.pop_back();
-    }
-
-    void Reset() {
-        HMemory::Reset();
-        state = {};
-    }
 };
 
-struct LedgerModel {
-    // Of opens, closes, seeks, reads and writes the number; of reads and writes the bytes.
-    using Record = std::array<long long, 7>;
-    struct State {
-        std::map<std::string, Record> records;
-        std::map<void*, std::string> names;
-    };
-    State state;
-    std::vector<State> saved;
+// Of opens, closes, seeks, reads and writes the number; of reads and writes the bytes.
+using Record = std::array<long long, 7>;
 
+struct LedgerState {
+    std::map<std::string, Record> records;
+    std::map<void*, std::string> names;
+};
+
+struct LedgerModel : Model<LedgerState> {
     void Check() const {
         const HDiskIOSnapshot snapshot = HDiskIOSnapshot::Take();
         Require(snapshot.maRows.size() == state.records.size());
@@ -104,7 +111,7 @@ struct LedgerModel {
         state.names[handle] = name;
     }
 
-    void Operate(void* handle, std::size_t operation, unsigned int bytes) {
+    void Operate(void* handle, std::size_t operation, std::size_t bytes) {
         if (operation == 1) HDiskIOClose(handle, 1);
         if (operation == 2) HDiskIOSeek(handle, 1);
         if (operation == 3) HDiskIORead(handle, bytes, 1);
@@ -113,24 +120,7 @@ struct LedgerModel {
         const auto record = state.records.find(bound == state.names.end() ? std::string() : bound->second);
         if (record == state.records.end()) return;
         ++record->second[operation];
-        if (operation >= 3) record->second[operation + 2] += bytes;
-    }
-
-    void Push() {
-        HDiskIOPush();
-        saved.push_back(std::exchange(state, {}));
-    }
-
-    void Pop() {
-        HDiskIOPop();
-        if (saved.empty()) return;
-        state = saved.back();
-        saved.pop_back();
-    }
-
-    void Reset() {
-        HDiskIOReset();
-        state = {};
+        if (operation >= 3) record->second[operation + 2] += static_cast<long long>(bytes);
     }
 };
 
@@ -163,61 +153,43 @@ void Time(int operand) {
     }
 }
 
+TrackerModel tracker{{HMemory::Push, HMemory::Pop, HMemory::Reset}};
+LedgerModel ledger{{HDiskIOPush, HDiskIOPop, HDiskIOReset}};
+
+struct Operands {
+    void* place;
+    int number;  // one byte
+    std::string name;
+};
+
+void (*const kOperations[])(const Operands&) = {
+    [](const Operands& on) { tracker.Alloc(on.place, on.number / 16); },
+    [](const Operands& on) { tracker.Alloc(on.place, on.number / 16); },
+    [](const Operands& on) { tracker.Free(on.place); },
+    [](const Operands&) { tracker.Push(); },
+    [](const Operands&) { tracker.Pop(); },
+    [](const Operands& on) { on.number < 16 ? tracker.Reset() : HMemory::UsageReset(); },
+    [](const Operands& on) { ledger.Open(on.name, on.place); },
+    [](const Operands& on) { ledger.Map(on.name, on.place); },
+    [](const Operands& on) { ledger.Operate(on.place, 1 + on.name.size() % 4, on.name.size()); },
+    [](const Operands&) { ledger.Push(); },
+    [](const Operands& on) { on.number < 16 ? ledger.Reset() : ledger.Pop(); },
+    [](const Operands& on) { Time(on.number); },
+};
+
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const unsigned char* data, std::size_t size) {
     static char places[16];
-    static TrackerModel tracker;
-    static LedgerModel ledger;
+    tracker.Alloc(places, 0);  // before the first one a push saves nothing
     for (std::size_t i = 0; i + 1 < size; i += 2) {
-        const int operand = data[i + 1];
-        void* const place = &places[operand % 16];
-        const std::string name(static_cast<std::size_t>(operand / 16), 'n');
-        switch (data[i] % 13) {
-            case 0:
-            case 1:
-                tracker.Alloc(place, operand / 16);
-                break;
-            case 2:
-                tracker.Free(place);
-                break;
-            case 3:
-                tracker.Push();
-                break;
-            case 4:
-                tracker.Pop();
-                break;
-            case 5:
-                operand == 0 ? tracker.Reset() : HMemory::UsageReset();
-                break;
-            case 6:
-                ledger.Open(name, place);
-                break;
-            case 7:
-                ledger.Map(name, place);
-                break;
-            case 8:
-                ledger.Operate(place, static_cast<std::size_t>(1 + operand / 16 % 4), data[i + 1]);
-                break;
-            case 9:
-                ledger.Push();
-                break;
-            case 10:
-                ledger.Pop();
-                break;
-            case 11:
-                if (operand == 0) ledger.Reset();
-                break;
-            case 12:
-                Time(operand);
-                break;
-        }
+        const int number = data[i + 1];
+        const std::string name(static_cast<std::size_t>(number / 16), 'n');
+        kOperations[data[i] % std::size(kOperations)]({&places[number % 16], number, name});
         tracker.Check();
         ledger.Check();
     }
-    while (!tracker.saved.empty()) tracker.Pop();
-    while (!ledger.saved.empty()) ledger.Pop();
-    tracker.Reset();
-    ledger.Reset();
+    tracker.Empty();
+    ledger.Empty();
     return 0;
 }

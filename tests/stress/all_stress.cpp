@@ -74,6 +74,22 @@ void UseThreads(Random& random) {
     Require(!waiting.IsRunning(), "idle after a kill");
 }
 
+// One thread has the worker, so that it knows how many passes are left to make.
+void UseWorker(Random&) {
+    Counter worker;
+    worker.Start(true);
+    int due = 2;
+    for (int signal = 0; signal < 100; ++signal) due += worker.Signal() ? 1 : 0;
+    while (worker.passes < due || worker.IsProcessing()) std::this_thread::yield();
+    Require(worker.passes == due, "a pass for each signal accepted");
+}
+
+void UseAllocators(Random& random) {
+    char* const text = static_cast<char*>(HRealloc(HString("text"), 5 + random() % 1000));
+    Require(std::strcmp(text, "text") == 0, "a block keeps its text");
+    std::free(text);
+}
+
 void UseTracker(Random& random) {
     static thread_local char blocks[32];
     for (char& block : blocks)
@@ -126,7 +142,10 @@ void ReadAccounts(Random&) {
 // Timers belong to thread numbers, so one thread has the team.
 void UseTimers(Random&) {
     static const unsigned long long timer = GlobalTimer::GetInstance().RegisterNewTimer("team");
-#pragma omp parallel num_threads(3)
+    const OMPThreadCount three(3);
+    const OMPDynamic fixed(false);
+    Require(IMPRandom() < 1, "a number in its range");
+#pragma omp parallel
     for (int round = 0; round < 20; ++round) GlobalTimer::GetInstance().Toggle(timer);
 }
 
@@ -136,8 +155,9 @@ int main(int count, char** arguments) {
     const double seconds = count > 1 ? std::atof(arguments[1]) : 1;
     const HTimer timer;
     std::vector<std::thread> threads;
-    void (*const bodies[])(Random&) = {UseLocks,   UseLocks,  UseLocks, UseThreads, UseTracker,
-                                       UseTracker, UseLedger, UseText,  UseSort,    ReadAccounts};
+    void (*const bodies[])(Random&) = {UseLocks,  UseLocks,      UseLocks,   UseThreads,
+                                       UseWorker, UseAllocators, UseTracker, UseTracker,
+                                       UseLedger, UseText,       UseSort,    ReadAccounts};
     for (const auto body : bodies) {
         threads.emplace_back([&, body] {
             for (Random random(std::random_device{}()); timer.GetTimeInSeconds() < seconds;) body(random);

@@ -13,7 +13,6 @@
 #include <vector>
 
 #include "support/runner.h"
-#include "zanbase/hibernate_thread.h"
 
 // A killed thread frees nothing and joins no thread.
 extern "C" const char* __asan_default_options() { return "detect_leaks=0"; }
@@ -81,13 +80,9 @@ void KillInEveryOperation() {
     }
 }
 
-struct Counter : HHibernateThread {
-    std::atomic<int> passes{0}, due{2};
-    void Process() override { ++passes; }
-};
-
 void OperateFromSeveralThreads() {
     Counter counter;
+    std::atomic<int> due{2};
     counter.Start(true);
     std::mutex mutex;  // keeps a start and a kill apart
     std::vector<std::thread> operators;
@@ -95,7 +90,7 @@ void OperateFromSeveralThreads() {
         operators.emplace_back([&, seed] {
             std::minstd_rand random(seed);
             for (int round = 0; round < 50 * rounds; ++round) {
-                counter.due += counter.Signal() ? 1 : 0;
+                due += counter.Signal() ? 1 : 0;
                 if (random() % 4 == 0) allocating.Wait();
                 const std::lock_guard<std::mutex> lock(mutex);
                 const bool kills = random() % 3 == 0;
@@ -108,8 +103,8 @@ void OperateFromSeveralThreads() {
     for (std::thread& each : operators) each.join();
     allocating.Wait();
     Require(!allocating.IsRunning(), "idle after a wait");
-    while (counter.passes < counter.due || counter.IsProcessing()) std::this_thread::yield();
-    Require(counter.passes == counter.due, "a pass for each signal accepted");
+    while (counter.passes < due || counter.IsProcessing()) std::this_thread::yield();
+    Require(counter.passes == due, "a pass for each signal accepted");
 }
 
 // The sanitizers, and emulators of a processor, keep memory for each thread that has ended.

@@ -1,11 +1,12 @@
-// A thread object whose Run calls any function.
+// Thread objects: one whose Run calls any function, and one that counts its passes.
 #ifndef ZANBASE_TESTS_RUNNER_H
 #define ZANBASE_TESTS_RUNNER_H
 
+#include <atomic>
 #include <functional>
 #include <utility>
 
-#include "zanbase/thread.h"
+#include "zanbase/hibernate_thread.h"
 
 class Runner : public HThread {
 public:
@@ -22,6 +23,12 @@ private:
     void Run() override { moRun(); }
 
     std::function<void()> moRun;
+};
+
+// Counts its passes.
+struct Counter : HHibernateThread {
+    std::atomic<int> passes{0};
+    void Process() override { ++passes; }
 };
 
 #endif
