@@ -3,9 +3,9 @@
 //
 // A wake-up reaches one sleeping thread. If that thread is killed before it acts on the wake-up, or the
 // waking thread is killed before it sends it, the wake-up is lost and other sleepers may sleep for ever. So a
-// thread notes the word that it sleeps on or wakes others on in toPendingWakeups, and the code that kills a
-// thread calls ForwardPendingWakeups() on it as its last act. A superfluous wake-up is harmless: every
-// sleeper checks the word again.
+// thread notes in toPendingWakeups the word that it sleeps on or wakes others on, and a killed thread calls
+// ForwardPendingWakeups() before it exits. A superfluous wake-up is harmless: every sleeper checks the word
+// again.
 #ifndef ZANBASE_PLATFORM_LINUX_FUTEX_H
 #define ZANBASE_PLATFORM_LINUX_FUTEX_H
 
