@@ -6,6 +6,7 @@
 
 #include "locks/milliseconds.h"
 #include "platform/condition.h"
+#include "platform/race_detector.h"
 
 HCondVar::HCondVar() : mpoCondition(static_cast<HNativeCondition*>(std::malloc(sizeof(HNativeCondition)))) {
     if (mpoCondition == nullptr) throw std::bad_alloc();
@@ -19,10 +20,12 @@ void HCondVar::Signal() const { SignalCondition(mpoCondition); }
 void HCondVar::Broadcast() const { BroadcastCondition(mpoCondition); }
 
 void HCondVar::Wait(const HMutex& mutex) const {
+    const CallerFrame caller(__builtin_return_address(0));
     // Without a timeout the result is always true.
     static_cast<void>(WaitOnCondition(mpoCondition, mutex.mpoCriticalSection, kForever));
 }
 
 bool HCondVar::TryWait(const HMutex& mutex, double seconds) const {
+    const CallerFrame caller(__builtin_return_address(0));
     return WaitOnCondition(mpoCondition, mutex.mpoCriticalSection, MillisecondsIn(seconds));
 }

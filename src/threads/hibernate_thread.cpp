@@ -1,6 +1,7 @@
 // HHibernateThread: a flag decides whether a signal is accepted, and a semaphore counts the accepted ones.
 #include "zanbase/hibernate_thread.h"
 
+#include "platform/race_detector.h"
 #include "threads/reported_body.h"
 #include "zanbase/sleep.h"
 
@@ -23,7 +24,11 @@ bool HHibernateThread::Signal() const {
     return accepted;
 }
 
-bool HHibernateThread::IsProcessing() const { return !mbHibernating; }
+bool HHibernateThread::IsProcessing() const {
+    const bool is_hibernating = mbHibernating;
+    if (is_hibernating) NoteAcquire(&mbHibernating);
+    return !is_hibernating;
+}
 
 void HHibernateThread::Run() {
     const auto pass = [](void* thread) { static_cast<HHibernateThread*>(thread)->Process(); };
@@ -31,6 +36,7 @@ void HHibernateThread::Run() {
         RunReported("HHibernateThread::Run()", pass, this);
         {
             const HMutexLock lock(&moStateMutex);
+            NoteRelease(&mbHibernating);
             mbHibernating = true;
         }
         // A signal between the two leaves its unit in the semaphore, so it is not lost.

@@ -3,6 +3,7 @@
 
 #include <cstdio>
 
+#include "platform/race_detector.h"
 #include "platform/thread.h"
 #include "threads/reported_body.h"
 
@@ -27,6 +28,7 @@ HThread& HThread::operator=(const HThread&) { return *this; }
 
 bool HThread::Start(bool) {
     if (IsRunning()) return false;
+    const CallerFrame caller(__builtin_return_address(0));
     const auto body = [](void* thread) { _Run_(static_cast<HThread*>(thread)); };
     if (const int error = StartThread(mpoThread, body, this)) {
         std::printf("HThread::Start(%p) Error: %s\n", static_cast<void*>(this),
@@ -40,7 +42,11 @@ bool HThread::Start(bool) {
 
 void HThread::Stop() {}
 
-bool HThread::IsRunning() const { return mpoThread.load(std::memory_order_acquire) != nullptr; }
+bool HThread::IsRunning() const {
+    const bool is_running = mpoThread.load(std::memory_order_acquire) != nullptr;
+    if (!is_running) NoteAcquire(&mpoThread);
+    return is_running;
+}
 
 void HThread::Wait() { JoinThread(mpoThread); }
 

@@ -5,6 +5,7 @@
 #include <atomic>
 
 #include "platform/clock.h"
+#include "platform/race_detector.h"
 
 namespace {
 
@@ -25,7 +26,13 @@ std::atomic<void (*)(int)> mpfnUSleepHook{SleepByTicks};
 }  // namespace
 
 void USleep(int microseconds) {
-    if (microseconds > 0) mpfnUSleepHook.load(std::memory_order_acquire)(microseconds);
+    if (microseconds <= 0) return;
+    const auto hook = mpfnUSleepHook.load(std::memory_order_acquire);
+    NoteAcquire(&mpfnUSleepHook);
+    hook(microseconds);
 }
 
-void InstallUSleepHook(void (*hook)(int)) { mpfnUSleepHook.store(hook, std::memory_order_release); }
+void InstallUSleepHook(void (*hook)(int)) {
+    NoteRelease(&mpfnUSleepHook);
+    mpfnUSleepHook.store(hook, std::memory_order_release);
+}

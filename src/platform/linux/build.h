@@ -2,17 +2,9 @@
 #ifndef ZANBASE_PLATFORM_LINUX_BUILD_H
 #define ZANBASE_PLATFORM_LINUX_BUILD_H
 
-#if defined(__SANITIZE_THREAD__)
-#define ZANBASE_THREAD_SANITIZER 1
-#elif defined(__has_feature)
-#if __has_feature(thread_sanitizer)
-#define ZANBASE_THREAD_SANITIZER 1
-#endif
-#endif
-
 // True if the process runs under the thread sanitizer, also if only the program was built with it.
 extern "C" __attribute__((weak)) void __tsan_init();
-inline bool IsThreadSanitizerOn() noexcept { return __tsan_init != nullptr; }
+inline bool IsThreadSanitizerOn() noexcept { return __builtin_expect(__tsan_init != nullptr, 0); }
 
 // A thread-local variable at a fixed offset from the thread pointer: reading it calls nothing, so signal
 // handlers may use it. Such variables come from a small reserve of the loader; keep them few.

@@ -4,7 +4,8 @@
 #include <new>
 
 #include "platform/linux/futex_condition.h"
-#include "platform/linux/system_lock.h"
+#include "platform/linux/futex_system.h"
+#include "platform/lock.h"
 
 namespace {
 
@@ -17,9 +18,9 @@ Condition& In(HNativeCondition* condition) noexcept {
 
 // One level of a lock that the calling thread holds.
 struct OneLevel {
-    SystemLock& mrLock;
-    void Release() const noexcept { mrLock.Release(); }
-    void Acquire() const noexcept { mrLock.Acquire(LockThread()); }
+    HNativeLock* mpoLock;
+    void Release() const noexcept { ReleaseLock(mpoLock); }
+    void Acquire() const noexcept { AcquireLock(mpoLock); }
 };
 
 }  // namespace
@@ -27,7 +28,7 @@ struct OneLevel {
 void InitCondition(HNativeCondition* condition) noexcept { new (condition->storage) Condition; }
 
 bool WaitOnCondition(HNativeCondition* condition, HNativeLock* lock, unsigned int limit_ms) noexcept {
-    const OneLevel level{In(lock)};
+    const OneLevel level{lock};
     if (limit_ms == kForever) return In(condition).Wait(level, nullptr);
     if (limit_ms == 0) {
         level.Release();

@@ -15,7 +15,6 @@ int Wait(FutexWord& word, unsigned int expected, const timespec* deadline) noexc
     return result == 0 ? 0 : errno;
 }
 
-#ifdef ZANBASE_THREAD_SANITIZER
 // The thread sanitizer delivers no signal to a thread inside a system call that it does not intercept, and
 // threads are killed by a signal. So a long wait is cut into slices, with an intercepted call between them.
 int WaitInSlices(FutexWord& word, unsigned int expected, const timespec* deadline) noexcept {
@@ -28,16 +27,14 @@ int WaitInSlices(FutexWord& word, unsigned int expected, const timespec* deadlin
         usleep(1);
     }
 }
-#else
-constexpr auto WaitInSlices = Wait;
-#endif
 
 }  // namespace
 
 bool SleepWhile(FutexWord& word, unsigned int expected, const timespec* deadline) noexcept {
     const int callers_errno = errno;  // callers do not expect a lock to change it
     int error = EINTR;
-    while (error == EINTR) error = WaitInSlices(word, expected, deadline);
+    const auto wait = IsThreadSanitizerOn() ? WaitInSlices : Wait;
+    while (error == EINTR) error = wait(word, expected, deadline);
     errno = callers_errno;
     return error != ETIMEDOUT;
 }

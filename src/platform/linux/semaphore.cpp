@@ -5,6 +5,7 @@
 
 #include "platform/linux/futex_semaphore.h"
 #include "platform/linux/futex_system.h"
+#include "platform/race_detector.h"
 
 struct HNativeSemaphore : FutexSemaphore<FutexSystem> {
     using FutexSemaphore::FutexSemaphore;
@@ -17,7 +18,9 @@ HNativeSemaphore* NewSemaphore(unsigned int count) {
 
 void DeleteSemaphore(HNativeSemaphore* semaphore) noexcept { delete semaphore; }
 
-bool AcquireUnit(HNativeSemaphore* semaphore, unsigned int limit_ms) noexcept {
+namespace {
+
+bool Acquire(HNativeSemaphore* semaphore, unsigned int limit_ms) noexcept {
     if (limit_ms == 0) return semaphore->TryAcquire();
     if (limit_ms == kForever) return semaphore->Acquire(nullptr);
     if (semaphore->TryAcquire()) return true;
@@ -25,4 +28,27 @@ bool AcquireUnit(HNativeSemaphore* semaphore, unsigned int limit_ms) noexcept {
     return semaphore->Acquire(&deadline);
 }
 
-void ReleaseUnit(HNativeSemaphore* semaphore) noexcept { semaphore->Release(); }
+// A race detector is shown no lock, because a unit has no owner.
+[[gnu::cold, gnu::noinline]] bool AcquireWatched(HNativeSemaphore* semaphore,
+                                                 unsigned int limit_ms) noexcept {
+    const bool acquired = Acquire(semaphore, limit_ms);
+    if (acquired) NoteAcquire(semaphore);
+    return acquired;
+}
+
+// The note comes first: the thread that acquires the unit may destroy the semaphore.
+[[gnu::cold, gnu::noinline]] void ReleaseWatched(HNativeSemaphore* semaphore) noexcept {
+    NoteRelease(semaphore);
+    semaphore->Release();
+}
+
+}  // namespace
+
+bool AcquireUnit(HNativeSemaphore* semaphore, unsigned int limit_ms) noexcept {
+    return IsThreadSanitizerOn() ? AcquireWatched(semaphore, limit_ms) : Acquire(semaphore, limit_ms);
+}
+
+void ReleaseUnit(HNativeSemaphore* semaphore) noexcept {
+    if (IsThreadSanitizerOn()) return ReleaseWatched(semaphore);
+    semaphore->Release();
+}

@@ -9,6 +9,7 @@ set(ZANBASE_PLATFORM_SOURCES
     lock.cpp
     messages.cpp
     processors.cpp
+    race_detector.cpp
     semaphore.cpp
     standard_stream.cpp
     stream.cpp

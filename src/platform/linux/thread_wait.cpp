@@ -4,6 +4,7 @@
 #include "platform/linux/cancellation.h"
 #include "platform/linux/thread_kill.h"
 #include "platform/linux/thread_self.h"
+#include "platform/race_detector.h"
 
 namespace {
 
@@ -36,6 +37,7 @@ bool RemoveWaiterIfEnded(HNativeThread* block, unsigned int& seen) noexcept {
         if (block->mState != ThreadState::Ended) return false;
         RemoveWaiter(block);
     }
+    NoteAcquire(block);
     if (is_reaper) WakeWaiters(block);
     return true;
 }
@@ -45,6 +47,7 @@ bool RemoveWaiterIfEnded(HNativeThread* block, unsigned int& seen) noexcept {
 HNativeThread* AddWaiter(ThreadSlot& slot) noexcept {
     const BlockLock lock;
     HNativeThread* const block = slot.load(std::memory_order_relaxed);
+    if (block == nullptr) NoteAcquire(&slot);
     if (block == nullptr || block == toSelf.mpoBlock) return block;
     ++block->mnWaiters;
     toSelf.mpoAwaited = block;
