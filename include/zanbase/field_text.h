@@ -24,7 +24,7 @@
 /// @addtogroup text
 /// @{
 
-/// Writes the general text of `value` to `buffer` and returns it. A null `buffer` stands for a static area.
+/// Writes the general text of `value` to `buffer` and returns it. A null `buffer` means a static area.
 /// Thread-safe with a buffer; with null, one call at a time. Requires: `buffer` is null or has 25 bytes.
 ///
 /// If `value` lies strictly between -2^31 and 2^31 - 1 and is whole, or exceeds a whole number by less than

@@ -61,7 +61,7 @@ public:
         std::swap(moState, taken.moState);
         return *this;
     }
-    /// Closes the file if it is open. An error goes unreported: call `Close` where data must be safe.
+    /// Closes the file if it is open. An error is not reported: call `Close` where data must be safe.
     ~HRecorded() {
         std::error_code ignored;
         if (IsOpen()) Close(ignored);

@@ -27,7 +27,7 @@
 /// `GlobalTimer::Toggle`.
 class HTimerScope {
 public:
-    /// Starts timer `id`, which comes from `GlobalTimer::RegisterNewTimer` and is stopped on this thread.
+    /// Starts timer `id` of `GlobalTimer::RegisterNewTimer`. Requires: it is stopped on this thread.
     explicit HTimerScope(unsigned long long id) : moTimers(GlobalTimer::GetInstance()), mnId(id) {
         moTimers.Toggle(mnId);
     }

@@ -9,8 +9,8 @@
 //
 // Waits a bounded time and raises no SIGPIPE. Output that the old file does not accept within a second is
 // lost. If another thread holds the stream's lock for a tenth of a second (it reads standard input, or writes
-// to a full pipe), only the descriptor moves: the stream stays buffered, and its pending output goes to
-// `target`. To be called by one thread at a time.
+// to a full pipe), only the descriptor moves: the stream stays buffered, and its pending output is written
+// to `target`. Not thread-safe: one thread at a time calls this.
 void RedirectStream(std::FILE* stream, int target) noexcept;
 
 #endif

@@ -21,7 +21,7 @@ namespace {
 // What each priority level adds to the nice value of the process.
 constexpr int kNiceOffsets[] = {39, 10, 5, 0, -5, -10, -39};
 
-// The system lets every process raise a nice value, and only privileged ones lower it.
+// Every process may raise a nice value; only privileged ones may lower it.
 void ApplyPriority(const HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
     const int own = getpriority(PRIO_PROCESS, static_cast<id_t>(getpid()));  // that of the first thread
     const int nice = std::clamp(own + kNiceOffsets[block->mnPriority], -20, 19);
