@@ -18,7 +18,8 @@ def times(folder, side):
     for path in glob.glob(f"{folder}/{side}.*.json"):
         with open(path) as file:
             for run in json.load(file)["benchmarks"]:
-                found.setdefault(run["run_name"], []).append(run["real_time"])
+                if run["real_time"] > 0:  # 0: skipped
+                    found.setdefault(run["run_name"], []).append(run["real_time"])
     return found
 
 

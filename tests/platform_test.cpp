@@ -1,14 +1,11 @@
 // The platform contracts by themselves, in the words of their headers: every back end runs this file.
 #include <gtest/gtest.h>
 
-#include <atomic>
 #include <chrono>
-#include <thread>
 
 #include "platform/clock.h"
 #include "platform/guard.h"
 #include "platform/semaphore.h"
-#include "platform/thread.h"
 #include "support/faults.h"
 
 TEST(PlatformClock, ReadsTheWallTimeInMilliseconds) {
@@ -21,39 +18,11 @@ TEST(PlatformClock, ReadsTheWallTimeInMilliseconds) {
     EXPECT_LE(read, system_clock::now().time_since_epoch());
 }
 
-TEST(PlatformClock, SleepsNoLessThanAsked) {
-    const unsigned int start = ReadTicks();
-    for (const unsigned int ms : {0U, 1U, 29U}) SleepFor(ms);
-    EXPECT_GE(ReadTicks() - start, 30U);
-}
-
 TEST(PlatformSemaphore, KeepsItsMostUnits) {
     HNativeSemaphore* const semaphore = NewSemaphore(kMaxUnits);
     ReleaseUnit(semaphore);
     EXPECT_TRUE(AcquireUnit(semaphore, 0));
     DeleteSemaphore(semaphore);
-}
-
-TEST(PlatformThread, HasItsSlotFromBeforeItsBodyToItsEnd) {
-    static ThreadSlot slot{nullptr};
-    static std::atomic<int> steps{0};
-    const auto body = [](void*) {
-        EXPECT_NE(slot.load(), nullptr);
-        ++steps;
-    };
-    const auto endless = [](void*) {
-        for (;; ++steps) YieldThread();
-    };
-    for (int round = 1; round <= 100; ++round) {
-        steps = 0;
-        ASSERT_EQ(StartThread(slot, body, nullptr), 0);
-        JoinThread(slot);
-        EXPECT_EQ(steps, 1);
-        StartThread(slot, endless, nullptr);
-        while (steps < round % 3) YieldThread();
-        KillThread(slot);
-        EXPECT_EQ(slot.load(), nullptr);
-    }
 }
 
 TEST(PlatformGuard, TellsFaultsFromOtherWaysOut) {

@@ -15,12 +15,6 @@ TEST(Terminal, IsKnownByTheBeginningOfItsName) {
     EXPECT_EQ(IMPTerminal(""), 0);
 }
 
-TEST(Revision, IsOneTextWithoutDots) {
-    const char* const revision = IMPGetMajorRev();
-    EXPECT_STREQ(revision, "20160");
-    EXPECT_EQ(IMPGetMajorRev(), revision);
-}
-
 TEST(ScreenSize, IsThatOfTheFirstCall) {
     double sizes[] = {-1, -1, -1, -1};
     EXPECT_EQ(GetScreenSize(&sizes[0], &sizes[1], &sizes[2], &sizes[3]), 0);

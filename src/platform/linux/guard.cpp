@@ -32,7 +32,7 @@ struct FaultSignal {
 };
 
 FaultSignal gaFaults[] = {{SIGSEGV, {}}, {SIGBUS, {}}, {SIGFPE, {}}, {SIGILL, {}}};
-std::atomic<bool> gbInstalled{false};  // written under the block mutex
+std::atomic<bool> gbInstalled{false};  // written under the block mutex; its release publishes gaFaults
 
 const Action& PreviousOf(int signal) noexcept {
     const FaultSignal* fault = gaFaults;

@@ -46,6 +46,7 @@ HNativeThread* NewBlock() noexcept ZANBASE_REQUIRES(goBlockMutex) {
     return block;
 }
 
+// Release: a thread that finds the slot empty sees what the ended thread wrote.
 void EmptySlot(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
     if (block->mpoSlot == nullptr) return;
     NoteRelease(block->mpoSlot);

@@ -70,7 +70,9 @@ struct HNativeThread {
     int mnPriority ZANBASE_GUARDED_BY(goBlockMutex);          // the level wanted
     bool mbPriorityPending ZANBASE_GUARDED_BY(goBlockMutex);  // the first step has to apply it
 
-    // Counts the events after which waiters must look at the block again. They sleep on it.
+    // Counts the events after which waiters must look at the block again. They sleep on it. Its accesses are
+    // relaxed, because a waiter reads the rest of the block under the block mutex. What the thread itself has
+    // written passes to the waiter by that mutex, or by pthread_join.
     FutexWord mnGeneration;
 
     // Written under the block mutex before the kill signal is sent, read by its handler.

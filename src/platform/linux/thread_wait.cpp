@@ -73,7 +73,7 @@ void WaitForNewGeneration(HNativeThread* block, unsigned int seen) noexcept {
 void WakeWaiters(HNativeThread* block) noexcept { WakeSleepers(block->mnGeneration, kEverySleeper); }
 
 void NotifyWaiters(HNativeThread* block) noexcept {
-    block->mnGeneration.fetch_add(1, std::memory_order_release);
+    block->mnGeneration.fetch_add(1, std::memory_order_relaxed);
     WakeWaiters(block);
 }
 
