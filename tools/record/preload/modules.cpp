@@ -7,6 +7,7 @@
 #include <cstring>
 
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
@@ -57,8 +58,16 @@ bool IsRuntime(const std::string& name) {
     return false;
 }
 
+// In nanoseconds; 0 if there is no such file.
+std::int64_t ChangeTime(const std::string& path) {
+    struct stat status {};
+    if (stat(path.c_str(), &status) != 0) return 0;
+    return status.st_ctim.tv_sec * 1000000000 + status.st_ctim.tv_nsec;
+}
+
 void Open(Module& module) {
     module.opened = true;
+    module.changed = ChangeTime(module.path);
     module.bias = module.start - module.offset;
     module.file = std::make_unique<ElfFile>(module.path.c_str());
     if (!module.file->ok()) return;
@@ -92,9 +101,10 @@ void ReadMapping(const char* line, const char* line_end, ModuleList& found) {
     found.push_back(std::move(module));
 }
 
-bool IsSame(const Module& one, const Module& other) {
-    return one.start == other.start && one.end == other.end && one.offset == other.offset &&
-           one.identity == other.identity;
+bool IsSame(const Module& known, const Module& found) {
+    return known.start == found.start && known.end == found.end && known.offset == found.offset &&
+           known.identity == found.identity &&
+           (known.loaded || !known.opened || known.changed == ChangeTime(known.path));
 }
 
 Module* Find(std::uintptr_t pc) {

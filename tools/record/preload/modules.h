@@ -21,9 +21,10 @@ struct Module {
     std::uint64_t offset;  // in the file, of the byte at `start`
     std::string identity;  // device, inode and path as the kernel lists them
     std::string path;
-    std::string name;      // the path's last part
-    bool runtime = false;  // part of the C or C++ runtime: a site is looked for in its callers
-    bool loaded = true;    // false once it was unmapped
+    std::int64_t changed = 0;  // when the file last changed, as of `opened`
+    std::string name;          // the path's last part
+    bool runtime = false;      // part of the C or C++ runtime: a site is looked for in its callers
+    bool loaded = true;        // false once it was unmapped
 
     // What follows is read at the first use.
     bool opened = false;
@@ -40,7 +41,7 @@ struct Module {
 Module* FindModule(std::uintptr_t pc);
 
 // Reads the list of mappings again; returns the modules that have gone since. One that comes back to its old
-// place is the same again.
+// place is the same again, unless its file was written anew.
 std::vector<const Module*> RefreshModules();
 
 // Adds the name of a function whose calls are credited to its caller.
