@@ -111,8 +111,11 @@ hostile) # what can't be recorded is said; programs that make it hard end as the
     says "small\.c\",[0-9]*,$(cat out),$(cat out)000," report
     expect 0 "$record" bash -c 'for number in {900..1023}; do eval "exec $number>occupied"; done'
     says 'Memory Leak Report'
-    expect 0 timeout 60 "$record" --csv --output report ./small tick
-    says "/log\",1,.*,$(wc -c <log),[^,]*,$(wc -c <log)\$" report
+    for threads in 0 1; do
+        expect 0 timeout 60 "$record" --csv --output report ./small tick "$threads"
+        says "/log\",1,.*,$(wc -c <log),[^,]*,$(wc -c <log)\$" report
+    done
+    expect 14 timeout 60 "$record" --output report ./small alarm
     expect 0 "$record" --output report ./small leak 1 $(seq 100000)
     says 'Memory Leak Report' report
     expect 0 "$record" --output report bash -c "exec 0<&- 1>&- 2>&-; exec 3<&-; ulimit -n 16; :"

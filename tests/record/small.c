@@ -60,15 +60,23 @@ static void Mark(int signal) {
     if (write(fileno(gLog), "", 1) != 1) abort();
 }
 
-// Writes in a signal handler too, in a process that has threads.
-static void Tick(void) {
+// Writes in a signal handler too.
+static void Tick(int threads) {
     const struct itimerval often = {{0, 100}, {0, 100}};
-    Threads(1);
+    Threads(threads);
     gLog = fopen("log", "w");
     signal(SIGALRM, Mark);
     setitimer(ITIMER_REAL, &often, NULL);
     while (gTicks < 2000) Mark(0);
     signal(SIGALRM, SIG_IGN);
+}
+
+// Ends in a signal handler that interrupts an allocator.
+static void Alarm(void) {
+    Threads(1);
+    signal(SIGALRM, _exit);
+    ualarm(1000, 0);
+    for (;;) free(gSink = malloc(2000));
 }
 
 static void Exhaust(size_t size) {
@@ -107,7 +115,8 @@ int main(int count, char** words) {
     if (strcmp(what, "status") == 0) return gSink = malloc(1), number;
     if (strcmp(what, "threads") == 0) Threads(number);
     if (strcmp(what, "children") == 0) Children(words[0]);
-    if (strcmp(what, "tick") == 0) Tick();
+    if (strcmp(what, "tick") == 0) Tick(number);
+    if (strcmp(what, "alarm") == 0) Alarm();
     if (strcmp(what, "exhaust") == 0) Exhaust((size_t)number);
     if (strcmp(what, "signal") == 0) Signal();
     if (strcmp(what, "fault") == 0) raise(SIGSEGV);

@@ -13,6 +13,7 @@
 #include <unistd.h>
 
 #include "pool.h"
+#include "recording.h"
 #include "spin_lock.h"
 #include "thread_state.h"
 
@@ -30,8 +31,6 @@ std::array<std::atomic<Mark*>, kMarkPages> gMarks;
 SpinLock gLock;  // guards the chains; records never leave them
 std::array<FileRecord*, kChains> gChains;
 
-std::atomic<int> gProcess{0};  // 0 until the library's constructor has run
-
 // Null if the number is out of range or memory ran out.
 Mark* MarkOf(int descriptor) {
     const auto number = static_cast<std::size_t>(descriptor);
@@ -39,6 +38,7 @@ Mark* MarkOf(int descriptor) {
     std::atomic<Mark*>& page = gMarks[number / kMarksOfPage];
     Mark* marks = page.load(std::memory_order_acquire);
     if (marks == nullptr) {
+        const InsideScope scope;
         auto* const fresh = static_cast<Mark*>(TakeFromPool(kMarksOfPage * sizeof(Mark)));
         if (fresh == nullptr) return nullptr;
         if (page.compare_exchange_strong(marks, fresh, std::memory_order_acq_rel)) marks = fresh;
@@ -121,9 +121,9 @@ FileRecord* FileOf(int descriptor) {
 void CountOperation(FileRecord& file, DiskOperation operation, std::uint64_t bytes,
                     std::uint64_t nanoseconds) {
     OperationCounters& counters = file.counters[static_cast<std::size_t>(operation)];
-    AddTo(counters.count, std::uint64_t{1});
-    AddTo(counters.nanoseconds, nanoseconds);
-    if (bytes != 0) AddTo(counters.bytes, bytes);
+    counters.count.fetch_add(1, std::memory_order_relaxed);
+    counters.nanoseconds.fetch_add(nanoseconds, std::memory_order_relaxed);
+    if (bytes != 0) counters.bytes.fetch_add(bytes, std::memory_order_relaxed);
 }
 
 void CountOpen(int descriptor, const char* path, std::uint64_t nanoseconds) {
@@ -148,16 +148,10 @@ void CopyDescriptor(int descriptor, int copy) {
     mark->store(file != nullptr ? file : &gNoFile, std::memory_order_release);
 }
 
-bool IsVforkChild() {
-    const int process = gProcess.load(std::memory_order_relaxed);
-    return process != 0 && syscall(SYS_getpid) != process;
-}
-
 // The first numbers cover what programs are started with in practice; a look costs less than reading the
 // folder.
 void MarkInheritedDescriptors() {
     constexpr int kLooked = 10;
-    gProcess.store(static_cast<int>(syscall(SYS_getpid)), std::memory_order_relaxed);
     for (int descriptor = 0; descriptor < kLooked; ++descriptor) {
         Mark* const mark = MarkOf(descriptor);
         struct stat status {};
@@ -188,7 +182,6 @@ std::vector<NamedSums> ListFiles() {
 }
 
 void ResetFilesInChild() {
-    gProcess.store(static_cast<int>(syscall(SYS_getpid)), std::memory_order_relaxed);
     gLock.Release();
     for (FileRecord* const chain : gChains) {
         for (FileRecord* file = chain; file != nullptr; file = file->next) {

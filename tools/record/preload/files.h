@@ -24,7 +24,8 @@ struct OperationSum {
 };
 using FileSums = std::array<OperationSum, kDiskOperations>;
 
-// Has no lock, as programs may read and write in a signal handler.
+// Each addition is atomic, also in a process with one thread: programs may read and write in a signal
+// handler.
 struct OperationCounters {
     std::atomic<std::uint64_t> count;
     std::atomic<std::uint64_t> nanoseconds;
@@ -58,10 +59,6 @@ FileRecord* ForgetDescriptor(int descriptor);
 
 // `copy` now stands for what `descriptor` stands for.
 void CopyDescriptor(int descriptor, int copy);
-
-// True in a child of vfork, whose descriptors are its own but whose memory is its parent's; also in a child that
-// is not recorded.
-bool IsVforkChild();
 
 // Descriptors that the program was started with are not opens of its own.
 void MarkInheritedDescriptors();

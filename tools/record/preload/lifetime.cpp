@@ -47,9 +47,10 @@ std::atomic<bool> gReportWanted{false};
 std::atomic<bool> gIsFreshChild{false};
 std::atomic<bool> gFinished{false};
 
-// The program has ended, but for what the C library itself still does.
+// The program has ended, but for what the C library itself still does. Called by _exit, so also in
+// signal handlers.
 void Finish() {
-    if (gProcess == 0 || syscall(SYS_getpid) != gProcess || gFinished.exchange(true)) return;
+    if (!MayReport() || gProcess == 0 || IsVforkChild() || gFinished.exchange(true)) return;
     if (gIsFreshChild) Attend();
     const InsideScope scope;
     gState = 0;
@@ -148,6 +149,7 @@ __attribute__((constructor)) void Start() {
 }  // namespace
 
 unsigned int Attend() {
+    const bool may_report = MayReport();
     const InsideScope scope;
     gState &= ~kAttention;
     if (gIsFreshChild.exchange(false)) {
@@ -155,9 +157,15 @@ unsigned int Attend() {
         ResetBlocksInChild();
         ResetFilesInChild();
     }
-    if (gReportWanted.exchange(false)) Report(*gSettings, gProcess, false);
+    if (!may_report) {
+        if (gReportWanted) gState |= kAttention;  // a later call makes the report
+    } else if (gReportWanted.exchange(false) && !gFinished) {
+        Report(*gSettings, gProcess, false);
+    }
     return gState;
 }
+
+bool IsVforkChild() { return gProcess != 0 && syscall(SYS_getpid) != gProcess; }
 
 bool IsOwnCode(std::uintptr_t pc) {
     return pc >= reinterpret_cast<std::uintptr_t>(&__ehdr_start) &&

@@ -42,6 +42,12 @@ bool IsForLookUp(const void* block) {
     return address >= first && address < first + sizeof gLookUpMemory;
 }
 
+template <class Function, class... Arguments>
+[[gnu::always_inline]] inline auto Call(NextFunction<Function>& next, Arguments... arguments) {
+    const AllocatorScope scope;
+    return next(arguments...);
+}
+
 [[gnu::always_inline]] inline void* Recorded(void* block, std::size_t size) {
     if (block != nullptr && Wants(kMemory)) RecordBlock(block, size, CallerOfHook());
     return block;
@@ -57,9 +63,9 @@ bool IsForLookUp(const void* block) {
 
 // A reallocation that fails leaves the block as it was; with a size of 0 it freed it.
 [[gnu::always_inline]] inline void* Reallocate(void* old, std::size_t size) {
-    if (old == nullptr || !Wants(kMemory)) return Recorded(gRealloc(old, size), size);
+    if (old == nullptr || !Wants(kMemory)) return Recorded(Call(gRealloc, old, size), size);
     const DroppedBlock dropped = Dropped(old);
-    void* const block = gRealloc(old, size);
+    void* const block = Call(gRealloc, old, size);
     if (block == nullptr && size != 0 && dropped.found) {
         const InsideScope scope;
         RestoreBlock(old, dropped);
@@ -76,44 +82,45 @@ extern "C" {
 
 void* malloc(std::size_t size) noexcept {
     if (IsLookingUp() && gMalloc.Known() == nullptr) return TakeForLookUp(size);
-    return Recorded(gMalloc(size), size);
+    return Recorded(Call(gMalloc, size), size);
 }
 
 void* calloc(std::size_t count, std::size_t size) noexcept {
     if (IsLookingUp() && gCalloc.Known() == nullptr) return TakeForLookUp(count * size);
-    return Recorded(gCalloc(count, size), count * size);
+    return Recorded(Call(gCalloc, count, size), count * size);
 }
 
 void* realloc(void* old, std::size_t size) noexcept { return Reallocate(old, size); }
 
 void* reallocarray(void* old, std::size_t count, std::size_t size) noexcept {
     std::size_t bytes = 0;
-    if (__builtin_mul_overflow(count, size, &bytes)) return gReallocArray(old, count, size);  // refuses it
+    if (__builtin_mul_overflow(count, size, &bytes))
+        return Call(gReallocArray, old, count, size);  // refuses it
     return Reallocate(old, bytes);
 }
 
 void free(void* block) noexcept {
     if (block == nullptr || IsForLookUp(block)) return;
     if (Wants(kMemory)) Dropped(block);
-    gFree(block);
+    Call(gFree, block);
 }
 
 void* memalign(std::size_t alignment, std::size_t size) noexcept {
-    return Recorded(gMemalign(alignment, size), size);
+    return Recorded(Call(gMemalign, alignment, size), size);
 }
 
 void* aligned_alloc(std::size_t alignment, std::size_t size) noexcept {
-    return Recorded(gAlignedAlloc(alignment, size), size);
+    return Recorded(Call(gAlignedAlloc, alignment, size), size);
 }
 
 int posix_memalign(void** block, std::size_t alignment, std::size_t size) noexcept {
-    const int error = gPosixMemalign(block, alignment, size);
+    const int error = Call(gPosixMemalign, block, alignment, size);
     if (error == 0) Recorded(*block, size);
     return error;
 }
 
-void* valloc(std::size_t size) noexcept { return Recorded(gValloc(size), size); }
+void* valloc(std::size_t size) noexcept { return Recorded(Call(gValloc, size), size); }
 
-void* pvalloc(std::size_t size) noexcept { return Recorded(gPvalloc(size), size); }
+void* pvalloc(std::size_t size) noexcept { return Recorded(Call(gPvalloc, size), size); }
 
 }  // extern "C"

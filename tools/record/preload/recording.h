@@ -28,6 +28,10 @@ inline bool Wants(unsigned int kind) {
     return (state & kind) != 0;
 }
 
+// True in a child of vfork, whose descriptors are its own but whose memory is its parent's; also in a child
+// that is not recorded.
+bool IsVforkChild();
+
 // True for an address in this library's code. What that code allocates is not recorded, also where no guard
 // is set yet, and its containers don't call the program's operators.
 bool IsOwnCode(std::uintptr_t pc);

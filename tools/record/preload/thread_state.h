@@ -20,6 +20,7 @@ struct ThreadState {
     bool opening;      // inside a call that opens a file and will count that
     bool has_request;  // `request` is the caller of an operator new that has not reached an allocator yet
     Frame request;
+    bool allocating;  // inside the real allocator
 };
 
 // Initial-exec: no access may call the loader, which allocates.
@@ -40,6 +41,22 @@ private:
     const bool mbWasInside;
     const int mnErrno;
 };
+
+// Marks the thread as inside the real allocator.
+class AllocatorScope {
+public:
+    AllocatorScope() : mbWasAllocating(gThread.allocating) { gThread.allocating = true; }
+    ~AllocatorScope() { gThread.allocating = mbWasAllocating; }
+    AllocatorScope(const AllocatorScope&) = delete;
+    AllocatorScope& operator=(const AllocatorScope&) = delete;
+
+private:
+    const bool mbWasAllocating;
+};
+
+// False in a signal handler that interrupted the recorder or the allocator: either may hold locks that a
+// report needs.
+inline bool MayReport() { return !gThread.inside && !gThread.allocating; }
 
 // The caller of the function that this is inlined into, which must have been compiled with a frame pointer.
 [[gnu::always_inline]] inline Frame CallerOfHook() {
