@@ -116,6 +116,8 @@ hostile) # what can't be recorded is said; programs that make it hard end as the
         says "/log\",1,.*,$(wc -c <log),[^,]*,$(wc -c <log)\$" report
     done
     expect 14 timeout 60 "$record" --output report ./small alarm
+    expect 0 "$record" --follow --output report bash -c 'exec 900>mine; exec /bin/true'
+    same /dev/null mine
     expect 0 "$record" --output report ./small leak 1 $(seq 100000)
     says 'Memory Leak Report' report
     expect 0 "$record" --output report bash -c "exec 0<&- 1>&- 2>&-; exec 3<&-; ulimit -n 16; :"

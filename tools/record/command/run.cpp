@@ -7,6 +7,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <sstream>
 
 #include <fcntl.h>
 #include <sys/mman.h>
@@ -42,7 +43,7 @@ std::string PreloadLibrary() {
 // alone; it stays open in the program and its children.
 int MakeResultFile() {
     constexpr int kFirst = 900;
-    const int low = memfd_create("zanbase-record", MFD_CLOEXEC);
+    const int low = memfd_create(kResultName, MFD_CLOEXEC);
     const int high = fcntl(low, F_DUPFD, kFirst);
     close(low);
     return high;
@@ -83,14 +84,14 @@ int Conclude(const std::string& path, int status, const std::string& result) {
     const int exit_status = WEXITSTATUS(status);
     if (!reported && exit_status != kCannotRun)
         Say(path +
-            " left no report: another program took its place, or it ended by a system call of its own");
+            " left no report: another program took its place, or it ended by a system call of its own, or in "
+            "a signal "
+            "handler inside an allocator");
     bool broke = false;
-    for (std::size_t at = 0; at < result.size();) {
-        const std::size_t end = result.find('\n', at);
-        const std::string line = result.substr(at, end + 1 - at);
-        at = end + 1;
-        if (line == kReportedLine) continue;
-        Say(line.substr(0, line.size() - 1));
+    std::istringstream lines(result);
+    for (std::string line; std::getline(lines, line);) {
+        if (line + "\n" == kReportedLine) continue;
+        Say(line);
         broke = true;
     }
     return broke && exit_status == 0 ? kBudgetBroke : exit_status;

@@ -10,7 +10,10 @@ namespace recorder {
 
 constexpr char kSettingsVariable[] = "ZANBASE_RECORD";
 
-// What the library writes to the command once a report was made; lines about broken budgets follow.
+// The name of the file in memory by which the library tells the command what it did.
+constexpr char kResultName[] = "zanbase-record";
+
+// What the library writes there once a report was made; lines about broken budgets follow.
 constexpr char kReportedLine[] = "reported\n";
 
 enum class Format { kTables, kJson, kCsv, kFolded };

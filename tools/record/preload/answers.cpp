@@ -1,6 +1,6 @@
 // The table of answers: open hashing with linear probing. A slot's answer is written before its key, and a
-// slot keeps its key, so readers need no lock. A full table is replaced; the old one stays, since a reader may
-// still be in it.
+// slot keeps its key, so readers need no lock. A full table is replaced; the old one stays, since a reader
+// may still be in it.
 #include "answers.h"
 
 #include <array>

@@ -24,8 +24,8 @@ inline SiteId SiteIn(Answer answer) { return static_cast<SiteId>(answer >> 2); }
 Answer PackRule(const FrameRule& rule);
 FrameRule UnpackRule(Answer answer);
 
-// The answer that was remembered for `key`, which is a return address or one with a bit of the caller's own in
-// it; 0 if there is none. Any thread may call it at any time.
+// The answer that was remembered for `key`, which is a return address or one with a bit of the caller's own
+// in it; 0 if there is none. Any thread may call it at any time.
 Answer AnswerFor(std::uintptr_t key);
 
 // Requires: `key` is not 0 and has no answer; the thread holds the lock of the sites. An answer that

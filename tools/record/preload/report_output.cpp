@@ -1,5 +1,5 @@
-// Where reports and messages of the preload library are written: by system calls of its own, so that nothing of it
-// is recorded.
+// Where reports and messages of the preload library are written: by system calls of its own, so that nothing
+// of it is recorded.
 #include "report_output.h"
 
 #include <algorithm>
@@ -36,7 +36,7 @@ void ListOwn() {
 }
 
 // A pipe without a reader and a limit on files raise signals in the thread that writes, which would end a
-// program that has ended well. Keeps `errno`.
+// program that has ended well. Those that the program itself holds back stay pending. Keeps `errno`.
 class WriteSignalsHeld {
 public:
     WriteSignalsHeld() {
@@ -44,6 +44,10 @@ public:
         sigaddset(&moHeld, SIGPIPE);
         sigaddset(&moHeld, SIGXFSZ);
         pthread_sigmask(SIG_BLOCK, &moHeld, &moBefore);
+        sigset_t pending{};
+        sigpending(&pending);
+        for (const int signal : {SIGPIPE, SIGXFSZ})
+            if (sigismember(&pending, signal) == 1) sigdelset(&moHeld, signal);
     }
     ~WriteSignalsHeld() {
         const int error = errno;
@@ -81,6 +85,14 @@ int MoveHigh(int descriptor) {
     return fcntl(descriptor, F_DUPFD_CLOEXEC, static_cast<int>(end > 16 ? end - 16 : 3));
 }
 
+// A program that follows another by exec may have a file of its own at that number.
+bool IsResultFile(int descriptor) {
+    const std::string link = "/proc/self/fd/" + std::to_string(descriptor);
+    std::array<char, 64> name{};
+    syscall(SYS_readlink, link.c_str(), name.data(), name.size() - 1);
+    return std::string_view(name.data()).find(std::string("/memfd:") + kResultName) == 0;
+}
+
 std::string OutputPath(const Settings& settings, int process) {
     std::string path = settings.output;
     const std::string number = std::to_string(process);
@@ -111,14 +123,18 @@ const std::array<unsigned int, 2>& OwnDescriptors() { return gOwn; }
 void TakeDescriptors(const Settings& settings) {
     const int error = MoveHigh(STDERR_FILENO);
     if (error >= 0) gError = error;
-    gResult = settings.result_descriptor;
+    if (IsResultFile(settings.result_descriptor)) gResult = settings.result_descriptor;
     if (!settings.follow && gResult >= 0) fcntl(gResult, F_SETFD, FD_CLOEXEC);
     ListOwn();
 }
 
 void VacateDescriptor(int number) {
-    for (int* const own : {&gError, &gResult})
-        if (*own == number) *own = fcntl(number, F_DUPFD_CLOEXEC, number + 1);
+    const InsideScope scope;
+    for (int* const own : {&gError, &gResult}) {
+        if (*own != number) continue;
+        *own = fcntl(number, F_DUPFD_CLOEXEC, number + 1);
+        if (*own < 0) *own = fcntl(number, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+    }
     ListOwn();
 }
 

@@ -12,7 +12,7 @@ namespace recorder {
 // descriptor from programs that are not recorded. From then on OwnDescriptors tells both.
 void TakeDescriptors(const Settings& settings);
 
-// The program is about to put another file at `number`, which is one of OwnDescriptors: that moves elsewhere.
+// Moves the one of OwnDescriptors that is `number`: the program is about to put another file there.
 void VacateDescriptor(int number);
 
 // Keeps memory for the last report of a program that uses up its own.
@@ -21,7 +21,7 @@ void ReserveMemory();
 // Writes a line to standard error as the program found it.
 void Say(const std::string& text);
 
-// Makes the report and writes it; `process` is the number that %p in the output's name stands for. The last report
+// Makes the report and writes it; `process` is the number that %p in the output's name stands for. The last
 // also tells the command which budgets broke.
 // Requires: the thread is inside the recorder.
 void Report(const Settings& settings, int process, bool is_last);

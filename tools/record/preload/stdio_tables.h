@@ -5,8 +5,8 @@
 
 namespace recorder {
 
-// Counts what streams do from now on; further calls do nothing. False if the C library's tables are not as expected: then only opens of
-// streams are counted.
+// Counts what streams do from now on; further calls do nothing. False if the C library's tables are not as
+// expected: then only opens of streams are counted.
 bool HookStreams();
 
 }  // namespace recorder
