@@ -8,6 +8,7 @@
 #include <mutex>
 #include <thread>
 
+#include "one_processor.h"
 #include "ratios.h"
 
 namespace {
@@ -38,6 +39,7 @@ enum Turn { kMain, kPeer, kEnd };
 
 template <class Pair>
 void ConditionPingPong(benchmark::State& state) {
+    const OneProcessor one_processor;
     Pair pair;
     Turn turn = kMain;  // guarded by the pair's mutex
     const auto pass_to = [&](Turn next, Turn own) {

@@ -7,6 +7,7 @@
 #include <mutex>
 #include <thread>
 
+#include "one_processor.h"
 #include "ratios.h"
 
 namespace {
@@ -66,6 +67,7 @@ private:
 
 template <class Worker>
 void SignalToPass(benchmark::State& state) {
+    const OneProcessor one_processor;
     Worker worker;
     for (int unasked = 0; unasked < 2; ++unasked) answers.Lock();
     for (auto _ : state) {

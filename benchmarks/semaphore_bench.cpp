@@ -6,6 +6,7 @@
 
 #include <thread>
 
+#include "one_processor.h"
 #include "ratios.h"
 
 namespace {
@@ -34,6 +35,7 @@ BENCHMARK_TEMPLATE(SemaphorePair, SystemSemaphore);
 
 template <class Semaphore>
 void SemaphorePingPong(benchmark::State& state) {
+    const OneProcessor one_processor;
     Semaphore ping(0);
     Semaphore pong(0);
     bool ends = false;  // handed over with ping's unit

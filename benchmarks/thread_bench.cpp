@@ -5,6 +5,7 @@
 
 #include <thread>
 
+#include "one_processor.h"
 #include "ratios.h"
 
 namespace {
@@ -14,6 +15,7 @@ struct Nothing : HThread {
 };
 
 void ThreadStartAndWait(benchmark::State& state) {
+    const OneProcessor one_processor;
     Nothing thread;
     for (auto _ : state) {
         thread.Start(true);
@@ -23,6 +25,7 @@ void ThreadStartAndWait(benchmark::State& state) {
 BENCHMARK(ThreadStartAndWait)->UseRealTime();
 
 void StdThreadStartAndJoin(benchmark::State& state) {
+    const OneProcessor one_processor;
     for (auto _ : state) std::thread([] {}).join();
 }
 BENCHMARK(StdThreadStartAndJoin)->UseRealTime();
