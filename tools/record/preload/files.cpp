@@ -101,7 +101,7 @@ FileRecord* FindRecord(int descriptor, const char* path) {
 FileRecord* LookAt(int descriptor, Mark& mark, const char* path) {
     const InsideScope scope;
     FileRecord* const file = FindRecord(descriptor, path);
-    mark.store(file != nullptr ? file : &gNoFile, std::memory_order_release);
+    if (!IsVforkChild()) mark.store(file != nullptr ? file : &gNoFile, std::memory_order_release);
     return file;
 }
 
@@ -113,7 +113,8 @@ FileRecord* FileOf(int descriptor) {
     FileRecord* file = mark->load(std::memory_order_acquire);
     if (file == nullptr) {
         file = LookAt(descriptor, *mark, nullptr);
-        if (file != nullptr && !gThread.opening) CountOperation(*file, DiskOperation::kOpen, 0, 0);
+        const bool is_counted = gThread.opening || IsVforkChild();
+        if (file != nullptr && !is_counted) CountOperation(*file, DiskOperation::kOpen, 0, 0);
     }
     return file == &gNoFile ? nullptr : file;
 }

@@ -44,13 +44,14 @@ struct FileRecord {
 
 // The record that `descriptor` stands for, or null if it is no regular file. A descriptor that was not looked
 // at yet was opened where no hook sees it, and that open is counted without time, unless a hook will count
-// it.
+// it. A child of vfork makes no marks, so it counts no such open.
 FileRecord* FileOf(int descriptor);
 
 void CountOperation(FileRecord& file, DiskOperation operation, std::uint64_t bytes,
                     std::uint64_t nanoseconds);
 
-// `descriptor` was opened as `path`, which may be null. Counts it, and marks the descriptor.
+// `descriptor` was opened as `path`, which may be null. Counts it, and marks the descriptor unless a child of
+// vfork opened it.
 void CountOpen(int descriptor, const char* path, std::uint64_t nanoseconds);
 
 // Takes the mark away; returns the record that it led to, or null. A child of vfork leaves the mark and gets
