@@ -4,6 +4,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <memory_resource>
 #include <thread>
 
 #include "zanbase/disk_io.h"
@@ -50,7 +51,9 @@ TEST(MemorySnapshot, HoldsEachSiteWithItsBlocks) {
     HMemory::Alloc(&blocks[2], 5, kFile, 2);
     HMemory::Free(&blocks[2]);
     HMemory::Alloc(&blocks[3], 40, file_again.c_str(), 2);
+    std::pmr::set_default_resource(std::pmr::null_memory_resource());  // must not be used
     const HMemorySnapshot memory = HMemorySnapshot::Take();
+    std::pmr::set_default_resource(nullptr);
     EXPECT_THAT(Texts(memory), UnorderedElementsAre("a.cpp:1 live 1/10 alloc 0/0 free 0/0",
                                                     "a.cpp:2 live 1/20 alloc 2/25 free 1/5",
                                                     "a.cpp:2 live 1/40 alloc 1/40 free 0/0"));

@@ -52,7 +52,9 @@ public:
         if (mpoFileMap == nullptr) return snapshot;
         snapshot.mnTotal = static_cast<long long>(mnTotalMemory);
         snapshot.mnPeak = static_cast<long long>(mnPeekMemory);
-        std::pmr::monotonic_buffer_resource nodes;  // a fifth faster than an allocation for each node
+        // A fifth faster than an allocation for each node. Not over the default resource: that is the program's,
+        // and may record its blocks in the tables that are read here.
+        std::pmr::monotonic_buffer_resource nodes(std::pmr::new_delete_resource());
         Indices indices(mpoFileMap->size(), boost::hash<CallSite>(), std::equal_to<CallSite>(), &nodes);
         snapshot.maRows.reserve(mpoFileMap->size());
         for (const auto& [site, usage] : *mpoFileMap) AddUsage(RowOf(snapshot, indices, site), usage);
