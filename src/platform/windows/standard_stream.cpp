@@ -16,8 +16,8 @@ constexpr DWORD kCancelLimitMs = 100;
 struct Redirection {
     std::FILE* stream;
     const std::FILE* target;  // null: the null device
-    std::atomic<bool> is_decided{
-        false};  // set by the thread before it moves the stream, or by the caller that gives up
+    // Set by the thread before it moves the stream, or by the caller that gives up.
+    std::atomic<bool> is_decided{false};
 };
 
 void Move(std::FILE* stream, const std::FILE* target) noexcept {
@@ -32,6 +32,7 @@ void Move(std::FILE* stream, const std::FILE* target) noexcept {
 DWORD WINAPI Redirect(void* argument) {
     const auto redirection = static_cast<Redirection*>(argument);
     const StreamLock lock(redirection->stream);
+    if (redirection->is_decided) return 0;  // before fflush, which drops the input that is buffered
     std::fflush(redirection->stream);
     if (!redirection->is_decided.exchange(true)) Move(redirection->stream, redirection->target);
     return 0;

@@ -11,11 +11,11 @@
 // The lock for all blocks and slots. A thread is killed under this lock, so none is killed while it holds the lock.
 inline SpinLock goBlockLock;
 
-// All but the handle is guarded by goBlockLock.
+// Guarded by goBlockLock, but for the fields that say otherwise.
 struct HNativeThread {
-    ThreadSlot* mpoSlot;  // null once the thread has no owner
-    void (*mpfnBody)(void*);
-    void* mpoArgument;
+    ThreadSlot* mpoSlot;         // null once the thread has no owner
+    void (*mpfnBody)(void*);     // constant once mnId is set
+    void* mpoArgument;           // constant
     HANDLE mpoHandle = nullptr;  // constant once the slot points here
     DWORD mnId = 0;              // 0 until the thread is about to enter its body
     int mnUsers = 1;
