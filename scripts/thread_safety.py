@@ -19,8 +19,9 @@ def tells(node):
 
 
 findings = set()
-for file in pathlib.Path(sys.argv[1] if len(sys.argv) > 1 else "build/docs-xml").glob("*.xml"):
-    for compound in xml.parse(file).findall("compounddef"):
+folder = pathlib.Path(sys.argv[1] if len(sys.argv) > 1 else "build/docs-xml")
+for entry in xml.parse(folder / "index.xml").findall("compound"):  # doxygen keeps the files of removed declarations
+    for compound in xml.parse(folder / (entry.get("refid") + ".xml")).findall("compounddef"):
         functions = compound.findall("sectiondef/memberdef[@kind='function'][@prot='public']")
         if compound.get("prot") == "private":
             continue
