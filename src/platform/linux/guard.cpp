@@ -83,7 +83,7 @@ void OnFault(int signal, siginfo_t* info, void* context) {
     ForwardPendingWakeups();
     AbandonWait();
     pthread_sigmask(SIG_SETMASK, &frame->moBlocked, nullptr);
-    siglongjmp(frame->moPlace, 1);
+    JumpTo(frame->moPlace, 1);
 }
 
 }  // namespace

@@ -96,7 +96,7 @@ void ExitKilledThread() noexcept {
         MarkKilled(block);
     }
     WakeWaiters(block);
-    if (toSelf.mpoKilledExit != nullptr) siglongjmp(*toSelf.mpoKilledExit, 1);
+    if (toSelf.mpoKilledExit != nullptr) JumpTo(*toSelf.mpoKilledExit, 1);
     for (;;) syscall(SYS_exit, 0);
 }
 

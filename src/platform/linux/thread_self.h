@@ -7,6 +7,10 @@
 
 #include "platform/linux/build.h"
 
+// siglongjmp without the check that _FORTIFY_SOURCE adds: the thread sanitizer does not intercept the checked
+// one, so its record of the stack would keep the frames that the jump leaves.
+extern "C" [[noreturn]] void JumpTo(sigjmp_buf place, int value) __asm__("siglongjmp");
+
 struct FaultFrame;
 struct HNativeThread;
 
