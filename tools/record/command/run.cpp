@@ -84,9 +84,8 @@ int Conclude(const std::string& path, int status, const std::string& result) {
     const int exit_status = WEXITSTATUS(status);
     if (!reported && exit_status != kCannotRun)
         Say(path +
-            " left no report: another program took its place, or it ended by a system call of its own, or in "
-            "a signal "
-            "handler inside an allocator");
+            " left no report: another program took its place, or it ended by a system call of its own "
+            "or in a signal handler that interrupted an allocator");
     bool broke = false;
     std::istringstream lines(result);
     for (std::string line; std::getline(lines, line);) {

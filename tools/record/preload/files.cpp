@@ -113,8 +113,9 @@ FileRecord* FileOf(int descriptor) {
     FileRecord* file = mark->load(std::memory_order_acquire);
     if (file == nullptr) {
         file = LookAt(descriptor, *mark, nullptr);
-        const bool is_counted = gThread.opening || IsVforkChild();
-        if (file != nullptr && !is_counted) CountOperation(*file, DiskOperation::kOpen, 0, 0);
+        // An open that is under way counts itself.
+        const bool counts = !gThread.opening && !IsVforkChild();
+        if (file != nullptr && counts) CountOperation(*file, DiskOperation::kOpen, 0, 0);
     }
     return file == &gNoFile ? nullptr : file;
 }
