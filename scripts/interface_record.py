@@ -2,9 +2,10 @@
 """interface_record.py LIBRARY HEADERS
 
 Prints what callers of LIBRARY are compiled against, one line each: exported names with their types; size,
-bases and members of each class with offsets in bytes; virtual functions with their slots; enumerators. The text
-does not depend on the compiler. LIBRARY needs debug information. Only types that a header in the folder HEADERS
-defines are listed. Reads the library with abidw, of Debian's abigail-tools."""
+bases and members of each class with offsets in bytes; virtual functions with their slots; enumerators. A private
+member has no name there: no caller can use it. The text does not depend on the compiler. LIBRARY needs debug
+information. Only types that a header in the folder HEADERS defines are listed. Reads the library with abidw, of
+Debian's abigail-tools."""
 import pathlib
 import re
 import subprocess
@@ -96,8 +97,9 @@ class Interface:
         for member in node.findall("data-member"):
             if member.get("static") != "yes":
                 variable = member.find("var-decl")
+                name = "" if member.get("access") == "private" else " " + variable.get("name")
                 yield (f"member at {int(member.get('layout-offset-in-bits')) // 8:3}: "
-                       f"{self.type_name(variable.get('type-id'))} {variable.get('name')}")
+                       f"{self.type_name(variable.get('type-id'))}{name}")
         for member in node.findall("member-function"):
             slot = int(member.get("vtable-offset", NO_SLOT))
             name = member.find("function-decl").get("name")
