@@ -14,14 +14,23 @@ if(CMAKE_SYSTEM_PROCESSOR STREQUAL aarch64)
 endif()
 
 # Compiles the objects of `objects` with the protections, and links `library` without writable tables of addresses,
-# relocations in its code, or code on the stack.
+# relocations in its code, or code on the stack; for Windows at addresses that the system chooses anew, with no code
+# in data. MinGW has fewer: its own formatting replaces what `fortify` would check, and g++ makes no tables for the
+# system's control-flow guard.
 function(zanbase_harden objects library)
-    if(CMAKE_CXX_FLAGS MATCHES -fsanitize OR NOT UNIX)
+    if(CMAKE_CXX_FLAGS MATCHES -fsanitize)
         return()
+    endif()
+    if(WIN32)
+        list(REMOVE_ITEM ZANBASE_HARDENING fortify control-flow)
     endif()
     foreach(protection IN LISTS ZANBASE_HARDENING)
         # The C library's checks need an optimised build.
         target_compile_options(${objects} PRIVATE "$<$<CONFIG:Release,RelWithDebInfo,MinSizeRel>:${${protection}}>")
     endforeach()
+    if(WIN32)
+        target_link_options(${library} PRIVATE -Wl,--dynamicbase,--high-entropy-va,--nxcompat)
+        return()
+    endif()
     target_link_options(${library} PRIVATE -Wl,-z,relro -Wl,-z,now -Wl,-z,text -Wl,-z,noexecstack)
 endfunction()

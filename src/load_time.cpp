@@ -3,7 +3,7 @@
 // loader builds these objects before any code of theirs runs.
 //
 // None of them is ever destroyed: detached threads and destructors of other static objects may call the
-// library while the process exits, and the library is never unloaded.
+// library while the process exits, and the library is never unloaded: each back end keeps it loaded.
 #include <algorithm>
 #include <array>
 #include <new>

@@ -31,7 +31,9 @@ struct GlobalTimerSnapshot;
 /// nothing. A child made by `fork` that calls `exit` prints it too, with the totals of its parent: end such a
 /// child with `_exit`. The instance is destroyed with that report. Requires: no thread toggles by then.
 /// Destructors of static objects and `atexit` handlers may use the timers only if they were constructed or
-/// registered after the first `GetInstance`.
+/// registered after the first `GetInstance`. On Windows the report comes when the system detaches the DLL from the
+/// ending process: after the exit handlers and static objects of the program, with no other thread left. The DLL stays
+/// loaded until then, also after `FreeLibrary`.
 ///
 /// **Thread numbers.** Threads with the same OpenMP number share slots and must toggle one after the other.
 /// Outside parallel regions every thread has number 0, and nested teams number theirs from 0 again. In a process
