@@ -115,11 +115,16 @@ int UseConsole() {
     FreeConsole();
     std::fclose(stdin);
     std::printf("earlier");
+    int locked = 0;
+    {
+        const StreamLock out(stdout), err(stderr);
+        locked = CreateConsole();
+    }
     const int created = CreateConsole();
     if (GetConsoleWindow() == nullptr) return 0;
     std::printf("text");
-    std::fprintf(log, "created %d, has %s, input %d, visible", created, FirstTextOnConsole(4).c_str(),
-                 std::getchar());
+    std::fprintf(log, "locked %d, created %d, has %s, input %d, visible", locked, created,
+                 FirstTextOnConsole(4).c_str(), std::getchar());
     for (const int shown : {0, 1}) {
         ShowConsole(shown);
         std::fprintf(log, " %d", IsWindowVisible(GetConsoleWindow()));
@@ -133,7 +138,7 @@ int UseConsole() {
 TEST(WindowsConsole, IsAWindowWithAllStreamsButAClosedOne) {
     const ChildResult child = RunInChild(UseConsole);
     if (child.err.empty()) GTEST_SKIP() << "there is no display for a window";
-    EXPECT_EQ(child.err, "created 1, has text, input -1, visible 0 1, destroyed 1, late 4");
+    EXPECT_EQ(child.err, "locked 0, created 1, has text, input -1, visible 0 1, destroyed 1, late 4");
     EXPECT_EQ(child.out, "earlier");
 }
 
@@ -154,8 +159,8 @@ TEST(WindowsConsole, WaitsForNoReaderAndNoFullPipe) {
         leave.Lock();
     });
     locked.Lock();
-    RedirectStream(full, targets[0]);
-    RedirectStream(used, targets[1]);
+    EXPECT_TRUE(RedirectStream(full, _fileno(targets[0])));
+    EXPECT_FALSE(RedirectStream(used, _fileno(targets[1])));
     std::fputs("moved", full);
     leave.Unlock();
     user.join();

@@ -47,7 +47,7 @@ ZANBASE_API const char* IMPGetMajorRev();
 /// calls leave the streams alone.
 ///
 /// The call waits for a bounded time. It drops pending output that the old file does not accept within a
-/// second (a full pipe, or one without a reader, which raises no SIGPIPE). If another thread is using a
+/// second (a full pipe, or one without a reader, which raises no SIGPIPE). On Linux, if another thread is using a
 /// stream for longer than a tenth of a second, because it waits for input for example, the stream uses the
 /// console from its next system call on, but stays buffered. A wide-oriented stream loses its orientation.
 ///
@@ -57,8 +57,11 @@ ZANBASE_API const char* IMPGetMajorRev();
 /// user closes the window, reading gives end-of-file and writing fails.
 ///
 /// On Windows the console is one of the system's, with a window. It can't be made where the process has one already,
-/// as a program started from a command prompt has. A stream that another thread uses for longer than a second keeps
-/// its file on Windows.
+/// as a program started from a command prompt has. A stream that another thread uses for longer than a tenth of a second
+/// keeps its file on Windows, as does, with the runtime msvcrt, a standard stream that the caller has locked. If this
+/// leaves no stream to connect, the console is removed again and the result is 0; a later call may succeed. The printf
+/// functions of MinGW write an unbuffered stream byte by byte: letters of several bytes stay whole if they are
+/// formatted first and written by `fputs` or `fwrite`, as the reports of this library are.
 ///
 /// Not for programs that need single keys or the mouse: the console transfers lines of text.
 /// Thread-safety: one thread at a time calls the three console operations. Other threads may use the streams.

@@ -12,8 +12,11 @@ int mnConsoleCreated = 0;  // 1 once a console was made; never cleared
 int CreateConsole() {
     if (mnConsoleCreated != 0) return 1;
     if (!OpenConsole()) return 0;
+    if (!ConnectStandardStreams()) {
+        CloseConsole();
+        return 0;
+    }
     mnConsoleCreated = 1;
-    ConnectStandardStreams();
     return 1;
 }
 

@@ -7,6 +7,11 @@
 // Waits until the calling thread owns the stream's own lock, the one that every output call on the stream
 // acquires. Re-entrant: each call requires one UnlockStream on the same thread.
 void LockStream(std::FILE* stream) noexcept;
+
+// The same without waiting; false if another thread owns the lock. A system that has no such call always returns
+// false, so a caller must be able to continue with LockStream.
+bool TryLockStream(std::FILE* stream) noexcept;
+
 void UnlockStream(std::FILE* stream) noexcept;
 
 // Owns a stream's lock for a scope; nothing if the stream is null.

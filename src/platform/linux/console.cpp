@@ -36,9 +36,10 @@ bool OpenConsole() noexcept {
     return gnConsole >= 0;
 }
 
-void ConnectStandardStreams() noexcept {
+bool ConnectStandardStreams() noexcept {
     const NoCancellation no_cancellation;
     for (std::FILE* const stream : StandardStreams()) RedirectStream(stream, gnConsole);
+    return true;
 }
 
 bool CloseConsole() noexcept {

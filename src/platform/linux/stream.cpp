@@ -3,4 +3,6 @@
 
 void LockStream(std::FILE* stream) noexcept { flockfile(stream); }
 
+bool TryLockStream(std::FILE* stream) noexcept { return ftrylockfile(stream) == 0; }
+
 void UnlockStream(std::FILE* stream) noexcept { funlockfile(stream); }

@@ -12,16 +12,7 @@
 
 namespace {
 
-struct StandardStream {
-    std::FILE* stream;
-    DWORD handle_number;
-    const char* mode;
-};
-
-std::array<StandardStream, 3> StandardStreams() noexcept {
-    return {
-        {{stdin, STD_INPUT_HANDLE, "r"}, {stdout, STD_OUTPUT_HANDLE, "w"}, {stderr, STD_ERROR_HANDLE, "w"}}};
-}
+std::array<std::FILE*, 3> StandardStreams() noexcept { return {stdin, stdout, stderr}; }
 
 bool UsesConsole(std::FILE* stream) noexcept {
     const auto handle = reinterpret_cast<HANDLE>(_get_osfhandle(_fileno(stream)));
@@ -29,16 +20,12 @@ bool UsesConsole(std::FILE* stream) noexcept {
     return GetConsoleMode(handle, &mode) != 0;
 }
 
-std::FILE* OpenHandle(HANDLE handle, const char* mode) noexcept {
-    const int descriptor = _open_osfhandle(reinterpret_cast<intptr_t>(handle), _O_TEXT);
-    return descriptor < 0 ? nullptr : _fdopen(descriptor, mode);
-}
-
-// The streams are objects of the runtime at fixed addresses, so a stream of the console is copied over each.
-void Connect(const StandardStream& standard) noexcept {
-    if (IsClosed(standard.stream)) return;
-    const std::FILE* const console = OpenHandle(GetStdHandle(standard.handle_number), standard.mode);
-    if (console != nullptr) RedirectStream(standard.stream, console);
+bool ConnectTo(const char* device, std::FILE* stream) noexcept {
+    const int target = _open(device, _O_RDWR | _O_TEXT);
+    if (target < 0) return false;
+    const bool is_connected = RedirectStream(stream, target);
+    _close(target);
+    return is_connected;
 }
 
 // A temporary title, which no other window has, identifies the window while it is searched for.
@@ -60,18 +47,25 @@ HWND FindConsoleWindow() noexcept {
 
 bool OpenConsole() noexcept { return AllocConsole() != 0; }
 
-void ConnectStandardStreams() noexcept {
-    for (const StandardStream& standard : StandardStreams()) Connect(standard);
+bool ConnectStandardStreams() noexcept {
+    int open = 0;
+    int connected = 0;
+    for (std::FILE* const stream : StandardStreams()) {
+        if (IsClosed(stream)) continue;
+        ++open;
+        if (ConnectTo(stream == stdin ? "CONIN$" : "CONOUT$", stream)) ++connected;
+    }
+    return connected != 0 || open == 0;
 }
 
 bool CloseConsole() noexcept {
     std::array<bool, 3> uses_console{};
-    const std::array<StandardStream, 3> streams = StandardStreams();
+    const std::array<std::FILE*, 3> streams = StandardStreams();
     for (std::size_t i = 0; i < streams.size(); ++i)
-        uses_console[i] = !IsClosed(streams[i].stream) && UsesConsole(streams[i].stream);
+        uses_console[i] = !IsClosed(streams[i]) && UsesConsole(streams[i]);
     if (FreeConsole() == 0) return false;
     for (std::size_t i = 0; i < streams.size(); ++i) {
-        if (uses_console[i]) RedirectStream(streams[i].stream, nullptr);
+        if (uses_console[i]) ConnectTo("NUL", streams[i]);
     }
     return true;
 }

@@ -1,75 +1,114 @@
-// The C runtime has no call that acquires a stream's lock, or writes, with a limit. So a thread of its own
-// redirects the stream, and the caller waits for that thread with a limit.
+// Redirection on the calling thread. The stream's lock and a full pipe are tried until their time is over, because the
+// runtime's own calls would wait for them without limit.
 #include "platform/windows/standard_stream.h"
 
-#include <atomic>
-#include <new>
+#include <cerrno>
 
+#include <io.h>
+
+#include "platform/clock.h"
 #include "platform/stream.h"
-#include "platform/windows/system.h"
+#include "platform/windows/runtime_stream.h"
 
 namespace {
 
-constexpr DWORD kLimitMs = 1000;
-constexpr DWORD kCancelLimitMs = 100;
+constexpr unsigned int kLockLimitMs = 100;
+constexpr unsigned int kOutputLimitMs = 1000;
+constexpr unsigned int kPauseMs = 5;
 
-struct Redirection {
-    std::FILE* stream;
-    const std::FILE* target;  // null: the null device
-    // Set by the thread before it moves the stream, or by the caller that gives up.
-    std::atomic<bool> is_decided{false};
+// msvcrt has no way to try a lock in its table, but it marks the streams that are locked. A thread that locks one between
+// the look and the call is waited for.
+bool TryOwn(std::FILE* stream) noexcept {
+    constexpr int kIsLocked = 0x8000;
+    if (IsInTransfer(_fileno(stream))) return false;
+    if (HasOwnLock(stream)) return TryLockStream(stream);
+    if ((In(stream)->fields._flag & kIsLocked) != 0) return false;
+    LockStream(stream);
+    return true;
+}
+
+bool OwnWithinLimit(std::FILE* stream) noexcept {
+    const unsigned int start = ReadTicks();
+    while (!TryOwn(stream)) {
+        if (ReadTicks() - start >= kLockLimitMs) return false;
+        SleepFor(kPauseMs);
+    }
+    return true;
+}
+
+// A pipe that accepts what it has room for and returns at once, for a scope. So do all other handles of this end.
+class NoWait {
+public:
+    explicit NoWait(HANDLE pipe) noexcept : mpoPipe(pipe) {
+        GetNamedPipeHandleStateA(pipe, &mnMode, nullptr, nullptr, nullptr, nullptr, 0);
+        DWORD no_wait = mnMode | PIPE_NOWAIT;
+        mbIsSet = SetNamedPipeHandleState(pipe, &no_wait, nullptr, nullptr) != 0;
+    }
+    ~NoWait() {
+        if (mbIsSet) SetNamedPipeHandleState(mpoPipe, &mnMode, nullptr, nullptr);
+    }
+    NoWait(const NoWait&) = delete;
+    NoWait& operator=(const NoWait&) = delete;
+
+    bool IsSet() const noexcept { return mbIsSet; }
+
+private:
+    HANDLE mpoPipe;
+    DWORD mnMode = PIPE_WAIT;  // stays if the handle doesn't show its mode
+    bool mbIsSet = false;
 };
 
-void Move(std::FILE* stream, const std::FILE* target) noexcept {
-    if (target != nullptr) {
-        *stream = *target;
-    } else if (std::freopen("NUL", "r+", stream) == nullptr) {
-        return;
+void WriteIntoPipe(int descriptor, const char* from, const char* end) noexcept {
+    const unsigned int start = ReadTicks();
+    while (from < end && ReadTicks() - start < kOutputLimitMs) {
+        const int written = _write(descriptor, from, static_cast<unsigned int>(end - from));
+        if (written > 0) {
+            from += written;
+        } else if (written < 0 && errno == EPIPE) {
+            return;
+        } else {
+            SleepFor(kPauseMs);
+        }
     }
+}
+
+// Writes what the stream has pending, or drops it.
+void WritePending(std::FILE* stream) noexcept {
+    constexpr int kReads = 1;
+    constexpr int kWrites = 2;
+    StreamFields& fields = In(stream)->fields;
+    const int descriptor = _fileno(stream);
+    const auto file = reinterpret_cast<HANDLE>(_get_osfhandle(descriptor));
+    if (GetFileType(file) != FILE_TYPE_PIPE) {
+        std::fflush(stream);
+    } else if ((fields._flag & (kReads | kWrites)) == kWrites && fields._base != nullptr) {
+        const NoWait no_wait(file);
+        if (no_wait.IsSet()) WriteIntoPipe(descriptor, fields._base, fields._ptr);
+        fields._ptr = fields._base;
+        fields._cnt = 0;
+    }
+}
+
+// The null device first, for a stream of a program without a console, which has no descriptor.
+bool Move(std::FILE* stream, int target) noexcept {
+    if (_fileno(stream) < 0) {
+        if (std::freopen("NUL", "r+", stream) == nullptr) return false;
+    } else {
+        WritePending(stream);
+    }
+    if (_dup2(target, _fileno(stream)) != 0) return false;
     std::setvbuf(stream, nullptr, _IONBF, 0);
-}
-
-DWORD WINAPI Redirect(void* argument) {
-    const auto redirection = static_cast<Redirection*>(argument);
-    const StreamLock lock(redirection->stream);
-    if (redirection->is_decided) return 0;  // before fflush, which drops the input that is buffered
-    std::fflush(redirection->stream);
-    if (!redirection->is_decided.exchange(true)) Move(redirection->stream, redirection->target);
-    return 0;
-}
-
-bool EndsWithin(HANDLE thread, DWORD limit_ms) noexcept {
-    return WaitForSingleObject(thread, limit_ms) == WAIT_OBJECT_0;
-}
-
-// True if the thread has ended; false if it may wait for the stream for ever, and then it changes nothing.
-bool AwaitOrGiveUp(HANDLE thread, Redirection* redirection) noexcept {
-    if (EndsWithin(thread, kLimitMs)) return true;
-    CancelSynchronousIo(thread);  // a write into a full pipe
-    if (EndsWithin(thread, kCancelLimitMs)) return true;
-    return redirection->is_decided.exchange(true) && EndsWithin(thread, INFINITE);
-}
-
-// Keeps this library loaded until the process ends: a thread that was given up returns into it.
-void KeepLoaded() noexcept {
-    HMODULE library = nullptr;
-    GetModuleHandleExA(GET_MODULE_HANDLE_EX_FLAG_PIN | GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS,
-                       reinterpret_cast<const char*>(&Redirect), &library);
+    std::clearerr(stream);
+    return true;
 }
 
 }  // namespace
 
-bool IsClosed(std::FILE* stream) noexcept { return stream->_flag == 0; }
+bool IsClosed(std::FILE* stream) noexcept { return In(stream)->fields._flag == 0; }
 
-// A redirection that was given up is never freed: its thread reads it when the stream becomes free.
-void RedirectStream(std::FILE* stream, const std::FILE* target) noexcept {
-    const auto redirection = new (std::nothrow) Redirection{stream, target};
-    if (redirection == nullptr) return;
-    const HANDLE thread = CreateThread(nullptr, 0, Redirect, redirection, 0, nullptr);
-    if (thread == nullptr || AwaitOrGiveUp(thread, redirection)) {
-        delete redirection;
-    } else {
-        KeepLoaded();
-    }
-    if (thread != nullptr) CloseHandle(thread);
+bool RedirectStream(std::FILE* stream, int target) noexcept {
+    if (!OwnWithinLimit(stream)) return false;
+    const bool is_moved = Move(stream, target);
+    UnlockStream(stream);
+    return is_moved;
 }

@@ -7,12 +7,12 @@
 // Whether the stream has no file.
 bool IsClosed(std::FILE* stream) noexcept;
 
-// Copies `target` over `stream`, so that both have one file, or connects `stream` to the null device if `target` is
-// null. Makes `stream` unbuffered. Pending output is written to the file that it used before; buffered input is
-// dropped.
+// Points `stream` at the open file of the descriptor `target` and makes it unbuffered. Pending output is written to the
+// file that the stream used before; buffered input is dropped.
 //
-// Waits a bounded time. Output that the old file does not accept within a second is lost. If another thread holds
-// the stream's lock for that long, `stream` stays as it is. Requires: `stream` is not closed.
-void RedirectStream(std::FILE* stream, const std::FILE* target) noexcept;
+// Waits a bounded time. Output that a full pipe does not accept within a second is lost. Returns false if another
+// thread holds the stream's lock for a tenth of a second; `stream` stays as it is. A stream that the calling thread
+// has locked counts as such if it is among the first 20 of msvcrt. Requires: `stream` is not closed.
+bool RedirectStream(std::FILE* stream, int target) noexcept;
 
 #endif

@@ -1,0 +1,70 @@
+// What the C runtime keeps of a stream. Neither runtime has calls for it, and both have kept its form since their first
+// release: programs for msvcrt contain macros over the fields and calls that acquire the lock, and the UCRT is one
+// file for all of them.
+#ifndef ZANBASE_PLATFORM_WINDOWS_RUNTIME_STREAM_H
+#define ZANBASE_PLATFORM_WINDOWS_RUNTIME_STREAM_H
+
+#include <cstdio>
+
+#include "platform/windows/system.h"
+
+#ifdef _UCRT
+struct StreamFields {
+    char* _ptr;
+    char* _base;
+    int _cnt;
+    int _flag;
+    int _file;
+    int _charbuf;
+    int _bufsiz;
+    char* _tmpfname;
+};
+#else
+using StreamFields = std::FILE;
+#endif
+
+struct RuntimeStream {
+    StreamFields fields;    // guarded by lock
+    CRITICAL_SECTION lock;  // only if HasOwnLock
+};
+
+inline RuntimeStream* In(std::FILE* stream) noexcept { return reinterpret_cast<RuntimeStream*>(stream); }
+
+#ifndef _UCRT
+// msvcrt's entry for a descriptor. It exports the table, in blocks of 32.
+struct RuntimeDescriptor {
+    HANDLE handle;
+    char flags[4];
+    int is_lock_made;
+    CRITICAL_SECTION lock;  // owned by a thread that reads or writes
+};
+extern "C" __declspec(dllimport) RuntimeDescriptor* __pioinfo[];
+#endif
+
+// False for the first 20 streams of msvcrt, the standard ones among them: their locks are in a table that it does not
+// export.
+inline bool HasOwnLock(std::FILE* stream) noexcept {
+#ifdef _UCRT
+    return stream != nullptr;
+#else
+    constexpr int kStreamsInTable = 20;
+    return stream < stdin || stream >= stdin + kStreamsInTable;
+#endif
+}
+
+// Whether a thread is inside a read or a write of the descriptor, or waits in one. The UCRT does not show it.
+inline bool IsInTransfer([[maybe_unused]] int descriptor) noexcept {
+#ifdef _UCRT
+    return false;
+#else
+    constexpr int kBlock = 32;
+    if (descriptor < 0) return false;
+    RuntimeDescriptor& entry = __pioinfo[descriptor / kBlock][descriptor % kBlock];
+    if (entry.is_lock_made == 0) return false;
+    if (TryEnterCriticalSection(&entry.lock) == 0) return true;
+    LeaveCriticalSection(&entry.lock);
+    return false;
+#endif
+}
+
+#endif
