@@ -31,4 +31,7 @@ std::string ShortSourcePath(const std::string& path) {
     return source == std::string::npos ? path : path.substr(source + 1);
 }
 
-void WriteText(std::FILE* stream, const std::string& text) { std::fprintf(stream, "%s", text.c_str()); }
+void WriteText(std::FILE* stream, const std::string& text) {
+    // Not fprintf, which on Windows writes an unbuffered stream byte by byte.
+    std::fwrite(text.data(), 1, text.size(), stream);
+}
