@@ -54,9 +54,9 @@ struct Counts {
 
 std::atomic<unsigned long long> unreadable{0};
 
-void TellUnreadable(const fs::path& path) {
+void TellUnreadable(const std::string& path) {
     ++unreadable;
-    std::fprintf(stderr, "treescan: cannot read %s\n", path.string().c_str());
+    std::fprintf(stderr, "treescan: cannot read %s\n", path.c_str());
 }
 
 // Collects the regular files below `dir` into `files`; symbolic links are not followed.
@@ -65,16 +65,16 @@ void Walk(const fs::path& dir, Files& files) {
     for (fs::directory_iterator entry(dir, error), end; !error && entry != end; entry.increment(error)) {
         const fs::file_status status = entry->symlink_status(error);
         if (error) {
-            TellUnreadable(entry->path());
+            TellUnreadable(entry->path().u8string());
             error.clear();
         } else if (fs::is_directory(status)) {
             Walk(entry->path(), files);
         } else if (fs::is_regular_file(status)) {
-            const std::string path = entry->path().string();
+            const std::string path = entry->path().u8string();  // as recorded files take names
             files.push_back(HMakeTracked<File>(HCallSite::Here(), Text(path.c_str(), HCallSite::Here())));
         }
     }
-    if (error) TellUnreadable(dir);
+    if (error) TellUnreadable(dir.u8string());
 }
 
 unsigned long long CountLines(const char* text, std::size_t size) {
@@ -134,7 +134,7 @@ void PrintExtension(const std::string& extension, const Counts& counts) {
 // reports the largest comes last.
 void PrintExtensions(const Files& files, std::size_t top) {
     std::map<std::string, Counts> table;
-    for (const auto& file : files) table[fs::path(file->path.c_str()).extension().string()].Add(*file);
+    for (const auto& file : files) table[fs::u8path(file->path.c_str()).extension().u8string()].Add(*file);
     std::vector<std::pair<std::string, Counts>> rows(table.begin(), table.end());
     std::stable_sort(rows.begin(), rows.end(), [](const auto& one, const auto& other) {
         return one.second.bytes < other.second.bytes;

@@ -40,7 +40,6 @@ with_wine() (
 
 # TESTS|REASON: tests (an expression for ctest) that are left out. Others say by themselves that they skip.
 windows_skips="\
-RecordedFile\.TellsFailures.*|a full device, and the errors of a folder, are the other system's
 examples/adapters_operator_new|the DLL of the C++ library does not see operators that a program replaces"
 
 # Also to list tests runs their programs, which starts a server of its own where none is.

@@ -1,14 +1,17 @@
 // The platform contracts in the words of their headers. Names no system and includes nothing of the layers above, so
 // every back end runs this file; docs/porting.md lists which test holds which sentence.
+#include <fcntl.h>
 #include <gtest/gtest.h>
 
 #include <atomic>
 #include <chrono>
 #include <clocale>
+#include <string>
 #include <thread>
 
 #include "platform/clock.h"
 #include "platform/condition.h"
+#include "platform/file.h"
 #include "platform/guard.h"
 #include "platform/lock.h"
 #include "platform/messages.h"
@@ -259,6 +262,20 @@ TEST(PlatformClock, NeverEndsAPauseEarly) {
     const auto start = std::chrono::steady_clock::now();
     SleepFor(20);
     EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(20));
+}
+
+TEST(PlatformFile, KeepsPositionsBeyond4GiB) {
+    constexpr long long kFar = 5LL << 30;
+    const std::string name = testing::TempDir() + "platform_file";
+    const int file = OpenDescriptor(name.c_str(), O_RDWR | O_CREAT, 0666, false);
+    EXPECT_EQ(WriteDescriptorTwo(file, "ab", 2, "c", 1), 3);
+    EXPECT_EQ(SeekDescriptor(file, kFar, SEEK_SET), kFar);
+    EXPECT_EQ(SeekDescriptor(file, 0, SEEK_CUR), kFar);
+    EXPECT_EQ(CloseDescriptor(file), 0);
+    std::FILE* const stream = OpenStream(name.c_str(), "rb");
+    EXPECT_EQ(SeekStream(stream, kFar, SEEK_CUR), kFar);
+    std::fclose(stream);
+    std::remove(name.c_str());
 }
 
 TEST(PlatformProcessors, AreNoFewerThanTheirCores) {

@@ -3,6 +3,7 @@ set(ZANBASE_PLATFORM_SOURCES
     clock.cpp
     condition.cpp
     console.cpp
+    file.cpp
     fork.cpp
     futex.cpp
     guard.cpp

@@ -3,6 +3,7 @@ set(ZANBASE_PLATFORM_SOURCES
     clock.cpp
     condition.cpp
     console.cpp
+    file.cpp
     fork.cpp
     guard.cpp
     lock.cpp
@@ -14,7 +15,8 @@ set(ZANBASE_PLATFORM_SOURCES
     stream.cpp
     thread.cpp
     thread_block.cpp
-    thread_self.cpp)
+    thread_self.cpp
+    wide_name.cpp)
 
 find_package(Intl REQUIRED)
 set_property(TARGET Intl::Intl PROPERTY IMPORTED_GLOBAL TRUE)  # for the tests too

@@ -1,0 +1,91 @@
+// Recorded files where Linux loses, refuses or cuts what was to be written: limits, pipes, full devices.
+#include <gtest/gtest.h>
+#include <signal.h>
+#include <sys/resource.h>
+#include <unistd.h>
+
+#include <string>
+#include <vector>
+
+#include "zanbase/adapters/recorded_file.h"
+
+namespace {
+
+template <class File>
+void ExpectFailuresTold(typename File::Mode read, typename File::Mode write) {
+    std::error_code error;
+    File missing = File::Open("/no/such/file", read, error);
+    EXPECT_EQ(error, std::errc::no_such_file_or_directory);
+    EXPECT_EQ(missing.Seek(0, SEEK_SET, error), -1);
+    EXPECT_EQ(error, std::errc::bad_file_descriptor);
+    EXPECT_THROW(missing.Write("text"), std::system_error);
+    File directory = File::Open("/", read, error);
+    char byte;
+    EXPECT_EQ(directory.Read(&byte, 1, error), 0U);
+    EXPECT_EQ(error, std::errc::is_a_directory);
+    File full = File::Open("/dev/full", write, error);
+    const std::vector<char> block(100000);
+    full.Write(block.data(), block.size(), error);
+    EXPECT_EQ(error, std::errc::no_space_on_device);
+    unsigned int writes = 1;
+    EXPECT_TRUE(HDiskIOAccessFileData("/dev/full", nullptr, nullptr, nullptr, nullptr, &writes, nullptr));
+    EXPECT_EQ(writes, 0U);
+    EXPECT_FALSE(
+        HDiskIOAccessFileData("/no/such/file", nullptr, nullptr, nullptr, nullptr, nullptr, nullptr));
+    HDiskIOReset();
+}
+
+TEST(RecordedFile, TellsFailuresAndRecordsNone) {
+    ExpectFailuresTold<HRecordedFile>("r", "w");
+    ExpectFailuresTold<HRecordedDescriptor>({}, {O_WRONLY});
+}
+
+// No file of the process can be longer than `bytes` in the scope.
+class FileSizeLimit {
+public:
+    explicit FileSizeLimit(rlim_t bytes) {
+        signal(SIGXFSZ, SIG_IGN);
+        getrlimit(RLIMIT_FSIZE, &moBefore);
+        const rlimit limit{bytes, moBefore.rlim_max};
+        setrlimit(RLIMIT_FSIZE, &limit);
+    }
+    ~FileSizeLimit() { setrlimit(RLIMIT_FSIZE, &moBefore); }
+
+private:
+    rlimit moBefore{};
+};
+
+TEST(RecordedFile, KeepsTheErrorOfALostBufferUntilItIsCleared) {
+    const std::string name = testing::TempDir() + "limited";
+    HRecordedFile file = HRecordedFile::Open(name, "wb");
+    const std::string text(100000, 'x');
+    std::error_code error;
+    {
+        const FileSizeLimit limit(27616);
+        EXPECT_EQ(file.Write(text, error), 27616U);
+        EXPECT_EQ(error, std::errc::file_too_large);
+    }
+    EXPECT_EQ(file.Write("more", error), 0U);
+    EXPECT_EQ(error, std::errc::file_too_large);
+    EXPECT_NE(std::ferror(file.GetNative()), 0);
+    file.ClearError();
+    EXPECT_EQ(file.Seek(0, SEEK_CUR), 27616);
+    {
+        const FileSizeLimit limit(30000);
+        file.Write(std::string(3000, 'y'));  // fits into the buffer of the C library, and not into the file
+        file.Close(error);
+        EXPECT_EQ(error, std::errc::file_too_large);
+    }
+    unlink(name.c_str());
+}
+
+TEST(RecordedFile, IsNotInheritedUnlessAskedFor) {
+    const HRecordedDescriptor own = HRecordedDescriptor::Open("/", {});
+    const HRecordedDescriptor inherited = HRecordedDescriptor::Open("/", {O_RDONLY, 0, true});
+    const HRecordedFile stream = HRecordedFile::Open("/dev/null", "rb+");
+    EXPECT_EQ(fcntl(own.GetNative(), F_GETFD), FD_CLOEXEC);
+    EXPECT_EQ(fcntl(inherited.GetNative(), F_GETFD), 0);
+    EXPECT_EQ(fcntl(fileno(stream.GetNative()), F_GETFD), FD_CLOEXEC);
+}
+
+}  // namespace
