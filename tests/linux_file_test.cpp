@@ -4,10 +4,12 @@
 #include <sys/resource.h>
 #include <unistd.h>
 
+#include <istream>
+#include <ostream>
 #include <string>
 #include <vector>
 
-#include "zanbase/adapters/recorded_file.h"
+#include "zanbase/adapters/recorded_stream.h"
 
 namespace {
 
@@ -86,6 +88,49 @@ TEST(RecordedFile, IsNotInheritedUnlessAskedFor) {
     EXPECT_EQ(fcntl(own.GetNative(), F_GETFD), FD_CLOEXEC);
     EXPECT_EQ(fcntl(inherited.GetNative(), F_GETFD), 0);
     EXPECT_EQ(fcntl(fileno(stream.GetNative()), F_GETFD), FD_CLOEXEC);
+}
+
+// A pipe whose ends don't wait.
+struct Pipe {
+    Pipe() {
+        int ends[2];
+        EXPECT_EQ(pipe2(ends, O_NONBLOCK), 0);
+        moIn = HRecordedDescriptor::Adopt(ends[0], "pipe");
+        moOut = HRecordedDescriptor::Adopt(ends[1], "pipe");
+    }
+    HRecordedDescriptor moIn, moOut;
+};
+
+TEST(RecordedStream, LosesNothingByWhatAPipeRefuses) {
+    Pipe pipe;
+    pipe.moOut.Write("text");
+    HRecordedStreambuf buffer(std::move(pipe.moIn));
+    std::istream stream(&buffer);
+    EXPECT_EQ(stream.tellg(), -1);
+    EXPECT_EQ(buffer.GetRefusal(), std::errc::invalid_seek);
+    EXPECT_EQ(buffer.sbumpc(), 't');
+    EXPECT_EQ(buffer.sungetc(), 't');
+    EXPECT_EQ(buffer.sungetc(), EOF);
+    EXPECT_EQ(buffer.sbumpc(), 't');
+    EXPECT_TRUE(buffer.Close());
+}
+
+TEST(RecordedStream, WritesLaterWhatAFullPipeDidNotTake) {
+    Pipe pipe;
+    HRecordedStreambuf buffer(std::move(pipe.moOut));
+    std::ostream stream(&buffer);
+    stream << std::string(60000, 'a') << std::flush << std::string(20000, 'b');
+    EXPECT_FALSE(stream.flush().good());  // the pipe holds 65536 or less
+    EXPECT_EQ(buffer.GetError(), std::errc::resource_unavailable_try_again);
+    std::string read(100000, ' ');
+    std::size_t size = pipe.moIn.Read(read.data(), read.size());
+    EXPECT_LT(size, 80000U);
+    buffer.ClearError();
+    stream.clear();
+    stream << 'c';
+    EXPECT_TRUE(buffer.Close());
+    size += pipe.moIn.Read(read.data() + size, read.size() - size);
+    EXPECT_EQ(read.substr(0, size), std::string(60000, 'a') + std::string(20000, 'b') + 'c');
 }
 
 }  // namespace

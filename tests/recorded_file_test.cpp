@@ -1,10 +1,14 @@
-// Recorded files: what they record, and what they report when the layer below fails.
+// Recorded files and streams: what they record, what they report when the layer below fails, and that a stream does what
+// the standard's does.
 #include <gtest/gtest.h>
 
 #include <filesystem>
+#include <fstream>
+#include <random>
+#include <sstream>
 #include <vector>
 
-#include "zanbase/adapters/recorded_file.h"
+#include "zanbase/adapters/recorded_stream.h"
 #include "zanbase/snapshot.h"
 
 namespace {
@@ -114,6 +118,85 @@ TEST(RecordedFile, AdoptsAndReleasesAnOpenFile) {
     std::remove(name.c_str());
     EXPECT_EQ(FileNamed("under this name").moWrite.mnBytes, 4);
     EXPECT_EQ(FileNamed("under this name").moClose.mnCount, 0);
+}
+
+// One of a stream buffer's operations, with random arguments; what it gave, and what it read.
+std::string Operate(std::streambuf& buffer, std::minstd_rand& random, int operation) {
+    const auto below = [&](unsigned int limit) { return static_cast<std::streamoff>(random() % limit); };
+    static constexpr unsigned int kLimits[] = {1, 10, 1000, 9000, 70000, 150000};
+    std::string block(static_cast<std::size_t>(1 + below(kLimits[below(6)])),
+                      static_cast<char>('a' + below(26)));
+    const auto size = static_cast<std::streamsize>(block.size());
+    switch (operation) {
+        case 0:
+            return std::to_string(buffer.sgetc());
+        case 1:
+            return std::to_string(buffer.sgetn(block.data(), size)) + block;
+        case 2:
+            return std::to_string(buffer.sputn(block.data(), size));
+        case 3:
+            return std::to_string(buffer.sputc('-'));
+        case 4:
+            return std::to_string(buffer.pubseekpos(below(300000)));
+        case 5:
+            return std::to_string(buffer.pubseekoff(below(10000) - 5000, std::ios_base::cur));
+        case 6:
+            return std::to_string(buffer.pubseekoff(-below(1000), std::ios_base::end));
+        case 7:
+            return std::to_string(buffer.pubseekoff(0, std::ios_base::cur));
+        case 8:
+            return std::to_string(buffer.sbumpc());
+        default:
+            return std::to_string(buffer.sbumpc() == EOF || buffer.sungetc() != EOF);
+    }
+}
+
+std::string Content(const std::string& name) {
+    std::ostringstream text;
+    text << std::ifstream(name, std::ios_base::binary).rdbuf();
+    return text.str();
+}
+
+TEST(RecordedStream, DoesWhatTheStandardsDoes) {
+    const std::string names[] = {testing::TempDir() + "standard", testing::TempDir() + "recorded"};
+    for (const std::string& name : names)
+        std::ofstream(name, std::ios_base::binary) << std::string(100000, '.');
+    std::filebuf standard;
+    standard.open(names[0], std::ios_base::in | std::ios_base::out | std::ios_base::binary);
+    HRecordedStreambuf recorded(HRecordedDescriptor::Open(names[1], {O_RDWR}));
+    std::minstd_rand random;
+    for (int count = 0; count < 5000; ++count) {
+        const int operation = static_cast<int>(random() % 10);
+        std::minstd_rand same = random;
+        const std::string expected = Operate(standard, random, operation);
+        ASSERT_EQ(Operate(recorded, same, operation), expected)
+            << "operation " << operation << ", number " << count;
+    }
+    standard.close();
+    EXPECT_TRUE(recorded.Close());
+    EXPECT_TRUE(Content(names[0]) == Content(names[1]));
+    for (const std::string& name : names) std::remove(name.c_str());
+    EXPECT_EQ(FileNamed(names[1]).moClose.mnCount, 1);
+}
+
+TEST(RecordedStream, ReadsTheFilesByteWhereAnotherWasPutBack) {
+    const std::string name = testing::TempDir() + "put_back";
+    std::ofstream(name, std::ios_base::binary) << "abc";
+    HRecordedStreambuf buffer(HRecordedDescriptor::Open(name, {}));
+    EXPECT_EQ(buffer.sbumpc(), 'a');
+    EXPECT_EQ(buffer.sputbackc('x'), 'x');
+    EXPECT_EQ(buffer.sgetc(), 'x');
+    EXPECT_EQ(buffer.pubseekpos(0), 0);
+    EXPECT_EQ(buffer.sgetc(), 'a');
+    std::remove(name.c_str());
+}
+
+TEST(RecordedStream, SetsBadbitWhereAFileCanNotBeRead) {
+    HRecordedStreambuf closed((HRecordedDescriptor()));
+    std::istream stream(&closed);
+    EXPECT_EQ(stream.get(), EOF);
+    EXPECT_TRUE(stream.bad());
+    EXPECT_EQ(closed.GetError(), std::errc::bad_file_descriptor);
 }
 
 }  // namespace
