@@ -5,9 +5,11 @@
 #include <gtest/gtest.h>
 
 #include <iostream>
+#include <thread>
 
 #include "platform/clock.h"
 #include "support/run_in_child.h"
+#include "timing/row_table.h"
 #include "zanbase/openmp.h"
 
 static thread_local long long now_ms = 0;
@@ -50,6 +52,25 @@ TEST(GlobalTimer, OrdersTimersByTotalAndReportsAgainAtExit) {
     EXPECT_EQ(output,
               "never: 0\none: 1\ntwo: 2\nthree: 3\none: 1.23457e+09\n"
               "never: 0\none: 1\ntwo: 2\nthree: 3\none: 1.23457e+09\n");
+}
+
+TEST(GlobalTimer, OrdersTimersWhoseSecondsAreEqual) {
+    const std::string output = OutputOf([] {
+        for (const char* const name : {"more", "less"}) Timers().RegisterNewTimer(name);
+        Spend(0, 18446744073709004);
+        Spend(1, 18446744073709002);
+    });
+    EXPECT_EQ(output, "less: 1.84467e+13\nmore: 1.84467e+13\n");
+}
+
+// The mutex stays held, as by a thread that was killed while it added rows.
+TEST(GlobalTimer, NeedsItsMutexForNewRowsOnly) {
+    const std::string output = OutputOf([] {
+        std::thread([] { goTimerGrowthMutex.Lock(); }).join();
+        Spend(Timers().RegisterNewTimer("timer"), 1000);
+        Timers().ResetAll();
+    });
+    EXPECT_EQ(output, "timer: 0\n");
 }
 
 TEST(GlobalTimer, ContinuesAnOpenIntervalOverAReport) {

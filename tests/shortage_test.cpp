@@ -105,10 +105,12 @@ bool RunShort(const Operation& operation, int number) {
     return allocations_left.exchange(-1) < 0;
 }
 
+// Adds one row: rows that were made before the failure stay, as room for the next attempt.
 void ToggleInTeam() {
+    static const int new_row = OMPGetMaxThreads();
     std::exception_ptr failure;
-#pragma omp parallel num_threads(7)
-    if (OMPGetThreadNum() == 6) {
+#pragma omp parallel num_threads(new_row + 1)
+    if (OMPGetThreadNum() == new_row) {
         try {
             GlobalTimer::GetInstance().Toggle(timer);
         } catch (...) {

@@ -34,6 +34,8 @@ struct GlobalTimerSnapshot;
 /// registered after the first `GetInstance`. On Windows the report comes when the system detaches the DLL from the
 /// ending process: after the exit handlers and static objects of the program, with no other thread left. The DLL stays
 /// loaded until then, also after `FreeLibrary`.
+/// The report acquires no lock of this library: a thread that was killed inside `RegisterNewTimer` or `Toggle` does
+/// not block the exit.
 ///
 /// **Thread numbers.** Threads with the same OpenMP number share slots and must toggle one after the other.
 /// Outside parallel regions every thread has number 0, and nested teams number theirs from 0 again. In a process
@@ -52,7 +54,8 @@ public:
 
     /// Adds a timer and returns its identifier; identifiers count up from 0. Names need not differ: each
     /// registration is a timer of its own. `std::bad_alloc` leaves the timers as they were. Thread-safe, also
-    /// while other threads register and toggle. Requires: no `Report` and no `ResetAll` is in progress.
+    /// while other threads register and toggle; acquires no lock. Requires: no `Report` and no `ResetAll` is in
+    /// progress.
     unsigned long long RegisterNewTimer(std::string name);
 
     /// Starts timer `id` on the calling thread's number if it is stopped there; otherwise stops it and adds
@@ -61,7 +64,7 @@ public:
     ///
     /// Thread-safe for threads with different OpenMP numbers. No lock is acquired, no memory allocated and no
     /// shared word written, except once for a number at or above `OMPGetMaxThreads()` as it was when the
-    /// instance was created. There `std::bad_alloc` leaves the timers as they were.
+    /// instance was created. There a mutex is acquired, and `std::bad_alloc` leaves the timers as they were.
     void Toggle(unsigned long long id);
 
     /// Prints a line "name: seconds" for each timer on `std::cout`, in the number format of the stream, from

@@ -1,80 +1,129 @@
-// Rows of slots, one row for each thread: the address of a slot never changes, so threads can use their slots
-// while the table grows.
+// Rows of slots, one row for each thread number. Slots are added while other threads use theirs: no slot ever
+// moves, and nothing but the addition of rows needs a lock.
 //
-//   mpoTable -> newest table -> segments of row 0, segments of row 1, …   (each a block of kSegmentSlots slots;
-//                                                                          older tables have the same segments)
+//   GrowingArray:  maSegments[0] -> kFirst items;  [1] -> 2 kFirst items;  [2] -> 4 kFirst items;  …
+//   RowTable:      moRows, a GrowingArray of rows; each row is a GrowingArray of slots
 //
+// - A segment pointer changes once, from null to its segment. Doubling segments keep their number small and
+//   waste at most half of the memory.
 // - A slot is written by the thread of its row, or with exclusive access to the table.
-// - A table is not changed once mpoTable points at it. Growth replaces it by a larger one and keeps the older
-//   ones, because a thread may still be reading them.
-// - A segment fills whole pairs of cache lines, because processors fetch lines in pairs. So rows share none.
+// - Slots are made before they are used, so that a thread that uses its own allocates nothing. The exception is a
+//   slot added while another thread adds rows: either may miss the other's part, so At makes what is missing.
 #ifndef ZANBASE_TIMING_ROW_TABLE_H
 #define ZANBASE_TIMING_ROW_TABLE_H
 
-#include <algorithm>
 #include <array>
 #include <atomic>
 #include <cstddef>
-#include <deque>
 #include <memory>
-#include <vector>
 
 #include "zanbase/mutex.h"
 
-// Held while rows or timers are added.
+// Held while rows are added, and for nothing else.
 extern HMutex& goTimerGrowthMutex;  // built in load_time.cpp, never destroyed
+
+// An array whose items are made on demand, by any thread, and keep their address. Requires: kFirst is a multiple of
+// the items of a Line.
+template <class Item, std::size_t kFirst>
+class GrowingArray {
+public:
+    GrowingArray() = default;
+    ~GrowingArray() {
+        for (std::atomic<Line*>& segment : maSegments) delete[] segment.load(std::memory_order_relaxed);
+    }
+    GrowingArray(const GrowingArray&) = delete;
+    GrowingArray& operator=(const GrowingArray&) = delete;
+
+    // Null if the item was not made yet. Thread-safe.
+    Item* Find(std::size_t index) const {
+        const Place place = PlaceOf(index);
+        // Pairs with the exchange in MakeSegment.
+        Line* const lines = maSegments[place.segment].load(std::memory_order_acquire);
+        return lines != nullptr ? &ItemOf(lines, place) : nullptr;
+    }
+
+    // Makes the item if it is missing. Thread-safe. std::bad_alloc leaves the array as it was.
+    Item& At(std::size_t index) {
+        const Place place = PlaceOf(index);
+        Line* lines = maSegments[place.segment].load(std::memory_order_acquire);
+        if (__builtin_expect(lines == nullptr, 0)) lines = MakeSegment(place.segment);
+        return ItemOf(lines, place);
+    }
+
+private:
+    static constexpr std::size_t kLineItems = 16;
+    static constexpr std::size_t kSegments = 32;
+    static_assert(kFirst % kLineItems == 0);
+
+    // Whole pairs of cache lines, because processors fetch lines in pairs. So arrays share none.
+    struct alignas(128) Line {
+        std::array<Item, kLineItems> maItems;
+    };
+
+    struct Place {
+        std::size_t segment;
+        std::size_t item;  // within the segment
+    };
+
+    // In units of kFirst items, segment k holds the units 2^k - 1 to 2^(k+1) - 2.
+    static Place PlaceOf(std::size_t index) {
+        const unsigned long long unit = index / kFirst + 1;
+        const auto segment = static_cast<std::size_t>(63 - __builtin_clzll(unit));
+        return {segment, index - kFirst * ((std::size_t{1} << segment) - 1)};
+    }
+
+    static Item& ItemOf(Line* lines, Place place) {
+        return lines[place.item / kLineItems].maItems[place.item % kLineItems];
+    }
+
+    // Of two threads that make the same segment, one deletes its own.
+    __attribute__((noinline)) Line* MakeSegment(std::size_t segment) {
+        std::unique_ptr<Line[]> lines(new Line[(kFirst << segment) / kLineItems]);
+        Line* other = nullptr;
+        // Release: a thread that finds the segment finds its items made. Acquire for the other thread's.
+        if (!maSegments[segment].compare_exchange_strong(other, lines.get(), std::memory_order_acq_rel))
+            return other;
+        return lines.release();
+    }
+
+    std::array<std::atomic<Line*>, kSegments> maSegments{};
+};
 
 // An operation that throws std::bad_alloc has no visible effect.
 template <class Slot>
 class RowTable {
 public:
-    explicit RowTable(std::size_t rows) : maTables(1), mpoTable(&maTables.front()) { GrowTo(rows, 0); }
+    explicit RowTable(std::size_t rows) { AddRows(rows, 0); }
 
-    // Any thread.
-    std::size_t RowCount() const { return Newest().mnRows; }
+    // Pairs with the store in AddRows. Thread-safe.
+    std::size_t RowCount() const { return mnRows.load(std::memory_order_acquire); }
 
-    // Requires: the call of GrowTo that made the slot happens-before this one.
-    Slot& At(std::size_t row, std::size_t slot) const {
-        const Table& table = Newest();
-        const auto& segment = table.maSegments[row * table.mnRowSegments + slot / kSegmentSlots];
-        return segment->maSlots[slot % kSegmentSlots];
+    // Null if the slot was not made yet. Thread-safe. Requires: `row` is below RowCount().
+    Slot* Find(std::size_t row, std::size_t slot) const { return moRows.Find(row)->Find(slot); }
+
+    // Makes the slot if it is missing. Thread-safe. Requires: `row` is below RowCount().
+    Slot& At(std::size_t row, std::size_t slot) { return moRows.Find(row)->At(slot); }
+
+    // Makes the slot of every row. Thread-safe.
+    void AddSlot(std::size_t slot) {
+        for (std::size_t row = 0; row < RowCount(); ++row) At(row, slot);
     }
 
-    // Adds slots until there are at least `rows` rows of at least `slots` slots. Other threads may use their
-    // rows meanwhile. Requires: one thread at a time calls this.
-    void GrowTo(std::size_t rows, std::size_t slots) {
-        const Table& old = Newest();
-        const std::size_t row_segments = (slots + kSegmentSlots - 1) / kSegmentSlots;
-        if (rows <= old.mnRows && row_segments <= old.mnRowSegments) return;
-        Table larger{std::max(rows, old.mnRows), std::max(row_segments, old.mnRowSegments), {}};
-        for (std::size_t row = 0; row < larger.mnRows; ++row) {
-            for (std::size_t index = 0; index < larger.mnRowSegments; ++index) {
-                const bool is_old = row < old.mnRows && index < old.mnRowSegments;
-                larger.maSegments.push_back(is_old ? old.maSegments[row * old.mnRowSegments + index]
-                                                   : std::make_shared<Segment>());
-            }
+    // Adds rows, with slots 0 to `slots` - 1 in each, until there are `rows`. Requires: one thread at a time.
+    void AddRows(std::size_t rows, std::size_t slots) {
+        for (std::size_t row = RowCount(); row < rows; ++row) {
+            auto& new_row = moRows.At(row);
+            for (std::size_t slot = 0; slot < slots; slot += kFirstSlots) new_row.At(slot);
         }
-        maTables.push_back(std::move(larger));
-        mpoTable.store(&maTables.back(), std::memory_order_release);
+        if (rows > RowCount()) mnRows.store(rows, std::memory_order_release);
     }
 
 private:
-    static constexpr std::size_t kSegmentSlots = 64;
+    static constexpr std::size_t kFirstSlots = 64;
+    static constexpr std::size_t kFirstRows = 16;
 
-    struct alignas(128) Segment {
-        std::array<Slot, kSegmentSlots> maSlots;
-    };
-
-    struct Table {
-        std::size_t mnRows = 0;
-        std::size_t mnRowSegments = 0;  // segments of each row
-        std::vector<std::shared_ptr<Segment>> maSegments;
-    };
-
-    const Table& Newest() const { return *mpoTable.load(std::memory_order_acquire); }
-
-    std::deque<Table> maTables;          // accessed by GrowTo alone; push_back does not move the elements
-    std::atomic<const Table*> mpoTable;  // never null
+    GrowingArray<GrowingArray<Slot, kFirstSlots>, kFirstRows> moRows;
+    std::atomic<std::size_t> mnRows{0};
 };
 
 #endif
