@@ -44,6 +44,15 @@ TEST(MkString, CutsAFormatAt4095Characters) {
     EXPECT_EQ(MkString("%sy", full.c_str()), full);
 }
 
+// The C library's checks of a hardened build would end the process.
+TEST(MkString, CountsInAFormatThatIsInWritableMemory) {
+    std::string (*const make)(const char*, ...) = MkString;
+    char format[] = "abc%n%d";
+    int count = 0;
+    EXPECT_EQ(make(format, &count, 7), "abc7");
+    EXPECT_EQ(count, 3);
+}
+
 TEST(MkTokenString, SeparatesWhatFollowsTheFirstText) {
     const std::string full(4095, 'x');
     EXPECT_EQ(MkTokenString(static_cast<const char*>(nullptr), "a", nullptr), "");

@@ -19,8 +19,8 @@ constexpr std::size_t kLongestText = 64;  // limit of PrintDouble, PrintFloat an
 char gacDoubleText[80];
 char gacInt64Text[22];
 
-// A pointer has no format attribute: only the caller of the library knows the format.
-int (*const kPrint)(char*, std::size_t, const char*, ...) = std::snprintf;
+// A pointer has no format attribute: only the caller of the library knows the format. Volatile as in text_rules.cpp.
+int (*const volatile kPrint)(char*, std::size_t, const char*, ...) = std::snprintf;
 
 // Prints to `area` and returns the length of the text, 0 if the runtime fails.
 template <class Value>
@@ -97,8 +97,9 @@ const char* PrintInt64(long long value) noexcept {
     return WriteDecimal(value, terminator);
 }
 
-// One strtod gives the result of sscanf with "%lE" and, where that finds no number, of atof. They differ only
-// in the payload of a "nan(…)".
+// One strtod gives the result of sscanf with "%lE" and, where that finds no number, of atof. They differ in two
+// things: strtod stores the payload of a "nan(…)"; and it reads an incomplete "infinity", such as "infi", as
+// infinity, where those of the Windows runtime give 0.
 double ScanDouble(const char* field, int width) noexcept {
     constexpr int kLongestField = 63;
     char copy[kLongestField + 1];
