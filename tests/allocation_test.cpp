@@ -95,7 +95,7 @@ TEST(Allocator, EndsTheProcessIfAShortageLastsAndNoHandlerIsInstalled) {
 }
 
 TEST(Allocator, GivesTheBlocksItPromises) {
-    char text[] = "text";
+    static char text[20] = "text";
     char* copy = HString(text);
     text[0] = 'T';
     FailNext(2, Count);
@@ -105,6 +105,10 @@ TEST(Allocator, GivesTheBlocksItPromises) {
     EXPECT_EQ(HRealloc(copy, 0), nullptr);
     EXPECT_EQ(attempts, 1);
     EXPECT_EQ(handled, 0);
+    std::free(copy);
+    FailNext(1, [] { std::strcpy(text, "a longer text"); });
+    copy = HString(text);
+    EXPECT_STREQ(copy, "a longer text");
     std::free(copy);
     char* const empty = HString(nullptr);
     EXPECT_STREQ(empty, "");

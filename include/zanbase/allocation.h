@@ -36,7 +36,8 @@
 ZANBASE_API void* HRealloc(void* ptr, std::size_t size);
 
 /// Returns a copy of the zero-terminated `text` with its terminator, never null. A null `text` gives a block
-/// of 16 bytes that holds an empty text. Requires: `text` is shorter than 2^31 - 1 bytes. Thread-safe.
+/// of 16 bytes that holds an empty text. Each attempt measures `text` anew, so the handler may change it. Requires:
+/// `text` is shorter than 2^31 - 1 bytes. Thread-safe.
 [[nodiscard]] ZANBASE_API char* HString(const char* text);
 
 /// Calls the installed handler; does nothing if none is installed. Thread-safe.

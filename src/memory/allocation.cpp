@@ -67,6 +67,14 @@ std::size_t Product(std::size_t count, std::size_t size) {
     return size != 0 && count > SIZE_MAX / size ? SIZE_MAX : count * size;
 }
 
+// The size of a copy of `text` with its terminator, or of the block that stands for a null text.
+std::size_t StringBlockBytes(const char* text) {
+    constexpr std::size_t kEmptyBlockBytes = 16;
+    if (text == nullptr) return kEmptyBlockBytes;
+    const int length = static_cast<int>(std::strlen(text));
+    return static_cast<std::size_t>(length) + 1;
+}
+
 }  // namespace
 
 void* HMalloc(std::size_t size) {
@@ -87,20 +95,16 @@ void* HRealloc(void* ptr, std::size_t size) {
 }
 
 // Unlike the others it passes on a std::bad_alloc of the attempt, and reads the handler only at entry and
-// after each call of it.
+// after each call of it. Each attempt measures the text anew: the handler may have changed it.
 char* HString(const char* text) {
-    constexpr std::size_t kEmptyBlockBytes = 16;
-    const int length = text != nullptr ? static_cast<int>(std::strlen(text)) : 0;
-    const std::size_t size = text != nullptr ? static_cast<std::size_t>(length) + 1 : kEmptyBlockBytes;
     Handler handler = gpfnOutOfMemoryHandler.load();
     RetryPauses pauses;
     for (;;) {
+        const std::size_t size = StringBlockBytes(text);
         if (char* copy = static_cast<char*>(kMalloc(size))) {
-            if (text == nullptr) {
-                copy[0] = '\0';
-                return copy;
-            }
-            return static_cast<char*>(std::memcpy(copy, text, size));
+            if (text != nullptr) return static_cast<char*>(std::memcpy(copy, text, size));
+            copy[0] = '\0';
+            return copy;
         }
         if (handler != nullptr) {
             handler();
