@@ -33,7 +33,7 @@ T& BuildForever() {
 
 const HMutex* const gpoLastingMutex = &TrackerAccess::moMutex;
 HMutex HMemory::moMutex;
-HMutex& goDiskIOMutex = BuildForever<HMutex, 0>();
+const HMutex* const mpoDiskIOMutex = &BuildForever<HMutex, 0>();
 HMutex& goTimerGrowthMutex = BuildForever<HMutex, 1>();
 MessageCatalogue& goMessageCatalogue = BuildForever<MessageCatalogue>();
 NameRing& goNameRing = BuildForever<NameRing>();
@@ -43,7 +43,7 @@ namespace {
 // A fork owns the mutex of every table, so that the child can use them all. Lock order: as listed; no other
 // code owns two of them.
 std::array<const HMutex*, 5> TableMutexes() {
-    return {&TrackerAccess::moMutex, &goDiskIOMutex, &goTimerGrowthMutex,
+    return {&TrackerAccess::moMutex, mpoDiskIOMutex, &goTimerGrowthMutex,
             &goMessageCatalogue.moCatalogueMutex, &goNameRing.moRingMutex};
 }
 

@@ -24,7 +24,7 @@ struct Tracker : HMemory {
 // The other thread opens a file while it is inside, for which it needs a lock that fork() acquires too.
 TEST(Fork, WaitsUntilNoOtherThreadIsInsideATable) {
     const unsigned long long main_thread = HThread::GetCurrentThreadId();
-    const HMutex* const mutexes[] = {&Tracker::moMutex, &goDiskIOMutex, &goTimerGrowthMutex,
+    const HMutex* const mutexes[] = {&Tracker::moMutex, mpoDiskIOMutex, &goTimerGrowthMutex,
                                      &goMessageCatalogue.moCatalogueMutex, &goNameRing.moRingMutex};
     for (const HMutex* const mutex : mutexes) {
         std::atomic<bool> inside{false};

@@ -16,7 +16,9 @@
 /// caller measured them, of any sign, and are not checked. Counts wrap at 32 bits, byte sums at 64.
 ///
 /// **Threads.** All functions are thread-safe; one mutex makes each of them atomic. They may be called until
-/// the process has ended. A fork waits until no other thread is inside the ledger, so the child can use it.
+/// the process has ended. A fork waits until no other thread is inside the ledger, so the child can use it; after
+/// five seconds in one operation, which only a report or a killed thread takes, it waits no longer, and the child
+/// must not use the ledger.
 ///
 /// **Errors.** The first call creates the ledger's tables, which live as long as the process;
 /// `HDiskIOAccessFileData` and the reports never create them and treat missing tables as no files. No
@@ -79,21 +81,24 @@ ZANBASE_API void HDiskIOPop();
 ZANBASE_API void HDiskIOReset();
 
 /// Prints the counts, times and sizes of one file. Returns true if `name` has a record; otherwise returns
-/// false and prints nothing. Lines longer than 4095 characters are cut. The stream is not flushed. Requires:
-/// `stream` is open for writing, and its own write functions don't call `HDiskIOPush`, `HDiskIOPop` or
-/// `HDiskIOReset`.
+/// false, prints nothing and does not acquire the stream. All is one write; a line longer than 4095 characters is
+/// cut. The stream is neither checked nor flushed. Requires: `stream` is open for writing.
 ///
-/// Thread-safe, like the other reports. The calling thread owns the stream's lock (`flockfile`) and then the
-/// ledger's mutex until the report is written: no other output gets into it, recording waits, and a thread
-/// that owns the stream may record.
+/// Thread-safe, like the other reports. The calling thread owns the ledger's mutex and the stream's lock
+/// (`flockfile`) until the report is written: no other output gets into it, and recording waits. It waits for
+/// neither while it owns the other, so a thread that owns the stream may record.
+///
+/// A write function of the program's own, under the stream, may record, print and report on other streams. It
+/// must not wait for a thread that may wait for the ledger, such as a stream whose owner records here.
 ZANBASE_API bool HDiskIOReportFile(std::FILE* stream, const std::string& name);
 
-/// Prints a table of sums over all files, or nothing if there is no file. Thread-safe. Requirements and locks are
-/// those of `HDiskIOReportFile`.
+/// Prints a table of sums over all files in one write, or nothing if there is no file. Thread-safe. Requirements
+/// and locks are those of `HDiskIOReportFile`.
 ZANBASE_API void HDiskIOSummaryReport(std::FILE* stream);
 
 /// Prints every file that moved bytes as `HDiskIOReportFile` does, fewest bytes first, equal numbers in the
-/// order of the names; if no file moved bytes, one line says so. Prints nothing if there is no file.
+/// order of the names; if no file moved bytes, one line says so. Prints nothing if there is no file. The title and
+/// each file are one write each.
 /// Thread-safe. Requirements and locks are those of `HDiskIOReportFile`.
 ZANBASE_API void HDiskIOUsageReport(std::FILE* stream);
 

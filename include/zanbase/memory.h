@@ -41,7 +41,8 @@ class unordered_map;
 ///
 /// **Threads.** All operations are thread-safe; each holds one mutex from start to end. They may be called
 /// until the process has ended, also by detached threads and destructors of static objects. A fork waits
-/// until no other thread is inside the tracker, so the child can use it.
+/// until no other thread is inside the tracker, so the child can use it; after five seconds in one operation,
+/// which only a report or a killed thread takes, it waits no longer, and the child must not use the tracker.
 ///
 /// **Call sites.** A call site is the value of the file pointer and the line. The text is neither compared
 /// nor copied: the same text at two addresses makes two sites. Requires: the pointer is not null, and the
@@ -98,19 +99,24 @@ public:
     static void UsageReset();
 
     /// Prints a table of the live blocks on `stream`: a row for each call site, the one that holds most bytes
-    /// last, then the totals. Prints nothing if no block is live. The stream is not flushed. Requires:
-    /// `stream` is open for writing, and its own write functions don't call `Push`, `Pop`, `Reset` or
-    /// `UsageReset`. They may record in the disk ledger, unless `operator new` or the stream of a ledger's
-    /// report records here: with both, two threads can deadlock.
+    /// last, then the totals. Prints nothing if no block is live, and does not acquire the stream then. The
+    /// heading, each row and the totals are one write each. The stream is neither checked nor flushed.
+    /// Requires: `stream` is open for writing.
     ///
-    /// Thread-safe. The calling thread owns the stream's lock (`flockfile`) and then the tracker's mutex
-    /// until the table is written: no other output gets into it, `Alloc` and `Free` wait, and a thread that
-    /// owns the stream may call the tracker.
+    /// Thread-safe. The calling thread owns the tracker's mutex and the stream's lock (`flockfile`) until the
+    /// table is written: no other output gets into it, and `Alloc` and `Free` wait. It waits for neither while
+    /// it owns the other. So a thread that owns the stream may call the tracker; and one that owns `moMutex`
+    /// may print, open files and report. Doing both with one stream is a deadlock of the program's own.
+    ///
+    /// A write function of the program's own, under the stream, may call the tracker, print and report on other
+    /// streams. It must not wait for a thread that may wait for the tracker: for a stream whose owner records
+    /// here; or for the disk ledger, if `operator new` or the stream of a ledger's report records here.
     static void LeakReport(std::FILE* stream);
 
     /// Prints on `stream` what each call site allocated and freed, smallest first, then the totals in K and
     /// the peak. Prints nothing if the usage table is empty. Sites below 1/10240 of the total bytes are
-    /// printed as one sum. Thread-safe. Requirements and locks are those of `LeakReport`.
+    /// printed as one sum. The title, each site and the totals are one write each. Thread-safe. Requirements and
+    /// locks are those of `LeakReport`.
     static void UsageReport(std::FILE* stream);
 
     /// Does nothing: there is no state to copy.
@@ -147,7 +153,8 @@ protected:
                                         std::allocator<std::pair<void* const, MemoryBlock>>>;
 
     // For derived classes, with moMutex held. They may change the tables' contents, but must keep the
-    // pointers. The three tables are created together and never destroyed.
+    // pointers. The three tables are created together, by the first `Alloc` or before it by a derived class,
+    // and never destroyed.
     static FileMap* mpoFileMap;                     ///< usage of each site; null until the first `Alloc`
     static MemoryMap* mpoMemoryMap;                 ///< live blocks by address; null until then
     static std::list<MemoryState>* mpoMemoryStack;  ///< saved states, newest at the back; null until then

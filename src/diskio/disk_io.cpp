@@ -6,9 +6,9 @@
 
 #include "diskio/ledger.h"
 
-DiskIOFileMap* gpoDiskIOFileMap = nullptr;
-DiskIOHandleMap* gpoDiskIOHandleMap = nullptr;
-std::list<DiskIOState>* gpoDiskIOStack = nullptr;
+DiskIOFileMap* mpoDiskIOFileMap = nullptr;
+DiskIOHandleMap* mpoDiskIOHandleMap = nullptr;
+std::list<DiskIOState>* mpoDiskIOStack = nullptr;
 
 namespace {
 
@@ -16,33 +16,33 @@ namespace {
 void MakeTables() {
     auto file_map = std::make_unique<DiskIOFileMap>();
     auto handle_map = std::make_unique<DiskIOHandleMap>();
-    gpoDiskIOStack = new std::list<DiskIOState>;
-    gpoDiskIOFileMap = file_map.release();
-    gpoDiskIOHandleMap = handle_map.release();
+    mpoDiskIOStack = new std::list<DiskIOState>;
+    mpoDiskIOFileMap = file_map.release();
+    mpoDiskIOHandleMap = handle_map.release();
 }
 
 // Holds the ledger's mutex for a scope, in which the tables exist.
 class LedgerLock {
 public:
-    LedgerLock() : moLock(&goDiskIOMutex) {
-        if (gpoDiskIOFileMap == nullptr) MakeTables();
+    LedgerLock() : moLock(mpoDiskIOMutex) {
+        if (mpoDiskIOFileMap == nullptr) MakeTables();
     }
 
 private:
     const HMutexLock moLock;
 };
 
-// The next three require that goDiskIOMutex is held and the tables exist.
+// The next three require that mpoDiskIOMutex is held and the tables exist.
 
 DiskIOUsage* FindUsage(const std::string& name) {
-    const auto file = gpoDiskIOFileMap->find(name);
-    return file != gpoDiskIOFileMap->end() ? &file->second : nullptr;
+    const auto file = mpoDiskIOFileMap->find(name);
+    return file != mpoDiskIOFileMap->end() ? &file->second : nullptr;
 }
 
 // The record that an operation on `handle` is credited to, or null.
 DiskIOUsage* UsageOf(void* handle) {
-    const auto entry = gpoDiskIOHandleMap->find(handle);
-    if (entry == gpoDiskIOHandleMap->end()) return FindUsage({});
+    const auto entry = mpoDiskIOHandleMap->find(handle);
+    if (entry == mpoDiskIOHandleMap->end()) return FindUsage({});
     DiskIOBinding& binding = entry->second;
     if (binding.mpoUsage == nullptr) binding.mpoUsage = FindUsage(binding.moName);
     return binding.mpoUsage;
@@ -50,7 +50,7 @@ DiskIOUsage* UsageOf(void* handle) {
 
 // The name is copied before the call, so that a lack of memory leaves the handle as it was.
 DiskIOBinding& Bind(void* handle, std::string name) {
-    DiskIOBinding& binding = (*gpoDiskIOHandleMap)[handle];
+    DiskIOBinding& binding = (*mpoDiskIOHandleMap)[handle];
     binding.moName = std::move(name);
     binding.mpoUsage = nullptr;
     return binding;
@@ -66,7 +66,7 @@ void StoreIfWanted(Value* where, Value value) {
 void HDiskIOOpen(const std::string& name, void* handle, double seconds) {
     const LedgerLock lock;
     DiskIOBinding& binding = Bind(handle, name);
-    DiskIOUsage& usage = (*gpoDiskIOFileMap)[name];
+    DiskIOUsage& usage = (*mpoDiskIOFileMap)[name];
     binding.mpoUsage = &usage;
     usage.mdOpenTime += seconds;
     ++usage.mnOpenCount;
@@ -113,16 +113,16 @@ void _HDiskIOMapFD(const std::string& name, void* handle) {
 
 std::string HDiskIOGetFilename(void* handle) {
     const LedgerLock lock;
-    const auto entry = gpoDiskIOHandleMap->find(handle);
-    return entry != gpoDiskIOHandleMap->end() ? entry->second.moName : std::string();
+    const auto entry = mpoDiskIOHandleMap->find(handle);
+    return entry != mpoDiskIOHandleMap->end() ? entry->second.moName : std::string();
 }
 
 // NOLINTNEXTLINE(performance-unnecessary-value-param): by value in the published form
 bool HDiskIOAccessFileData(std::string name, double* readTime, unsigned int* readCount,
                            unsigned long long* readSize, double* writeTime, unsigned int* writeCount,
                            unsigned long long* writeSize) {
-    const HMutexLock lock(&goDiskIOMutex);
-    if (gpoDiskIOFileMap == nullptr) return false;
+    const HMutexLock lock(mpoDiskIOMutex);
+    if (mpoDiskIOFileMap == nullptr) return false;
     const DiskIOUsage* const usage = FindUsage(name);
     if (usage == nullptr) return false;
     StoreIfWanted(readTime, usage->mdReadTime);
@@ -137,7 +137,7 @@ bool HDiskIOAccessFileData(std::string name, double* readTime, unsigned int* rea
 void HDiskIOPush() {
     {
         const LedgerLock lock;
-        gpoDiskIOStack->push_back({*gpoDiskIOFileMap, *gpoDiskIOHandleMap});
+        mpoDiskIOStack->push_back({*mpoDiskIOFileMap, *mpoDiskIOHandleMap});
     }
     HDiskIOReset();
 }
@@ -145,15 +145,15 @@ void HDiskIOPush() {
 // The saved state is removed afterwards, so its tables are moved and not copied. This needs no memory.
 void HDiskIOPop() {
     const LedgerLock lock;
-    if (gpoDiskIOStack->empty()) return;
-    DiskIOState& saved = gpoDiskIOStack->back();
-    *gpoDiskIOFileMap = std::move(saved.moFileMap);
-    *gpoDiskIOHandleMap = std::move(saved.moHandleMap);
-    gpoDiskIOStack->pop_back();
+    if (mpoDiskIOStack->empty()) return;
+    DiskIOState& saved = mpoDiskIOStack->back();
+    *mpoDiskIOFileMap = std::move(saved.moFileMap);
+    *mpoDiskIOHandleMap = std::move(saved.moHandleMap);
+    mpoDiskIOStack->pop_back();
 }
 
 void HDiskIOReset() {
     const LedgerLock lock;
-    gpoDiskIOFileMap->clear();
-    gpoDiskIOHandleMap->clear();
+    mpoDiskIOFileMap->clear();
+    mpoDiskIOHandleMap->clear();
 }

@@ -100,14 +100,14 @@ std::string DiskIOSummaryText(const DiskIOFileMap& files) {
            "\n";
 }
 
-std::string DiskIOUsageText(const DiskIOFileMap& files) {
-    std::multimap<unsigned long long, const DiskIOFileMap::value_type*> by_size;
-    for (const auto& file : files) {
-        const unsigned long long moved = file.second.mnReadSize + file.second.mnWriteSize;
-        if (moved != 0) by_size.emplace(moved, &file);
+std::vector<std::string> DiskIOUsedFiles(const DiskIOFileMap& files) {
+    std::multimap<unsigned long long, const std::string*> by_size;
+    for (const auto& [name, usage] : files) {
+        const unsigned long long moved = usage.mnReadSize + usage.mnWriteSize;
+        if (moved != 0) by_size.emplace(moved, &name);
     }
-    std::string text = "Disk I/O Usage Report:\n\n";
-    if (by_size.empty()) text += "No disk I/O usage to report.\n\n";
-    for (const auto& [moved, file] : by_size) text += DiskIOFileText(file->first, file->second);
-    return text;
+    std::vector<std::string> names;
+    names.reserve(by_size.size());
+    for (const auto& [moved, name] : by_size) names.push_back(*name);
+    return names;
 }

@@ -1,8 +1,9 @@
-// Texts of the disk reports, as functions of what they show.
+// The disk reports, as functions of what they show.
 #ifndef ZANBASE_DISKIO_DISK_IO_REPORT_TEXT_H
 #define ZANBASE_DISKIO_DISK_IO_REPORT_TEXT_H
 
 #include <string>
+#include <vector>
 
 #include "diskio/ledger.h"
 
@@ -18,7 +19,10 @@ std::string DiskIOFileText(const std::string& name, const DiskIOUsage& usage);
 // The table of sums over `files`.
 std::string DiskIOSummaryText(const DiskIOFileMap& files);
 
-// The blocks of all files that moved bytes, fewest first, or a line that there are none.
-std::string DiskIOUsageText(const DiskIOFileMap& files);
+// The names of the files that moved bytes, fewest first; equal numbers in the order of the names.
+std::vector<std::string> DiskIOUsedFiles(const DiskIOFileMap& files);
+
+constexpr char kDiskIOUsageTitle[] = "Disk I/O Usage Report:\n\n";
+constexpr char kDiskIONoUsage[] = "No disk I/O usage to report.\n\n";  // if no file moved bytes
 
 #endif

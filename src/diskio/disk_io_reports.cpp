@@ -1,31 +1,39 @@
 // The three reports over the disk ledger.
 #include "diskio/disk_io_report_text.h"
+#include "memory/report_lock.h"
 #include "memory/report_text.h"
-#include "platform/stream.h"
 #include "zanbase/disk_io.h"
 
-// Each report owns the lock of its stream and then the ledger's mutex until it is written.
+namespace {
+
+// Requires: mpoDiskIOMutex is owned.
+bool HasFiles() { return mpoDiskIOFileMap != nullptr && !mpoDiskIOFileMap->empty(); }
+
+}  // namespace
 
 bool HDiskIOReportFile(std::FILE* stream, const std::string& name) {
-    const StreamLock stream_lock(stream);
-    const HMutexLock lock(&goDiskIOMutex);
-    if (gpoDiskIOFileMap == nullptr) return false;
-    const auto file = gpoDiskIOFileMap->find(name);
-    if (file == gpoDiskIOFileMap->end()) return false;
+    DiskIOFileMap::const_iterator file;
+    const auto has_text = [&] {
+        return HasFiles() && (file = mpoDiskIOFileMap->find(name)) != mpoDiskIOFileMap->end();
+    };
+    const ReportLock lock(*mpoDiskIOMutex, stream, has_text);
+    if (!lock) return false;
     WriteText(stream, DiskIOFileText(name, file->second));
     return true;
 }
 
 void HDiskIOSummaryReport(std::FILE* stream) {
-    const StreamLock stream_lock(stream);
-    const HMutexLock lock(&goDiskIOMutex);
-    if (gpoDiskIOFileMap == nullptr || gpoDiskIOFileMap->empty()) return;
-    WriteText(stream, DiskIOSummaryText(*gpoDiskIOFileMap));
+    const ReportLock lock(*mpoDiskIOMutex, stream, HasFiles);
+    if (!lock) return;
+    WriteText(stream, DiskIOSummaryText(*mpoDiskIOFileMap));
 }
 
 void HDiskIOUsageReport(std::FILE* stream) {
-    const StreamLock stream_lock(stream);
-    const HMutexLock lock(&goDiskIOMutex);
-    if (gpoDiskIOFileMap == nullptr || gpoDiskIOFileMap->empty()) return;
-    WriteText(stream, DiskIOUsageText(*gpoDiskIOFileMap));
+    const ReportLock lock(*mpoDiskIOMutex, stream, HasFiles);
+    if (!lock) return;
+    // Copies of the names: the write function of the stream may reset the ledger.
+    const std::vector<std::string> used = DiskIOUsedFiles(*mpoDiskIOFileMap);
+    WriteText(stream, kDiskIOUsageTitle);
+    if (used.empty()) WriteText(stream, kDiskIONoUsage);
+    for (const std::string& name : used) HDiskIOReportFile(stream, name);
 }

@@ -56,10 +56,10 @@ HDiskIOSnapshot::Row CopyOf(const DiskIOFileMap::value_type& file) {
 
 HDiskIOSnapshot HDiskIOSnapshot::Take() {
     HDiskIOSnapshot snapshot;
-    const HMutexLock lock(&goDiskIOMutex);
-    if (gpoDiskIOFileMap == nullptr) return snapshot;
-    snapshot.maRows.reserve(gpoDiskIOFileMap->size());
-    for (const auto& file : *gpoDiskIOFileMap) snapshot.maRows.push_back(CopyOf(file));
+    const HMutexLock lock(mpoDiskIOMutex);
+    if (mpoDiskIOFileMap == nullptr) return snapshot;
+    snapshot.maRows.reserve(mpoDiskIOFileMap->size());
+    for (const auto& file : *mpoDiskIOFileMap) snapshot.maRows.push_back(CopyOf(file));
     return snapshot;
 }
 

@@ -55,11 +55,11 @@ struct DiskIOState {
     DiskIOHandleMap moHandleMap;
 };
 
-extern HMutex& goDiskIOMutex;  // built in load_time.cpp, never destroyed
+extern const HMutex* const mpoDiskIOMutex;  // built in load_time.cpp, never destroyed
 
-// Null until the first recording, then never destroyed. Guarded by goDiskIOMutex.
-extern DiskIOFileMap* gpoDiskIOFileMap;
-extern DiskIOHandleMap* gpoDiskIOHandleMap;
-extern std::list<DiskIOState>* gpoDiskIOStack;  // newest at the back
+// Null until the first recording, then never destroyed. Guarded by mpoDiskIOMutex.
+extern DiskIOFileMap* mpoDiskIOFileMap;
+extern DiskIOHandleMap* mpoDiskIOHandleMap;
+extern std::list<DiskIOState>* mpoDiskIOStack;  // newest at the back
 
 #endif

@@ -9,6 +9,7 @@
 #include <array>
 #include <cstdint>
 #include <memory>
+#include <new>
 #include <utility>
 
 #include "zanbase/memory_tables.h"
@@ -30,11 +31,9 @@ public:
     static void MakeTables() {
         auto file_map = std::make_unique<FileMap>();
         auto memory_map = std::make_unique<MemoryMap>();
-        auto memory_stack = std::make_unique<std::list<MemoryState>>();
-        mpoSpareNodes = new SpareNodes;
+        mpoMemoryStack = new std::list<MemoryState>;
         mpoFileMap = file_map.release();
         mpoMemoryMap = memory_map.release();
-        mpoMemoryStack = memory_stack.release();
     }
 
     // The entry of a call site, made if there is none.
@@ -55,11 +54,11 @@ public:
 
     // Does nothing if the table has a block at `ptr` already.
     static void AddBlock(void* ptr, const MemoryBlock& block) {
-        SpareNodes& spare = *mpoSpareNodes;
-        if (spare.mnCount == 0) {
+        if (mpoSpareNodes == nullptr || mpoSpareNodes->mnCount == 0) {
             mpoMemoryMap->emplace(ptr, block);
             return;
         }
+        SpareNodes& spare = *mpoSpareNodes;
         MemoryMap::node_type& node = spare.maNodes[spare.mnCount - 1];
         node.key() = ptr;
         node.mapped() = block;
@@ -69,9 +68,9 @@ public:
     }
 
     static void DropBlock(MemoryMap::const_iterator block) {
-        SpareNodes& spare = *mpoSpareNodes;
-        if (spare.mnCount < spare.maNodes.size()) {
-            spare.maNodes[spare.mnCount++] = mpoMemoryMap->extract(block);
+        if (mpoSpareNodes == nullptr) mpoSpareNodes = new (std::nothrow) SpareNodes;
+        if (mpoSpareNodes != nullptr && mpoSpareNodes->mnCount < kSpareNodes) {
+            mpoSpareNodes->maNodes[mpoSpareNodes->mnCount++] = mpoMemoryMap->extract(block);
         } else {
             mpoMemoryMap->erase(block);
         }
@@ -88,12 +87,15 @@ private:
                (64 - kGuessBits);
     }
 
+    static constexpr std::size_t kSpareNodes = 64;
+
     struct SpareNodes {
-        std::array<MemoryMap::node_type, 64> maNodes;  // the first mnCount of them hold a node
+        std::array<MemoryMap::node_type, kSpareNodes> maNodes;  // the first mnCount of them hold a node
         std::size_t mnCount = 0;
     };
 
-    static inline SpareNodes* mpoSpareNodes = nullptr;  // made with the tables
+    // Made by the first Free that finds a block, and not with the tables: a derived class may make those.
+    static inline SpareNodes* mpoSpareNodes = nullptr;
     static inline std::array<std::size_t, 1U << kGuessBits> maSiteBuckets{};
 };
 

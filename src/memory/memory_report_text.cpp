@@ -1,10 +1,9 @@
-// The texts of the two memory reports.
+// The two memory reports.
 #include "memory/memory_report_text.h"
 
 #include <algorithm>
 #include <map>
 
-#include "memory/report_text.h"
 #include "zanbase/string_makers.h"
 
 namespace {
@@ -83,21 +82,21 @@ std::string UsageSection(const UsageRow& row) {
 
 }  // namespace
 
-std::string LeakReportText(const std::vector<LeakGroup>& groups) {
+void WriteLeakReport(const std::vector<LeakGroup>& groups, const ReportWriter& write) {
     std::multimap<std::size_t, const LeakGroup*> by_size;
     for (const LeakGroup& group : groups) by_size.emplace(group.size, &group);
-    std::string text = kLeakHeading;
+    write(kLeakHeading);
     std::size_t size = 0;
     int blocks = 0;
     for (const auto& [group_size, group] : by_size) {
-        text += LeakRow(*group);
+        write(LeakRow(*group));
         size += group_size;
         blocks += group->blocks;
     }
-    return text + LeakFooter(size, blocks);
+    write(LeakFooter(size, blocks));
 }
 
-std::string UsageReportText(const std::vector<UsageRow>& rows, std::size_t peak) {
+void WriteUsageReport(const std::vector<UsageRow>& rows, std::size_t peak, const ReportWriter& write) {
     std::multimap<std::size_t, const UsageRow*> by_size;
     UsageTotals totals;
     for (const UsageRow& row : rows) {
@@ -105,14 +104,14 @@ std::string UsageReportText(const std::vector<UsageRow>& rows, std::size_t peak)
         totals.allocated += Kilobytes(row.allocated);
         totals.freed += Kilobytes(row.freed);
     }
+    write("Memory Usage Report By File:\n\n");
     const unsigned long long threshold = UsageThreshold(totals);
-    std::string text = "Memory Usage Report By File:\n\n";
     for (const auto& [allocated, row] : by_size) {
         if (allocated < threshold) {
             totals.below_threshold += Kilobytes(allocated);
         } else {
-            text += UsageSection(*row);
+            write(UsageSection(*row));
         }
     }
-    return text + UsageFooter(totals, peak);
+    write(UsageFooter(totals, peak));
 }

@@ -1,10 +1,11 @@
-// The texts of the two memory reports, as functions of what they show.
+// The two memory reports, as functions of what they show.
 #ifndef ZANBASE_MEMORY_MEMORY_REPORT_TEXT_H
 #define ZANBASE_MEMORY_MEMORY_REPORT_TEXT_H
 
 #include <cstddef>
-#include <string>
 #include <vector>
+
+#include "memory/report_text.h"
 
 // The live blocks of one call site.
 struct LeakGroup {
@@ -25,10 +26,10 @@ struct UsageRow {
 };
 
 // A table of `groups`, largest last, with totals; groups of one size stay in their order.
-std::string LeakReportText(const std::vector<LeakGroup>& groups);
+void WriteLeakReport(const std::vector<LeakGroup>& groups, const ReportWriter& write);
 
 // A section for each of `rows`, largest last, with totals and the peak; rows of one size stay in their order,
 // and those below a small share of the total are summed up.
-std::string UsageReportText(const std::vector<UsageRow>& rows, std::size_t peak);
+void WriteUsageReport(const std::vector<UsageRow>& rows, std::size_t peak, const ReportWriter& write);
 
 #endif

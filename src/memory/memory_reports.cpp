@@ -1,20 +1,27 @@
-// The two reports over the tracker's tables: what the texts need, read from the tables.
-//
-// Each report owns the lock of its stream and then the tracker's mutex until it is written.
+// The two reports over the tracker's tables. Each copies what it shows before its first write, because the write
+// function of the stream may call the tracker on the same thread.
 #include <cstdint>
 #include <map>
 #include <utility>
 #include <vector>
 
 #include "memory/memory_report_text.h"
+#include "memory/report_lock.h"
 #include "memory/report_text.h"
-#include "platform/stream.h"
 #include "zanbase/memory_tables.h"
 
+namespace {
+
+ReportWriter WriterTo(std::FILE* stream) {
+    return [stream](const std::string& part) { WriteText(stream, part); };
+}
+
+}  // namespace
+
 void HMemory::LeakReport(std::FILE* stream) {
-    const StreamLock stream_lock(stream);
-    const HMutexLock lock(&moMutex);
-    if (mpoMemoryMap == nullptr || mpoMemoryMap->empty()) return;
+    const auto has_text = [] { return mpoMemoryMap != nullptr && !mpoMemoryMap->empty(); };
+    const ReportLock lock(moMutex, stream, has_text);
+    if (!lock) return;
     std::map<std::pair<std::uintptr_t, int>, LeakGroup> by_site;
     for (const auto& [address, block] : *mpoMemoryMap) {
         LeakGroup& group = by_site[{reinterpret_cast<std::uintptr_t>(block.mpcFile), block.mnLine}];
@@ -23,18 +30,18 @@ void HMemory::LeakReport(std::FILE* stream) {
     std::vector<LeakGroup> groups;
     groups.reserve(by_site.size());
     for (const auto& [site, group] : by_site) groups.push_back(group);
-    WriteText(stream, LeakReportText(groups));
+    WriteLeakReport(groups, WriterTo(stream));
 }
 
 void HMemory::UsageReport(std::FILE* stream) {
-    const StreamLock stream_lock(stream);
-    const HMutexLock lock(&moMutex);
-    if (mpoFileMap == nullptr || mpoFileMap->empty()) return;
+    const auto has_text = [] { return mpoFileMap != nullptr && !mpoFileMap->empty(); };
+    const ReportLock lock(moMutex, stream, has_text);
+    if (!lock) return;
     std::vector<UsageRow> rows;
     rows.reserve(mpoFileMap->size());
     for (const auto& [site, usage] : *mpoFileMap) {
         rows.push_back({site.first, site.second, usage.mnAllocated, usage.mnFreed, usage.mnAllocCount,
                         usage.mnFreeCount});
     }
-    WriteText(stream, UsageReportText(rows, mnPeekMemory));
+    WriteUsageReport(rows, mnPeekMemory, WriterTo(stream));
 }

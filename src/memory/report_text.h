@@ -4,6 +4,7 @@
 
 #include <cstddef>
 #include <cstdio>
+#include <functional>
 #include <string>
 
 // A byte count as text. Up to 1024 bytes it is a plain number; a larger one has two decimals and the largest
@@ -18,6 +19,9 @@ std::string FitField(const std::string& text, unsigned int width, bool rightAlig
 
 // `path` from the "src/" of its first "/src/"; unchanged if there is none.
 std::string ShortSourcePath(const std::string& path);
+
+// Receives a report part by part: its heading, each row or section, its end.
+using ReportWriter = std::function<void(const std::string& part)>;
 
 // Writes `text` in one call. A failure of the stream is not reported.
 void WriteText(std::FILE* stream, const std::string& text);

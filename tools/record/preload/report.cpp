@@ -85,8 +85,9 @@ std::string MemoryTables(const HMemorySnapshot& memory) {
                         static_cast<unsigned int>(row.mnFreeCount)});
     }
     std::string text;
-    if (!groups.empty()) text += LeakReportText(groups);
-    if (!rows.empty()) text += UsageReportText(rows, static_cast<std::size_t>(memory.mnPeak));
+    const auto add = [&text](const std::string& part) { text += part; };
+    if (!groups.empty()) WriteLeakReport(groups, add);
+    if (!rows.empty()) WriteUsageReport(rows, static_cast<std::size_t>(memory.mnPeak), add);
     return text;
 }
 
@@ -111,7 +112,12 @@ std::string DiskTables(const HDiskIOSnapshot& disk) {
         usage.mnWriteCount = count(row.moWrite);
         usage.mnWriteSize = static_cast<unsigned long long>(row.moWrite.mnBytes);
     }
-    return DiskIOSummaryText(files) + DiskIOUsageText(files);
+    std::string text = DiskIOSummaryText(files);
+    text += kDiskIOUsageTitle;
+    const std::vector<std::string> used = DiskIOUsedFiles(files);
+    if (used.empty()) text += kDiskIONoUsage;
+    for (const std::string& name : used) text += DiskIOFileText(name, files.at(name));
+    return text;
 }
 
 std::string Notes() {
