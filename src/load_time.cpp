@@ -4,8 +4,6 @@
 //
 // None of them is ever destroyed: detached threads and destructors of other static objects may call the
 // library while the process exits, and the library is never unloaded: each back end keeps it loaded.
-#include <algorithm>
-#include <array>
 #include <new>
 
 #include "diskio/ledger.h"
@@ -40,32 +38,16 @@ NameRing& goNameRing = BuildForever<NameRing>();
 
 namespace {
 
-// A fork owns the mutex of every table, so that the child can use them all. Lock order: as listed; no other
-// code owns two of them.
-std::array<const HMutex*, 5> TableMutexes() {
-    return {&TrackerAccess::moMutex, mpoDiskIOMutex, &goTimerGrowthMutex,
-            &goMessageCatalogue.moCatalogueMutex, &goNameRing.moRingMutex};
-}
-
-bool TryAcquireTables() {
-    const auto mutexes = TableMutexes();
-    const auto busy =
-        std::find_if(mutexes.begin(), mutexes.end(), [](const HMutex* m) { return !m->TryLock(); });
-    if (busy == mutexes.end()) return true;
-    std::for_each(mutexes.begin(), busy, [](const HMutex* mutex) { mutex->Unlock(); });
-    return false;
-}
-
-void AcquireTables() {
-    for (const HMutex* const mutex : TableMutexes()) mutex->Lock();
-}
-
-void ReleaseTables() {
-    for (const HMutex* const mutex : TableMutexes()) mutex->Unlock();
+// A fork owns the mutex of every table, so that the child can use them all. No other code owns two of them.
+const HMutex& TableMutex(unsigned int number) {
+    const HMutex* const mutexes[] = {&TrackerAccess::moMutex, mpoDiskIOMutex, &goTimerGrowthMutex,
+                                     &goMessageCatalogue.moCatalogueMutex, &goNameRing.moRingMutex};
+    return *mutexes[number];
 }
 
 [[maybe_unused]] const bool gbForkHandled = [] {
-    HoldAroundFork(TryAcquireTables, AcquireTables, ReleaseTables);
+    HoldAroundFork({5, [](unsigned int number) { return TableMutex(number).TryLock(); },
+                    [](unsigned int number) { TableMutex(number).Unlock(); }});
     return true;
 }();
 

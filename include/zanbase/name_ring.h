@@ -13,7 +13,8 @@
 /// 4095.
 ///
 /// **Threads.** All functions are thread-safe, until the process has ended. Their mutex is held only while a
-/// slot is chosen. A fork waits until no other thread chooses one, so the child can make names.
+/// slot is chosen. A fork waits until no other thread chooses one, so the child can make names, unless a thread
+/// was killed there (`HThread::Kill`).
 #ifndef ZANBASE_NAME_RING_H
 #define ZANBASE_NAME_RING_H
 

@@ -92,8 +92,9 @@ public:
     /// Terminates the thread asynchronously and returns when it is gone and the object is idle. Returns at
     /// once if there is no thread; does not return on the thread itself. No destructor, handler or exit
     /// routine of the thread runs. What it holds stays held for ever, such as a `HMutex`, or the mutex inside
-    /// `HMemory::Alloc` or `MkName`; what it was changing stays half changed. Use it only if nothing else is
-    /// left.
+    /// `HMemory::Alloc` or `MkName`; what it was changing stays half changed. A later `fork` leaves out such a
+    /// mutex of the library, the first one after a wait of five seconds, and its child must not use the table that
+    /// the mutex guards. Use it only if nothing else is left.
     ///
     /// A thread that has not entered `Run` yet does not enter it.
     ///

@@ -2,15 +2,26 @@
 #ifndef ZANBASE_PLATFORM_FORK_H
 #define ZANBASE_PLATFORM_FORK_H
 
-// From now on each fork() owns all locks of the caller on its thread while it copies the process, so that no
-// other thread is inside what they guard; it releases them in the parent and in the child.
+// Locks, numbered from 0.
+struct ForkLocks {
+    static constexpr unsigned int kMost = 8;
+
+    unsigned int count;                        // at most kMost
+    bool (*try_acquire)(unsigned int number);  // false if another thread owns the lock; never waits
+    void (*release)(unsigned int number);
+};
+
+// From now on each fork() owns all of `locks` on its thread while it copies the process, so that no other thread is
+// inside what they guard; it releases them in the parent and in the child.
 //
-// `acquire` waits for all of them, `try_acquire` acquires all or none without waiting, `release` undoes
-// either. Stdio streams may be opened and written under these locks, and threads that own a stream may wait
-// for them: the back end never waits for one of them while it holds a lock of the C library, nor the other
-// way round.
+// fork() waits for none of them, nor for a lock of the C library, while it owns another. So a thread that owns one
+// may wait for the others, open or write streams, and allocate.
+//
+// fork() gives up a lock that it has found owned by another thread at every attempt for five seconds: that thread
+// may have been killed. It then copies the process without that lock, which stays owned in the child. A later fork()
+// gives up the same lock at once, unless it finds it free.
 //
 // Does nothing on a system that can't copy a process. Requires: called once, while the library is loaded.
-void HoldAroundFork(bool (*try_acquire)(), void (*acquire)(), void (*release)()) noexcept;
+void HoldAroundFork(const ForkLocks& locks) noexcept;
 
 #endif

@@ -1,4 +1,4 @@
 // This system doesn't copy processes.
 #include "platform/fork.h"
 
-void HoldAroundFork(bool (*)(), void (*)(), void (*)()) noexcept {}
+void HoldAroundFork(const ForkLocks&) noexcept {}
