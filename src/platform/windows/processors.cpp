@@ -2,9 +2,10 @@
 #include "platform/processors.h"
 
 #include <algorithm>
-#include <vector>
+#include <cstdlib>
 
 #include "platform/windows/system.h"
+#include "zanbase/allocation.h"
 
 int CountLogicalProcessors() noexcept {
     SYSTEM_INFO system;
@@ -12,18 +13,24 @@ int CountLogicalProcessors() noexcept {
     return static_cast<int>(system.dwNumberOfProcessors);
 }
 
-// The size may grow between two calls, as processors are added.
+// The size may grow between two calls, as processors are added, and the call that succeeds may fill less.
 int CountProcessorCores() noexcept try {
     using Record = SYSTEM_LOGICAL_PROCESSOR_INFORMATION;
     static_assert(sizeof(Record) == 32);
-    std::vector<Record> records;
+    Record* records = nullptr;
     DWORD bytes = 0;
-    while (GetLogicalProcessorInformation(records.data(), &bytes) == 0) {
-        if (GetLastError() != ERROR_INSUFFICIENT_BUFFER) return 0;
-        records.resize(bytes / sizeof(Record));
+    BOOL is_filled = FALSE;
+    while ((is_filled = GetLogicalProcessorInformation(records, &bytes)) == 0 &&
+           GetLastError() == ERROR_INSUFFICIENT_BUFFER) {
+        std::free(records);
+        records = nullptr;
+        records = static_cast<Record*>(HMalloc(bytes));
     }
     const auto is_core = [](const Record& record) { return record.Relationship == RelationProcessorCore; };
-    return static_cast<int>(std::count_if(records.begin(), records.end(), is_core));
-} catch (...) {
+    const bool has_records = is_filled != 0 && records != nullptr;
+    const auto cores = has_records ? std::count_if(records, records + bytes / sizeof(Record), is_core) : 0;
+    std::free(records);
+    return static_cast<int>(cores);
+} catch (...) {  // thrown by the program's out-of-memory handler
     return 0;
 }
