@@ -2,23 +2,7 @@
 // the time zone, which makes it many times as slow under Wine.
 #include "platform/clock.h"
 
-#include "platform/windows/system.h"
-
-namespace {
-
-long long Counter() noexcept {
-    LARGE_INTEGER counter;
-    QueryPerformanceCounter(&counter);  // can't fail
-    return counter.QuadPart;
-}
-
-long long CounterPerSecond() noexcept {
-    LARGE_INTEGER frequency;
-    QueryPerformanceFrequency(&frequency);
-    return frequency.QuadPart;
-}
-
-}  // namespace
+#include "platform/windows/deadline.h"
 
 WallClock ReadWallClock() noexcept {
     constexpr unsigned long long kUnitsPerSecond = 10000000;  // of 100 nanoseconds
@@ -39,9 +23,8 @@ unsigned int ReadTicks() noexcept {
     return static_cast<unsigned int>(counter / per_second * 1000 + counter % per_second * 1000 / per_second);
 }
 
-// The system may end a pause at the timer interrupt before its end.
 void SleepFor(unsigned int ms) noexcept {
-    const long long end = Counter() + CounterPerSecond() * ms / 1000;
+    const Deadline deadline(ms);
     Sleep(ms);
-    while (Counter() < end) Sleep(1);
+    while (const DWORD left = deadline.MillisecondsLeft()) Sleep(left);
 }

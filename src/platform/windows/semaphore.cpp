@@ -4,7 +4,7 @@
 #include <algorithm>
 #include <new>
 
-#include "platform/windows/system.h"
+#include "platform/windows/deadline.h"
 
 namespace {
 HANDLE HandleOf(HNativeSemaphore* semaphore) noexcept { return semaphore; }
@@ -20,7 +20,14 @@ HNativeSemaphore* NewSemaphore(unsigned int count) {
 void DeleteSemaphore(HNativeSemaphore* semaphore) noexcept { CloseHandle(HandleOf(semaphore)); }
 
 bool AcquireUnit(HNativeSemaphore* semaphore, unsigned int limit_ms) noexcept {
-    return WaitForSingleObject(HandleOf(semaphore), limit_ms) == WAIT_OBJECT_0;
+    const Deadline deadline(limit_ms);
+    DWORD result = WaitForSingleObject(HandleOf(semaphore), limit_ms);
+    while (result == WAIT_TIMEOUT) {
+        const DWORD left = deadline.MillisecondsLeft();
+        if (left == 0) break;
+        result = WaitForSingleObject(HandleOf(semaphore), left);
+    }
+    return result == WAIT_OBJECT_0;
 }
 
 void ReleaseUnit(HNativeSemaphore* semaphore) noexcept { ReleaseSemaphore(HandleOf(semaphore), 1, nullptr); }
