@@ -1,12 +1,14 @@
 // What the back end for Windows promises beyond the contracts: priorities, handles, the system's texts and its console.
 #include <gtest/gtest.h>
 #include <io.h>
+#include <xmmintrin.h>
 
 #include <cstdint>
 #include <random>
 #include <thread>
 #include <vector>
 
+#include "platform/guard.h"
 #include "platform/stream.h"
 #include "platform/thread.h"
 #include "platform/windows/standard_stream.h"
@@ -48,6 +50,35 @@ TEST(WindowsThread, TellsErrorsAsTheSystemDoes) {
     EXPECT_GT(text.size(), 2U);
     EXPECT_EQ(text.substr(text.size() - 2), "\r\n");
     EXPECT_EQ(SystemErrorText(-1), "");
+}
+
+TEST(WindowsGuard, EndsFloatingPointFaultsAndKeepsTheirSettings) {
+    constexpr unsigned int kDivZero = _MM_MASK_DIV_ZERO, kFlags = _MM_EXCEPT_MASK;
+    const unsigned int before = _mm_getcsr();
+    EXPECT_TRUE(RunGuarded(
+        [](void*) {
+            _mm_setcsr((_mm_getcsr() & ~kDivZero) | _MM_ROUND_UP);
+            volatile double zero = 0.0;
+            zero = 1.0 / zero;
+        },
+        nullptr));
+    EXPECT_EQ(_mm_getcsr(), (before & ~kDivZero & ~kFlags) | _MM_ROUND_UP);
+    _mm_setcsr(before);
+}
+
+// Wine leaves no room to unwind in a stack that is exhausted. So the fault is raised where there is some.
+TEST(WindowsGuard, EndsAStackOverflow) {
+    const auto overflow = [](void*) { RaiseException(EXCEPTION_STACK_OVERFLOW, 0, 0, nullptr); };
+    for (int round = 0; round < 2; ++round) EXPECT_TRUE(RunGuarded(overflow, nullptr));
+}
+
+TEST(WindowsThread, IsIdleAfterItsEndElsewhere) {
+    Runner runner([] { ExitThread(0); });
+    for (int round = 0; round < 2; ++round) {
+        EXPECT_TRUE(runner.Start(true));
+        runner.Wait();
+        EXPECT_FALSE(runner.IsRunning());
+    }
 }
 
 // The number of a new handle; the system takes those again that were closed.

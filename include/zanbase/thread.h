@@ -7,6 +7,8 @@
 
 #include "zanbase/export.h"
 
+#undef Yield
+
 /// @addtogroup threads
 /// @{
 
@@ -59,7 +61,10 @@ enum HThreadPriority : unsigned int {
 ///   - `abort` ends the process. `pthread_exit` in `Run` ends the thread and prints nothing. A thread that
 ///     calls the raw `exit` system call stays "running" until `Kill`.
 ///
-/// On Windows faults are structured exceptions. A handler in `Run` gets them first, and so does a vectored one.
+/// On Windows faults are structured exceptions, those of the floating-point units among them if the program has
+/// unmasked them. A handler in `Run` gets them first, and so does a vectored one. A thread that calls `ExitThread` stays
+/// "running" until `Wait` or `Kill`. When the process exits, the system ends all other threads before it destroys the
+/// static objects of DLLs: `IsRunning` returns false from then on.
 ///
 /// **Fork.** In the child every object is idle, except that of the thread that called `fork`.
 ///
@@ -120,8 +125,9 @@ public:
     /// On Windows it is `TerminateThread`, which takes effect at once:
     ///   - A thread inside the C runtime or the loader leaves their locks held: the next thread that allocates,
     ///     starts or ends may deadlock.
-    ///   - A thread that waits for a `HMutex` or on a `HCondVar` may take the wake-ups of later waiters with it. A
-    ///     `HSemaphore` serves its other waiters.
+    ///   - Never kill a thread that waits for a `HMutex` or on a `HCondVar`: the behaviour is undefined. The system
+    ///     keeps the waiters in a list on their stacks, so the next wake-up may be lost or may access memory that is
+    ///     gone. A `HSemaphore` serves its other waiters.
     ///   - A thread that waits in `Wait` leaves a handle and a small block behind.
     void Kill();
 
@@ -142,8 +148,9 @@ protected:
     /// The body of the thread.
     virtual void Run() = 0;
 
-    /// Offers the processor to other threads that are ready.
-    void(Yield)();
+    /// Offers the processor to other threads that are ready. `<windows.h>` defines a macro of this name that makes
+    /// calls disappear. This header removes it, so it has to be the later one.
+    void Yield();
 
     /// Detaches the thread. The object becomes idle; the thread does not access it after `Run` returns.
     /// Threads already in `Wait` keep waiting.

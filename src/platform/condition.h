@@ -15,8 +15,8 @@ void InitCondition(HNativeCondition* condition) noexcept;
 
 // Releases one level of `lock`, sleeps once until a wake-up or for `limit_ms`, and acquires the lock again.
 // True if it was woken; spurious wake-ups are possible. False on a timeout. A limit of 0 does not sleep,
-// consumes no wake-up and returns false. A waiter that was killed by KillThread may block later waiters, unless
-// the back end says that it does not. Thread-safe. Requires: the caller owns the lock exactly once; if it owns
+// consumes no wake-up and returns false. A waiter must not be killed by KillThread, unless the back end says that it
+// may: the condition may refer to its stack. Thread-safe. Requires: the caller owns the lock exactly once; if it owns
 // it more often, the lock stays owned during the sleep.
 bool WaitOnCondition(HNativeCondition* condition, HNativeLock* lock, unsigned int limit_ms) noexcept;
 

@@ -15,8 +15,8 @@ void InitLock(HNativeLock* lock) noexcept;
 void DestroyLock(HNativeLock* lock) noexcept;
 
 // Acquires one level of ownership; waits while another thread owns the lock. A lock whose owner was killed by
-// KillThread stays held for ever. A killed waiter may block later waiters, unless the back end says that it
-// does not. Thread-safe, as the next two.
+// KillThread stays held for ever. A waiter must not be killed, unless the back end says that it may: the lock may refer
+// to its stack. Thread-safe, as the next two.
 void AcquireLock(HNativeLock* lock) noexcept;
 
 // The same without waiting; false if another thread owns the lock.

@@ -22,6 +22,10 @@ int StartThread(ThreadSlot& slot, void (*body)(void*), void* argument) noexcept;
 // The system's text for an error number of StartThread, as the system writes it: on Windows with a line end.
 std::string SystemErrorText(int error);
 
+// Whether a thread is in the slot. False also if the system has ended it, as Windows ends all threads but one when the
+// process exits, before it destroys static objects of DLLs. False has acquire order after all that the thread did.
+bool HasThread(const ThreadSlot& slot) noexcept;
+
 // Waits until the thread in the slot has ended, including the destructors of its thread-local objects. Any
 // number of threads may wait. Returns at once if the slot is empty or points to the calling thread.
 void JoinThread(ThreadSlot& slot) noexcept;

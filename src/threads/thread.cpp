@@ -43,7 +43,7 @@ bool HThread::Start(bool) {
 void HThread::Stop() {}
 
 bool HThread::IsRunning() const {
-    const bool is_running = mpoThread.load(std::memory_order_acquire) != nullptr;
+    const bool is_running = HasThread(mpoThread);
     if (!is_running) NoteAcquire(&mpoThread);
     return is_running;
 }
@@ -58,7 +58,7 @@ void HThread::SetPriority(HThreadPriority priority) {
 
 unsigned long long HThread::GetCurrentThreadId() { return CurrentThreadId(); }
 
-void(HThread::Yield)() { YieldThread(); }
+void HThread::Yield() { YieldThread(); }
 
 void HThread::DestroyThread() { DetachThread(mpoThread); }
 

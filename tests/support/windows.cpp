@@ -92,7 +92,7 @@ bool IsInWait(HANDLE thread) {
 }  // namespace
 
 const bool kConditionOutlivesKills = false;
-const bool kExhaustedStackIsAFault = false;  // Wine ends the process
+const bool kExhaustedStackIsAFault = false;  // Wine leaves too little stack to unwind and ends the thread
 const bool kKillRunsTlsDestructors = false;
 
 // Two processes that call the runtime's tmpfile() under Wine at once can get the same file, or none.

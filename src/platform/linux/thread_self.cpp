@@ -9,6 +9,8 @@
 
 ZANBASE_FAST_THREAD_LOCAL ThreadSelf toSelf;
 
+bool HasThread(const ThreadSlot& slot) noexcept { return slot.load(std::memory_order_acquire) != nullptr; }
+
 unsigned int CurrentThreadId() noexcept {
     // The system call takes thirty times as long as the copy. The child of a fork drops the copy.
     if (__builtin_expect(toSelf.mnNumber == 0, 0))

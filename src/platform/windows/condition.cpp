@@ -1,4 +1,5 @@
-// The condition of this system: a condition variable on a critical section.
+// The condition of this system: a condition variable on a critical section. It refers to the stacks of its waiters. A
+// timeout may come up to a tick of the system's clock early.
 #include "platform/condition.h"
 
 #include "platform/windows/critical_section.h"

@@ -1,5 +1,4 @@
-// The re-entrant lock of this system: a critical section. A waiter that was killed may have been chosen as the next
-// owner, which stops the others.
+// The re-entrant lock of this system: a critical section. It refers to the stacks of its waiters.
 #include "platform/windows/critical_section.h"
 
 static_assert(sizeof(CRITICAL_SECTION) <= sizeof(HNativeLock) &&

@@ -1,4 +1,5 @@
-// A lock without a queue of waiters: one of them can be killed and leaves no trace.
+// A lock without a queue of waiters: one of them can be killed and leaves no trace. The last thread of an ending process
+// passes it, because its owner may have been ended with all others.
 #ifndef ZANBASE_PLATFORM_WINDOWS_SPIN_LOCK_H
 #define ZANBASE_PLATFORM_WINDOWS_SPIN_LOCK_H
 
@@ -9,7 +10,7 @@
 class SpinLock {
 public:
     void Acquire() noexcept {
-        while (mbHeld.exchange(true, std::memory_order_acquire)) SwitchToThread();
+        while (mbHeld.exchange(true, std::memory_order_acquire) && !IsLastThread()) SwitchToThread();
     }
     void Release() noexcept { mbHeld.store(false, std::memory_order_release); }
 

@@ -12,4 +12,9 @@
 
 static_assert(kForever == INFINITE);
 
+extern "C" __declspec(dllimport) BOOLEAN NTAPI RtlDllShutdownInProgress();
+
+// Whether the system has ended all threads but the calling one, to detach the DLLs of an ending process.
+inline bool IsLastThread() noexcept { return RtlDllShutdownInProgress() != 0; }
+
 #endif

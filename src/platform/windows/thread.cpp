@@ -7,8 +7,9 @@
 
 namespace {
 
-// Reserved for the filter of machine faults in an exhausted stack.
-constexpr ULONG kFaultStackBytes = 16 * 1024;
+// Reserved for the filter of machine faults in an exhausted stack, and for the unwinding after it, which keeps several
+// copies of all registers.
+constexpr ULONG kFaultStackBytes = 64 * 1024;
 
 constexpr int kPriorities[] = {THREAD_PRIORITY_IDLE,         THREAD_PRIORITY_LOWEST,
                                THREAD_PRIORITY_BELOW_NORMAL, THREAD_PRIORITY_NORMAL,
@@ -32,16 +33,27 @@ DWORD WINAPI Enter(void* argument) {
     return 0;
 }
 
+// A thread that ended elsewhere, by ExitThread for example, has not emptied its slot.
 void WaitForEnd(HNativeThread* block) noexcept {
     WaitForSingleObject(block->mpoHandle, INFINITE);
+    bool has_left_body = false;
+    {
+        const SpinLockHold hold(goBlockLock);
+        has_left_body = block->mpoSlot == nullptr;
+        EmptySlot(block);
+    }
+    if (!has_left_body) RemoveUser(block);  // for the thread
     RemoveUser(block);
 }
 
+// Stops the thread, which then can't acquire goBlockLock any more. A system call that it is in may take longer to end.
 // Requires: goBlockLock is held; the thread is in its body and is not the calling one.
 void Terminate(HNativeThread* block) noexcept {
+    CONTEXT context{};
+    context.ContextFlags = CONTEXT_CONTROL;
+    SuspendThread(block->mpoHandle);
+    GetThreadContext(block->mpoHandle, &context);  // returns when the thread has stopped
     TerminateThread(block->mpoHandle, 0);
-    WaitForSingleObject(block->mpoHandle, INFINITE);
-    EmptySlot(block);
 }
 
 }  // namespace
@@ -94,15 +106,14 @@ void KillThread(ThreadSlot& slot) noexcept {
         if (id == 0) {
             block->mpfnBody = [](void*) {};
             ++block->mnUsers;
-        } else if (id == GetCurrentThreadId()) {
-            EmptySlot(block);
         } else {
-            Terminate(block);
+            if (id != GetCurrentThreadId()) Terminate(block);
+            EmptySlot(block);  // from here on this function is a user in place of the thread
         }
     }
-    if (id == 0) return WaitForEnd(block);
-    RemoveUser(block);  // for the thread
-    if (id == GetCurrentThreadId()) TerminateThread(GetCurrentThread(), 0);
+    if (id != GetCurrentThreadId()) return WaitForEnd(block);
+    RemoveUser(block);
+    TerminateThread(GetCurrentThread(), 0);
 }
 
 void DetachThread(ThreadSlot& slot) noexcept {

@@ -5,6 +5,10 @@
 // This system ends a thread without an exception.
 void RethrowThreadExit() {}
 
+bool HasThread(const ThreadSlot& slot) noexcept {
+    return slot.load(std::memory_order_acquire) != nullptr && !IsLastThread();
+}
+
 unsigned int CurrentThreadId() noexcept { return GetCurrentThreadId(); }
 
 void YieldThread() noexcept { SwitchToThread(); }
