@@ -9,6 +9,13 @@
 /// being built (`ZANBASE_BUILDING`), its objects are linked statically (`ZANBASE_STATIC`), or a caller uses
 /// the shared library (neither).
 #if defined(_WIN32)
+#include <crtdefs.h>
+
+#include "zanbase/windows_runtime.h"
+#if (defined(_UCRT) || defined(_MSC_VER)) != (ZANBASE_FOR_UCRT == 1)
+#error This zanbase was built for another C runtime (msvcrt or UCRT): FILE, malloc and getenv would not be the same
+#endif
+
 #if defined(ZANBASE_BUILDING)
 #define ZANBASE_API __declspec(dllexport)
 #elif defined(ZANBASE_STATIC)
@@ -28,7 +35,7 @@
 /// @def ZANBASE_FORMAT_ARGUMENT(number)
 /// The result is a format that takes the same arguments as parameter number `number`.
 #if defined(__GNUC__)
-#if defined(__MINGW32__)
+#if defined(__MINGW32__) && !defined(__clang__)  // clang has one kind of formats
 #define ZANBASE_PRINTF_FORMAT(text, first) __attribute__((format(gnu_printf, text, first)))
 #else
 #define ZANBASE_PRINTF_FORMAT(text, first) __attribute__((format(printf, text, first)))

@@ -1,6 +1,5 @@
-// What the C runtime keeps of a stream. Neither runtime has calls for it, and both have kept its form since their first
-// release: programs for msvcrt contain macros over the fields and calls that acquire the lock, and the UCRT is one
-// file for all of them.
+// What the C runtime keeps of a stream and of a descriptor, for which it has no calls. It has kept these forms since its
+// first release: programs for msvcrt contain macros over the fields of a stream, and calls that acquire its lock.
 #ifndef ZANBASE_PLATFORM_WINDOWS_RUNTIME_STREAM_H
 #define ZANBASE_PLATFORM_WINDOWS_RUNTIME_STREAM_H
 
@@ -8,23 +7,12 @@
 
 #include "platform/windows/system.h"
 
-#ifdef _UCRT
-struct StreamFields {
-    char* _ptr;
-    char* _base;
-    int _cnt;
-    int _flag;
-    int _file;
-    int _charbuf;
-    int _bufsiz;
-    char* _tmpfname;
-};
-#else
-using StreamFields = std::FILE;
-#endif
-
 struct RuntimeStream {
-    StreamFields fields;    // guarded by lock
+#ifdef _UCRT
+    char fields[48];
+#else
+    std::FILE fields;  // guarded by the stream's lock
+#endif
     CRITICAL_SECTION lock;  // only if HasOwnLock
 };
 
@@ -49,6 +37,16 @@ inline bool HasOwnLock(std::FILE* stream) noexcept {
 #else
     constexpr int kStreamsInTable = 20;
     return stream < stdin || stream >= stdin + kStreamsInTable;
+#endif
+}
+
+// Whether a stream that has no lock of its own is marked as locked.
+inline bool IsMarkedLocked([[maybe_unused]] std::FILE* stream) noexcept {
+#ifdef _UCRT
+    return false;
+#else
+    constexpr int kIsLocked = 0x8000;
+    return (In(stream)->fields._flag & kIsLocked) != 0;
 #endif
 }
 

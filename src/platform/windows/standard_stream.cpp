@@ -19,10 +19,9 @@ constexpr unsigned int kPauseMs = 5;
 // msvcrt has no way to try a lock in its table, but it marks the streams that are locked. A thread that locks one between
 // the look and the call is waited for.
 bool TryOwn(std::FILE* stream) noexcept {
-    constexpr int kIsLocked = 0x8000;
     if (IsInTransfer(_fileno(stream))) return false;
     if (HasOwnLock(stream)) return TryLockStream(stream);
-    if ((In(stream)->fields._flag & kIsLocked) != 0) return false;
+    if (IsMarkedLocked(stream)) return false;
     LockStream(stream);
     return true;
 }
@@ -58,35 +57,44 @@ private:
     bool mbIsSet = false;
 };
 
-void WriteIntoPipe(int descriptor, const char* from, const char* end) noexcept {
+#ifdef _UCRT
+
+// The runtime drops what the pipe does not accept at once.
+void WriteIntoPipe(std::FILE* stream, unsigned int) noexcept { std::fflush(stream); }
+
+#else
+
+void WriteIntoPipe(std::FILE* stream, unsigned int limit_ms) noexcept {
+    constexpr int kReads = 1;
+    constexpr int kWrites = 2;
+    std::FILE& fields = In(stream)->fields;
+    if ((fields._flag & (kReads | kWrites)) != kWrites || fields._base == nullptr) return;
     const unsigned int start = ReadTicks();
-    while (from < end && ReadTicks() - start < kOutputLimitMs) {
-        const int written = _write(descriptor, from, static_cast<unsigned int>(end - from));
+    for (const char* from = fields._base; from < fields._ptr && ReadTicks() - start < limit_ms;) {
+        const int written = _write(fields._file, from, static_cast<unsigned int>(fields._ptr - from));
         if (written > 0) {
             from += written;
         } else if (written < 0 && errno == EPIPE) {
-            return;
+            break;
         } else {
             SleepFor(kPauseMs);
         }
     }
+    fields._ptr = fields._base;
+    fields._cnt = 0;
 }
+
+#endif
 
 // Writes what the stream has pending, or drops it.
 void WritePending(std::FILE* stream) noexcept {
-    constexpr int kReads = 1;
-    constexpr int kWrites = 2;
-    StreamFields& fields = In(stream)->fields;
-    const int descriptor = _fileno(stream);
-    const auto file = reinterpret_cast<HANDLE>(_get_osfhandle(descriptor));
+    const auto file = reinterpret_cast<HANDLE>(_get_osfhandle(_fileno(stream)));
     if (GetFileType(file) != FILE_TYPE_PIPE) {
         std::fflush(stream);
-    } else if ((fields._flag & (kReads | kWrites)) == kWrites && fields._base != nullptr) {
-        const NoWait no_wait(file);
-        if (no_wait.IsSet()) WriteIntoPipe(descriptor, fields._base, fields._ptr);
-        fields._ptr = fields._base;
-        fields._cnt = 0;
+        return;
     }
+    const NoWait no_wait(file);
+    WriteIntoPipe(stream, no_wait.IsSet() ? kOutputLimitMs : 0);
 }
 
 // The null device first, for a stream of a program without a console, which has no descriptor.
@@ -104,7 +112,14 @@ bool Move(std::FILE* stream, int target) noexcept {
 
 }  // namespace
 
-bool IsClosed(std::FILE* stream) noexcept { return In(stream)->fields._flag == 0; }
+bool IsClosed(std::FILE* stream) noexcept {
+#ifdef _UCRT
+    const int descriptor = _fileno(stream);
+    return descriptor == -1 || (descriptor >= 0 && _get_osfhandle(descriptor) == -1);
+#else
+    return In(stream)->fields._flag == 0;
+#endif
+}
 
 bool RedirectStream(std::FILE* stream, int target) noexcept {
     if (!OwnWithinLimit(stream)) return false;
