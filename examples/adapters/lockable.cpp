@@ -1,5 +1,5 @@
-// A bounded queue over an HLockable, and a table of prices over an HSharedLockable, with the holders of the
-// standard library. Prints what three threads passed through them.
+// A bounded queue over an HLockable and a table of prices over an HSharedLockable, both checked by clang's analysis, and
+// the holders of the standard library. Prints what three threads passed through them.
 #include <zanbase/adapters/lockable.h>
 
 #include <condition_variable>
@@ -11,31 +11,38 @@
 
 namespace {
 
+// clang's -Wthread-safety checks every use of maItems, and below of mnPrice and mnChanges.
 class Queue {
 public:
     void Put(int item) {
-        std::unique_lock<HLockable> lock(moMutex);
-        moChanged.wait(lock, [this] { return maItems.size() < 4; });
+        HLockGuard guard(moMutex);
+        while (maItems.size() >= 4) moChanged.wait(guard);
         maItems.push_back(item);
+        guard.unlock();  // the threads that are woken find the lock free
         moChanged.notify_all();
     }
 
     int Take() {
-        std::unique_lock<HLockable> lock(moMutex);
-        moChanged.wait(lock, [this] { return !maItems.empty(); });
-        const int item = maItems.front();
-        maItems.pop_front();
+        HLockGuard guard(moMutex);
+        moChanged.wait(guard, [this]() ZANBASE_REQUIRES(moMutex) { return !maItems.empty(); });
+        const int item = RemoveFirst();
+        guard.unlock();
         moChanged.notify_all();
         return item;
     }
 
 private:
+    int RemoveFirst() ZANBASE_REQUIRES(moMutex) {
+        const int item = maItems.front();
+        maItems.pop_front();
+        return item;
+    }
+
     HLockable moMutex;
     std::condition_variable_any moChanged;
-    std::deque<int> maItems;  // guarded by moMutex
+    std::deque<int> maItems ZANBASE_GUARDED_BY(moMutex);
 };
 
-// clang's -Wthread-safety checks every use of mnPrice and mnChanges.
 class Price {
 public:
     void Raise() {
@@ -55,16 +62,24 @@ private:
     int mnChanges ZANBASE_GUARDED_BY(moMutex) = 0;
 };
 
-// Moves between two accounts; std::scoped_lock acquires both without a deadlock, whatever their order.
+// Moves between two accounts; std::scoped_lock acquires both without a deadlock, whatever their order. The analysis does
+// not see that, so the assertions tell it, and check it when the program runs.
 struct Account {
     HLockable moMutex;
-    int mnBalance = 1000;  // guarded by moMutex
+    int mnBalance ZANBASE_GUARDED_BY(moMutex) = 1000;
 };
 
 void Move(Account& from, Account& to) {
     const std::scoped_lock lock(from.moMutex, to.moMutex);
+    from.moMutex.AssertHeld();
+    to.moMutex.AssertHeld();
     --from.mnBalance;
     ++to.mnBalance;
+}
+
+int Balance(Account& account) {
+    const HLockGuard guard(account.moMutex);
+    return account.mnBalance;
 }
 
 int ReadBalance(HSharedLockable& mutex, const int& balance) {
@@ -104,6 +119,6 @@ int main() {
     for (int item = 0; item < kItems; ++item) sum += queue.Take();
     producer.join();
     watcher.join();
-    std::printf("sum %ld, balances %d, updates %d\n", sum, left.mnBalance + right.mnBalance, summary);
+    std::printf("sum %ld, balances %d, updates %d\n", sum, Balance(left) + Balance(right), summary);
     return 0;
 }

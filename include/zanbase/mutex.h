@@ -54,6 +54,7 @@ private:
     HMutex& operator=(const HMutex&) { return *this; }
 
     friend class HCondVar;
+    friend struct HLockOwner;
 
     HNativeLock* mpoCriticalSection = nullptr;  // owned; set by the constructor and never changed
 };

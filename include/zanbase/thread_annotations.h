@@ -34,6 +34,10 @@
 #define ZANBASE_GUARDED_BY(lock) ZANBASE_THREAD_ANNOTATION(guarded_by(lock))
 #define ZANBASE_PT_GUARDED_BY(lock) ZANBASE_THREAD_ANNOTATION(pt_guarded_by(lock))
 
+// On a lock: those that a thread which holds both acquires later, or earlier. clang checks it with -Wthread-safety-beta.
+#define ZANBASE_ACQUIRED_BEFORE(...) ZANBASE_THREAD_ANNOTATION(acquired_before(__VA_ARGS__))
+#define ZANBASE_ACQUIRED_AFTER(...) ZANBASE_THREAD_ANNOTATION(acquired_after(__VA_ARGS__))
+
 // On a function: what the caller must hold, must not hold, or holds afterwards (no lock named: the object).
 #define ZANBASE_REQUIRES(...) ZANBASE_THREAD_ANNOTATION(requires_capability(__VA_ARGS__))
 #define ZANBASE_REQUIRES_SHARED(...) ZANBASE_THREAD_ANNOTATION(requires_shared_capability(__VA_ARGS__))
@@ -44,6 +48,12 @@
 #define ZANBASE_RELEASE_SHARED(...) ZANBASE_THREAD_ANNOTATION(release_shared_capability(__VA_ARGS__))
 #define ZANBASE_RELEASE_GENERIC(...) ZANBASE_THREAD_ANNOTATION(release_generic_capability(__VA_ARGS__))
 #define ZANBASE_TRY_ACQUIRE(...) ZANBASE_THREAD_ANNOTATION(try_acquire_capability(__VA_ARGS__))
+#define ZANBASE_TRY_ACQUIRE_SHARED(...) ZANBASE_THREAD_ANNOTATION(try_acquire_shared_capability(__VA_ARGS__))
+
+// On a function: it checks at run time that the lock is held; or it returns a reference to the lock named.
+#define ZANBASE_ASSERT_CAPABILITY(lock) ZANBASE_THREAD_ANNOTATION(assert_capability(lock))
+#define ZANBASE_ASSERT_SHARED_CAPABILITY(lock) ZANBASE_THREAD_ANNOTATION(assert_shared_capability(lock))
+#define ZANBASE_RETURN_CAPABILITY(lock) ZANBASE_THREAD_ANNOTATION(lock_returned(lock))
 
 // On a function that the analysis can't follow; a comment beside it says why.
 #define ZANBASE_NO_THREAD_SAFETY_ANALYSIS ZANBASE_THREAD_ANNOTATION(no_thread_safety_analysis)

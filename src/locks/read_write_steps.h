@@ -104,6 +104,19 @@ struct HReadWriteSteps {
         lock.moWriterMutex.Unlock();
     }
 
+    template <class Lock>
+    static bool IsWriter(const Lock& lock, Thread self) {
+        return WriterOf(lock) == self;
+    }
+
+    template <class Lock>
+    static bool IsReader(const Lock& lock, Thread self) {
+        lock.moReaderMutex.Lock();
+        const bool is_reader = lock.moReaderThreads.count(self) != 0;
+        lock.moReaderMutex.Unlock();
+        return is_reader;
+    }
+
 private:
     template <class Lock>
     static Thread WriterOf(const Lock& lock) {

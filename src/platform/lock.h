@@ -25,6 +25,9 @@ bool TryAcquireLock(HNativeLock* lock) noexcept;
 // Releases one level; at level zero the lock is free. Requires: the calling thread owns the lock.
 void ReleaseLock(HNativeLock* lock) noexcept;
 
+// True if the calling thread owns the lock. Thread-safe.
+bool OwnsLock(const HNativeLock* lock) noexcept;
+
 // A number for the calling thread, constant for its life and below 2^64 - 1; no other living thread of the
 // process has it. Where the system can fork, the child's thread has the number of the forking thread.
 unsigned long long LockOwner() noexcept;

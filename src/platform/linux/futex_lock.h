@@ -48,6 +48,8 @@ public:
         return true;
     }
 
+    bool IsOwnedBy(Thread self) const { return mnOwner.load(std::memory_order_relaxed) == self; }
+
     // Gives back one level. Requires: the calling thread owns the lock.
     void Release() {
         if (mnDepth != 0) {
@@ -66,7 +68,7 @@ public:
 
 private:
     bool TryAcquireAgain(Thread self) {
-        if (mnOwner.load(std::memory_order_relaxed) != self) return false;
+        if (!IsOwnedBy(self)) return false;
         ++mnDepth;
         return true;
     }

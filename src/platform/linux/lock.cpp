@@ -57,6 +57,8 @@ SystemLock::Thread NumberLockThread() noexcept {
     return tnLockThread;
 }
 
+bool OwnsLock(const HNativeLock* lock) noexcept { return In(lock).IsOwnedBy(LockThread()); }
+
 unsigned long long LockOwner() noexcept { return LockThread(); }
 
 void InitLock(HNativeLock* lock) noexcept {

@@ -16,6 +16,10 @@ inline SystemLock& In(HNativeLock* lock) noexcept {
     return *std::launder(reinterpret_cast<SystemLock*>(lock->storage));
 }
 
+inline const SystemLock& In(const HNativeLock* lock) noexcept {
+    return *std::launder(reinterpret_cast<const SystemLock*>(lock->storage));
+}
+
 // The calling thread's number as an owner of locks; 0: it has none yet. Numbers are never reused.
 extern ZANBASE_FAST_THREAD_LOCAL SystemLock::Thread tnLockThread;
 

@@ -14,4 +14,10 @@ bool TryAcquireLock(HNativeLock* lock) noexcept { return TryEnterCriticalSection
 
 void ReleaseLock(HNativeLock* lock) noexcept { LeaveCriticalSection(In(lock)); }
 
+// The owner's own number is in the section for as long as it owns it, and no other thread writes that number.
+bool OwnsLock(const HNativeLock* lock) noexcept {
+    const auto section = reinterpret_cast<const CRITICAL_SECTION*>(lock->storage);
+    return reinterpret_cast<ULONG_PTR>(section->OwningThread) == GetCurrentThreadId();
+}
+
 unsigned long long LockOwner() noexcept { return GetCurrentThreadId(); }
