@@ -7,40 +7,10 @@
 #include <istream>
 #include <ostream>
 #include <string>
-#include <vector>
 
 #include "zanbase/adapters/recorded_stream.h"
 
 namespace {
-
-template <class File>
-void ExpectFailuresTold(typename File::Mode read, typename File::Mode write) {
-    std::error_code error;
-    File missing = File::Open("/no/such/file", read, error);
-    EXPECT_EQ(error, std::errc::no_such_file_or_directory);
-    EXPECT_EQ(missing.Seek(0, SEEK_SET, error), -1);
-    EXPECT_EQ(error, std::errc::bad_file_descriptor);
-    EXPECT_THROW(missing.Write("text"), std::system_error);
-    File directory = File::Open("/", read, error);
-    char byte;
-    EXPECT_EQ(directory.Read(&byte, 1, error), 0U);
-    EXPECT_EQ(error, std::errc::is_a_directory);
-    File full = File::Open("/dev/full", write, error);
-    const std::vector<char> block(100000);
-    full.Write(block.data(), block.size(), error);
-    EXPECT_EQ(error, std::errc::no_space_on_device);
-    unsigned int writes = 1;
-    EXPECT_TRUE(HDiskIOAccessFileData("/dev/full", nullptr, nullptr, nullptr, nullptr, &writes, nullptr));
-    EXPECT_EQ(writes, 0U);
-    EXPECT_FALSE(
-        HDiskIOAccessFileData("/no/such/file", nullptr, nullptr, nullptr, nullptr, nullptr, nullptr));
-    HDiskIOReset();
-}
-
-TEST(RecordedFile, TellsFailuresAndRecordsNone) {
-    ExpectFailuresTold<HRecordedFile>("r", "w");
-    ExpectFailuresTold<HRecordedDescriptor>({}, {O_WRONLY});
-}
 
 // No file of the process can be longer than `bytes` in the scope.
 class FileSizeLimit {

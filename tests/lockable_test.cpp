@@ -20,35 +20,14 @@ TEST(Lockable, KnowsWhichThreadOwnsIt) {
     const auto owns = [&] { return HLockOwner::Owns(mutex.GetMutex()); };
     EXPECT_FALSE(owns());
     mutex.lock();
-    mutex.lock();
-    mutex.unlock();
-    EXPECT_TRUE(owns());
+    {
+        HLockGuard guard(mutex);
+        guard.unlock();
+    }
+    EXPECT_TRUE(owns());  // the first level: the guard released its own level, once
     EXPECT_FALSE(AnswerOfAnother(owns));
-    mutex.unlock();
+    { const HLockGuard guard(mutex, std::adopt_lock); }
     EXPECT_FALSE(owns());
-}
-
-template <class Kind>
-void ExpectReaderAndWriterKnown() {
-    const Kind mutex;
-    const auto reads = [&] { return HLockOwner::Reads(mutex); };
-    const auto writes = [&] { return HLockOwner::Writes(mutex); };
-    mutex.ReadLock();
-    EXPECT_TRUE(reads());
-    EXPECT_FALSE(writes());
-    EXPECT_FALSE(AnswerOfAnother(reads));
-    mutex.ReadUnlock();
-    EXPECT_FALSE(reads());
-    mutex.WriteLock();
-    EXPECT_TRUE(writes());
-    EXPECT_FALSE(AnswerOfAnother(writes));
-    mutex.WriteUnlock();
-    EXPECT_FALSE(writes());
-}
-
-TEST(Lockable, KnowsItsReadersAndItsWriter) {
-    ExpectReaderAndWriterKnown<HReadPrefMutex>();
-    ExpectReaderAndWriterKnown<HWritePrefMutex>();
 }
 
 TEST(Lockable, EndsTheProcessWhereAnAssertionDoesNotHold) {
@@ -61,19 +40,6 @@ TEST(Lockable, EndsTheProcessWhereAnAssertionDoesNotHold) {
     });
     EXPECT_NE(child.exit_code, 0);
     EXPECT_NE(child.err.find("does not hold it\n"), std::string::npos) << child.err;
-}
-
-TEST(LockGuard, IsReleasedOnce) {
-    HLockable mutex;
-    const auto owns = [&] { return HLockOwner::Owns(mutex.GetMutex()); };
-    mutex.lock();
-    {
-        HLockGuard guard(mutex);
-        guard.unlock();
-    }
-    EXPECT_TRUE(owns());  // the level that was there before
-    { const HLockGuard guard(mutex, std::adopt_lock); }
-    EXPECT_FALSE(owns());
 }
 
 }  // namespace

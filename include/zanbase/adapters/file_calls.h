@@ -27,9 +27,9 @@
 
 /// The functions of the C library below `HRecordedFile`. Thread-safe for different files.
 struct HStdioCalls {
-    using Native = std::FILE*;                  ///< the open file
-    using Mode = const char*;                   ///< of `std::fopen`
-    static constexpr Native kClosed = nullptr;  ///< no file
+    using Native = std::FILE*;                      ///< the open file
+    using Mode = const char*;                       ///< of `std::fopen`
+    static constexpr std::FILE* kClosed = nullptr;  ///< no file
     /// As `std::fopen`. A mode that is null or begins with none of `r`, `w` and `a` fails with `EINVAL`.
     ZANBASE_API static Native Open(const char* name, Mode mode);
     /// Returns the bytes read; fewer than `size` at the end of the file, or before a failure. Reading lost nothing if a
