@@ -11,7 +11,9 @@
 //
 // Lock order: a reader acquires moGate, moReaderMutex, moResource; a writer acquires moGate, moResource, and
 // in its last unlock moReaderMutex inside moWriterMutex. No thread waits for moGate while it holds
-// moReaderMutex; otherwise readers could deadlock in ReadUnlock.
+// moReaderMutex; otherwise readers could deadlock in ReadUnlock. No thread waits for a semaphore while it holds
+// moWriterMutex; otherwise writers could deadlock in WriteUnlock. A thread may test them there: if they are
+// free, it need not release the mutex and acquire it again.
 //
 // Which side releases moResource: in the state "write and read" either side may leave first. The side that
 // leaves last releases the unit. Both decide inside moReaderMutex: the writer clears mnWriterThread before it
@@ -40,9 +42,7 @@ struct HReadWriteSteps {
         lock.moReaderMutex.Lock();
         if (!TryNestedReadLock(lock, self)) {
             if (lock.mnReaders == 0 && WriterOf(lock) != self) {
-                lock.moReaderMutex.Unlock();
-                lock.moGate.Lock();
-                lock.moReaderMutex.Lock();
+                AcquireGate(lock);
                 // Readers may have entered meanwhile: a writer that downgraded left its unit to them.
                 if (lock.mnReaders == 0) lock.moResource.Lock();
                 lock.moGate.Unlock();
@@ -57,14 +57,13 @@ struct HReadWriteSteps {
     static void ReadLockInTurn(Lock& lock, Thread self) {
         lock.moReaderMutex.Lock();
         const bool nested = TryNestedReadLock(lock, self);
+        if (!nested) {
+            AcquireGate(lock);
+            if (lock.mnReaders == 0) lock.moResource.Lock();
+            CountFirst(lock, self);
+        }
         lock.moReaderMutex.Unlock();
-        if (nested) return;
-        lock.moGate.Lock();
-        lock.moReaderMutex.Lock();
-        if (lock.mnReaders == 0) lock.moResource.Lock();
-        CountFirst(lock, self);
-        lock.moReaderMutex.Unlock();
-        lock.moGate.Unlock();
+        if (!nested) lock.moGate.Unlock();
     }
 
     template <Downgrade kDowngrade, class Lock>
@@ -81,14 +80,10 @@ struct HReadWriteSteps {
     template <class Lock>
     static void WriteLock(Lock& lock, Thread self) {
         lock.moWriterMutex.Lock();
-        const bool nested = lock.mnWriters != 0 && WriterOf(lock) == self;
-        if (nested) ++lock.mnWriters;
-        lock.moWriterMutex.Unlock();
-        if (nested) return;
-        lock.moGate.Lock();
-        lock.moResource.Lock();
-        lock.moWriterMutex.Lock();
-        lock.mnWriterThread.store(self, std::memory_order_relaxed);
+        if (lock.mnWriters == 0 || WriterOf(lock) != self) {
+            AcquireGateAndResource(lock);
+            lock.mnWriterThread.store(self, std::memory_order_relaxed);
+        }
         ++lock.mnWriters;
         lock.moWriterMutex.Unlock();
     }
@@ -121,6 +116,26 @@ private:
     template <class Lock>
     static Thread WriterOf(const Lock& lock) {
         return lock.mnWriterThread.load(std::memory_order_relaxed);
+    }
+
+    // Requires: moReaderMutex is held. Releases it while the thread waits.
+    template <class Lock>
+    static void AcquireGate(Lock& lock) {
+        if (lock.moGate.TryLock(0)) return;
+        lock.moReaderMutex.Unlock();
+        lock.moGate.Lock();
+        lock.moReaderMutex.Lock();
+    }
+
+    // Requires: moWriterMutex is held. Releases it while the thread waits.
+    template <class Lock>
+    static void AcquireGateAndResource(Lock& lock) {
+        const bool has_gate = lock.moGate.TryLock(0);
+        if (has_gate && lock.moResource.TryLock(0)) return;
+        lock.moWriterMutex.Unlock();
+        if (!has_gate) lock.moGate.Lock();
+        lock.moResource.Lock();
+        lock.moWriterMutex.Lock();
     }
 
     // Counts one more read lock and returns true if the thread reads already. Requires: moReaderMutex is

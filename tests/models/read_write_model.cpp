@@ -40,11 +40,17 @@ struct Semaphore {
     std::size_t place;
     void Lock() const {
         Change(place, [this](Value units) {
-            if (place == kGate && explorer.now.words[kReaderMutex] == explorer.self + 1)
+            const State& state = explorer.now;
+            if (place == kGate && state.words[kReaderMutex] == explorer.self + 1)
                 Explorer::Fail("waits for the gate with the reader mutex");
+            if (state.words[kWriterMutex] == explorer.self + 1)
+                Explorer::Fail("waits with the writer mutex");
             if (units == 0) Explorer::Block();
             return units - 1;
         });
+    }
+    bool TryLock(double) const {
+        return Change(place, [](Value units) { return units == 0 ? 0 : units - 1; }) != 0;
     }
     void Unlock() const {
         if (Add(place, 1) != 0) Explorer::Fail("released twice");

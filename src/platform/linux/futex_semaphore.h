@@ -40,8 +40,21 @@ public:
     }
 
     // False if there was no unit until the deadline. Does not spin: a unit may be long in coming.
-    bool Acquire(typename System::Deadline deadline) {
-        if (TryAcquire()) return true;
+    bool Acquire(typename System::Deadline deadline) { return TryAcquire() || AcquireContended(deadline); }
+
+    // No effect at kMost free units.
+    void Release() {
+        unsigned int seen = mnUnits.load(std::memory_order_relaxed);
+        while ((seen & kSleepers) == 0) {
+            if (seen == kMost || Change(seen, seen + 1)) return;
+        }
+        ReleaseAndWake();
+    }
+
+private:
+    static constexpr unsigned int kSleepers = ~kMost;
+
+    __attribute__((noinline)) bool AcquireContended(typename System::Deadline deadline) {
         const typename System::PendingWakeup pending(mnUnits);
         unsigned int seen = mnUnits.load(std::memory_order_relaxed);
         for (;;) {
@@ -56,8 +69,7 @@ public:
         }
     }
 
-    // No effect at kMost free units.
-    void Release() {
+    __attribute__((noinline)) void ReleaseAndWake() {
         const typename System::PendingWakeup pending(mnUnits);
         unsigned int seen = mnUnits.load(std::memory_order_relaxed);
         do {
@@ -65,9 +77,6 @@ public:
         } while (!Change(seen, (seen & kMost) + 1));
         if ((seen & kSleepers) != 0) System::WakeSleepers(mnUnits, 1);
     }
-
-private:
-    static constexpr unsigned int kSleepers = ~kMost;
 
     // On failure `seen` becomes the value that was there.
     bool Change(unsigned int& seen, unsigned int desired) {
