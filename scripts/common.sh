@@ -52,7 +52,7 @@ need() {
 
 build_packages=(g++ cmake ninja-build 'libboost1.81-dev|libboost-dev')
 test_packages=(pkg-config clang-14 libomp-14-dev libclang-rt-14-dev gettext locales libgtest-dev libgmock-dev
-    libvalijson-dev nlohmann-json3-dev libdw-dev xterm xvfb valgrind)
+    libvalijson-dev nlohmann-json3-dev libdw-dev relacy-dev xterm xvfb valgrind)
 
 # configure_and_build PRESET TARGET…: prints the build's output only if it fails.
 configure_and_build() {

@@ -22,7 +22,7 @@
 // writer has left the unit to the readers.
 //
 // mnWriterThread is relaxed: a thread acts on it only if it equals its own number, which it stored itself, or
-// inside moReaderMutex, which orders it.
+// inside moReaderMutex, which orders it (held by MemoryModel.ReadPreferringLock… and WritePreferringLock…).
 #ifndef ZANBASE_LOCKS_READ_WRITE_STEPS_H
 #define ZANBASE_LOCKS_READ_WRITE_STEPS_H
 

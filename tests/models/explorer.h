@@ -1,5 +1,5 @@
-// Runs three threads of an algorithm under every order of their steps. Steps are sequentially consistent, except for
-// stores that a model delays (futex_system.h). Loads are never reordered: the algorithms' headers argue that.
+// Runs three threads of an algorithm under every order of their steps. Steps are sequentially consistent;
+// memory_model.cpp runs the same algorithms under the memory model of C++.
 //
 // A thread makes the calls of its script, and each access to shared data is a step. To make the next step, the call
 // runs again from its start. It gets the recorded results of its earlier steps, makes the new step, and is left by an
@@ -15,11 +15,10 @@
 #include <vector>
 
 constexpr std::size_t kThreads = 3;
-constexpr std::size_t kDelayedStores = 2 * kThreads;  // the most that a model has at once
 using Value = unsigned long long;
 
 struct State {
-    std::array<Value, 26> words{};  // the shared data, and what a model notes beside it
+    std::array<Value, 22> words{};  // the shared data, and what a model notes beside it
     struct Thread {
         std::size_t call = 0;    // its place in the script
         std::vector<Value> log;  // results of the steps of this call
@@ -33,9 +32,8 @@ public:
     std::array<std::string, kThreads> scripts;  // a letter each call
     std::function<void(char)> call;
     std::function<const char*(const State&, bool at_the_end)> check;  // what is wrong, or null
-    // Both may be unset. False: not possible in this state.
-    std::function<bool(State&, std::size_t thread)> kill;    // kills a thread
-    std::function<bool(State&, std::size_t store)> deliver;  // makes a delayed store
+    // Kills a thread; false if that is not possible in this state. May be unset.
+    std::function<bool(State&, std::size_t thread)> kill;
 
     // What is wrong in some order of steps; empty if nothing is.
     std::string Explore(const State& start) {
@@ -57,12 +55,6 @@ public:
                 }
                 State killed = state;
                 if (kill && kill(killed, thread)) meet(killed);
-            }
-            for (std::size_t store = 0; deliver && store < kDelayedStores; ++store) {
-                State delivered = state;
-                if (!deliver(delivered, store)) continue;
-                at_the_end = false;
-                meet(delivered);
             }
             if (mFound == nullptr) mFound = check(state, at_the_end);
         }

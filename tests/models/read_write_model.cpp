@@ -43,8 +43,7 @@ struct Semaphore {
             const State& state = explorer.now;
             if (place == kGate && state.words[kReaderMutex] == explorer.self + 1)
                 Explorer::Fail("waits for the gate with the reader mutex");
-            if (state.words[kWriterMutex] == explorer.self + 1)
-                Explorer::Fail("waits with the writer mutex");
+            if (state.words[kWriterMutex] == explorer.self + 1) Explorer::Fail("waits with the writer mutex");
             if (units == 0) Explorer::Block();
             return units - 1;
         });

@@ -9,8 +9,8 @@
 // wake-up between its release of the lock and its sleep is lost. While the word is even, Signal and Broadcast
 // return after one load.
 //
-// Memory order. All accesses are relaxed: the lock orders the data that the caller waits for. Two pairs of
-// accesses have to be ordered, and other means do it:
+// Memory order (held by MemoryModel.ConditionNeedsTheOrdersOfItsLock). All accesses are relaxed: the lock orders
+// the data that the caller waits for. Two pairs of accesses have to be ordered, and other means do it:
 //   A waiter's fetch_or happens before its release of the lock. A thread that has acquired the lock since
 // therefore reads the bit, or a value that followed it, when it signals. A thread that signals without the
 // lock after releasing it is covered as well: its acquisition happened after the waiter's release.

@@ -10,7 +10,7 @@
 // it sleeps again. So if sleepers exist and the bit is clear, a woken waiter is about to set it. More units may
 // have been released meanwhile without a wake-up: a woken waiter that leaves units wakes the next sleeper.
 //
-// Memory order. Every change is a compare-and-exchange with acq_rel. The release half publishes what the thread
+// Memory order (held by MemoryModel.SemaphoreNeedsItsOrders). Every change is a compare-and-exchange with acq_rel. The release half publishes what the thread
 // did before Release; the acquire half of a later change makes it visible. All changes are read-modify-writes,
 // so each of them continues the release sequence of all earlier ones: every Release happens-before each later
 // acquisition. Loads are relaxed: they only choose the value that the next change expects, and a failed change

@@ -9,11 +9,17 @@
 
 struct FutexSystem {
     using Word = FutexWord;
-    using Owner = std::atomic<unsigned long long>;
+    using DoubleWord = std::atomic<unsigned long long>;
     using Deadline = const timespec*;  // null: none
     using PendingWakeup = ::PendingWakeup;
     using PendingSignal = ::PendingSignal;
     static constexpr int kEverySleeper = ::kEverySleeper;
+
+    // For the kernel, which takes 32 bits: what it compares, and the address that a sleeper is known by.
+    static Word& LowerHalf(DoubleWord& word) noexcept {
+        constexpr int kHalf = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__ ? 0 : 1;
+        return reinterpret_cast<Word*>(&word)[kHalf];
+    }
 
     // True if the process has one thread, as far as the C library knows.
     static bool IsAlone() noexcept { return __libc_single_threaded != 0; }

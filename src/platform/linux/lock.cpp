@@ -7,7 +7,7 @@
 
 namespace {
 
-std::atomic<SystemLock::Thread> gnLastThread{0};
+std::atomic<SystemLock::Thread> gnLastThread{0};  // even
 
 // The operations as the thread sanitizer is shown them. All locks are shown, also those of the library's own
 // tables: they order threads as well. The block mutex alone is not (thread_block.cpp).
@@ -45,7 +45,7 @@ void EndAcquire(HNativeLock* lock, unsigned int flags) noexcept {
 [[gnu::cold, gnu::noinline]] void ReleaseWatched(HNativeLock* lock) noexcept {
     __tsan_mutex_pre_unlock(lock, 0);
     __tsan_mutex_post_unlock(lock, 0);
-    In(lock).Release();
+    In(lock).Release(tnLockThread);
 }
 
 }  // namespace
@@ -53,7 +53,7 @@ void EndAcquire(HNativeLock* lock, unsigned int flags) noexcept {
 ZANBASE_FAST_THREAD_LOCAL SystemLock::Thread tnLockThread = 0;
 
 SystemLock::Thread NumberLockThread() noexcept {
-    tnLockThread = gnLastThread.fetch_add(1, std::memory_order_relaxed) + 1;
+    tnLockThread = gnLastThread.fetch_add(2, std::memory_order_relaxed) + 2;
     return tnLockThread;
 }
 
@@ -86,5 +86,5 @@ bool TryAcquireLock(HNativeLock* lock) noexcept {
 
 void ReleaseLock(HNativeLock* lock) noexcept {
     if (IsThreadSanitizerOn()) return ReleaseWatched(lock);
-    In(lock).Release();
+    In(lock).Release(tnLockThread);
 }

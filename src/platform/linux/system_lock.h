@@ -20,7 +20,8 @@ inline const SystemLock& In(const HNativeLock* lock) noexcept {
     return *std::launder(reinterpret_cast<const SystemLock*>(lock->storage));
 }
 
-// The calling thread's number as an owner of locks; 0: it has none yet. Numbers are never reused.
+// The calling thread's number as an owner of locks; 0: it has none yet. Numbers are even and never
+// reused.
 extern ZANBASE_FAST_THREAD_LOCAL SystemLock::Thread tnLockThread;
 
 // Gives the calling thread its number.

@@ -109,7 +109,7 @@ void BlockMutex::Acquire() noexcept ZANBASE_NO_THREAD_SAFETY_ANALYSIS {  // this
 }
 
 void BlockMutex::Release() noexcept ZANBASE_NO_THREAD_SAFETY_ANALYSIS {
-    In(&goLock).Release();
+    In(&goLock).Release(tnLockThread);
     DeferKill::End();
 }
 
