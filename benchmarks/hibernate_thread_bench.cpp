@@ -7,7 +7,7 @@
 #include <mutex>
 #include <thread>
 
-#include "one_processor.h"
+#include "placement.h"
 #include "ratios.h"
 
 namespace {

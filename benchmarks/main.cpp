@@ -1,6 +1,6 @@
 // Runs the benchmarks in a shuffled order, several times each, and prints the ratio table; if ZANBASE_RATIOS of the
-// environment names a file, the rows are written there too. The fastest of the repetitions counts: on a busy
-// machine it is the one least disturbed.
+// environment names a file, the rows are written there too. The fastest of the repetitions counts, and in rows of
+// one thread its processor time: on a busy machine those are least disturbed.
 #include <benchmark/benchmark.h>
 
 #include <algorithm>
@@ -39,7 +39,8 @@ public:
         for (const Run& run : runs) {
             if (run.aggregate_name == "median") medians.push_back(run);
             if (run.run_type != Run::RT_Iteration || run.error_occurred) continue;
-            const double time = run.GetAdjustedRealTime();
+            const bool on_one_thread = run.run_name.time_type.empty();
+            const double time = on_one_thread ? run.GetAdjustedCPUTime() : run.GetAdjustedRealTime();
             const auto [entry, is_new] = mTimes.emplace(run.run_name.str(), time);
             if (!is_new) entry->second = std::min(entry->second, time);
         }

@@ -126,7 +126,8 @@ bool AddRows() {
     for (const std::string order : {"/order:0", "/order:1"}) {
         for (const std::string live : {"1000", "4000", "100000", "1000000"}) {
             const std::string name = "TrackerPair/live:" + live + order;
-            AddRatio(name, "Plain" + name, live == "4000" ? 1.0 : 0);
+            const double goal = live == "1000000" ? 1.2 : live == "100000" ? 0 : 0.9;
+            AddRatio(name, "Plain" + name, goal);
         }
         AddRatio("TrackerPair/live:1000000" + order, "TrackerPair/live:1000" + order, 4.0);
     }

@@ -9,6 +9,7 @@
 #include <mutex>
 #include <string>
 
+#include "placement.h"
 #include "ratios.h"
 #include "zanbase/memory.h"
 
@@ -36,6 +37,7 @@ Mutex shared_mutex;
 // Holds the mutex for `state.range(0)` steps; each thread asks for it again at once.
 template <class Mutex>
 void MutexPair(benchmark::State& state) {
+    const OwnProcessor own_processor(state.thread_index());
     const auto steps = state.range(0);
     for (auto _ : state) {
         shared_mutex<Mutex>.Lock();
@@ -54,7 +56,20 @@ void MutexPairWithoutThreads(benchmark::State& state) {
     }
 }
 
+// An acquisition by the owner.
+template <class Mutex>
+void NestedMutexPair(benchmark::State& state) {
+    Mutex mutex;
+    mutex.Lock();
+    for (auto _ : state) {
+        mutex.Lock();
+        mutex.Unlock();
+    }
+    mutex.Unlock();
+}
+
 void TrackedPair(benchmark::State& state) {
+    const OwnProcessor own_processor(state.thread_index());
     void* const block = std::malloc(8);
     for (auto _ : state) {
         HMemory::Alloc(block, 8, __FILE__, __LINE__);
@@ -69,6 +84,8 @@ BENCHMARK_TEMPLATE(MutexPair, Ours)->Arg(0)->Threads(1)->Threads(2)->Threads(4)-
 BENCHMARK_TEMPLATE(MutexPair, Standard)->Arg(0)->Threads(1)->Threads(2)->Threads(4)->UseRealTime();
 BENCHMARK_TEMPLATE(MutexPair, Ours)->Arg(300)->Arg(3000)->Threads(2)->UseRealTime();
 BENCHMARK_TEMPLATE(MutexPair, Standard)->Arg(300)->Arg(3000)->Threads(2)->UseRealTime();
+BENCHMARK_TEMPLATE(NestedMutexPair, Ours);
+BENCHMARK_TEMPLATE(NestedMutexPair, Standard);
 BENCHMARK(TrackedPair)->Threads(1)->Threads(2)->UseRealTime();
 
 bool AddRows() {
@@ -82,6 +99,7 @@ bool AddRows() {
     compare("/0/real_time/threads:4", 1.1);
     compare("/300/real_time/threads:2", 1.05);
     compare("/3000/real_time/threads:2", 1.05);
+    AddRatio("NestedMutexPair<Ours>", "NestedMutexPair<Standard>", 0);
     return AddRatio("TrackedPair/real_time/threads:2", "TrackedPair/real_time/threads:1", 4.0);
 }
 const bool rows = AddRows();

@@ -13,6 +13,7 @@
 #include <thread>
 #include <vector>
 
+#include "placement.h"
 #include "ratios.h"
 
 namespace {
@@ -46,6 +47,19 @@ void ReadPair(benchmark::State& state) {
     for (auto _ : state) {
         mutex.ReadLock();
         mutex.ReadUnlock();
+    }
+}
+
+template <class Mutex>
+Mutex shared_lock;
+
+// Each thread reads again at once.
+template <class Mutex>
+void SharedReadPair(benchmark::State& state) {
+    const OwnProcessor own_processor(state.thread_index());
+    for (auto _ : state) {
+        shared_lock<Mutex>.ReadLock();
+        shared_lock<Mutex>.ReadUnlock();
     }
 }
 
@@ -115,6 +129,9 @@ BENCHMARK_TEMPLATE(ReadPair, HReadPrefMutex);
 BENCHMARK_TEMPLATE(ReadPair, HWritePrefMutex);
 BENCHMARK_TEMPLATE(ReadPair, BoostShared);
 BENCHMARK_TEMPLATE(ReadPair, System);
+BENCHMARK_TEMPLATE(SharedReadPair, HReadPrefMutex)->Threads(2)->UseRealTime();
+BENCHMARK_TEMPLATE(SharedReadPair, HWritePrefMutex)->Threads(2)->UseRealTime();
+BENCHMARK_TEMPLATE(SharedReadPair, BoostShared)->Threads(2)->UseRealTime();
 BENCHMARK_TEMPLATE(NestedReadPair, HReadPrefMutex);
 BENCHMARK_TEMPLATE(NestedReadPair, HWritePrefMutex);
 BENCHMARK_TEMPLATE(NestedReadPair, System);
@@ -132,11 +149,13 @@ BENCHMARK_TEMPLATE(LongestWait, BoostShared, false)->Iterations(1)->UseRealTime(
 BENCHMARK_TEMPLATE(LongestWait, System, false)->Iterations(1)->UseRealTime();
 
 bool AddRows() {
+    const std::string both = "/real_time/threads:2";
     for (const std::string ours : {"<HReadPrefMutex>", "<HWritePrefMutex>"}) {
-        AddRatio("NestedReadPair" + ours, "NestedReadPair<System>", 1.0);
+        AddRatio("NestedReadPair" + ours, "NestedReadPair<System>", 1.5);
+        AddRatio("SharedReadPair" + ours + both, "SharedReadPair<BoostShared>" + both, 1.0);
         for (const std::string pair : {"ReadPair", "WritePair"}) {
-            AddRatio(pair + ours, pair + "<BoostShared>", 1.0);
-            AddRatio(pair + ours, pair + "<System>", 3.0);
+            AddRatio(pair + ours, pair + "<BoostShared>", 0.95);
+            AddRatio(pair + ours, pair + "<System>", 0);
         }
     }
     return true;

@@ -6,7 +6,7 @@
 
 #include <thread>
 
-#include "one_processor.h"
+#include "placement.h"
 #include "ratios.h"
 
 namespace {

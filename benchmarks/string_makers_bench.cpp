@@ -46,7 +46,7 @@ const bool rows = [] {
         .Beside("snprintf and string", PrintedInt, 0);
     Ours("MkString(long long)", Integers<long long>(), OfInt64).Beside("std::to_string", StdOfInt64, 1.1);
     Ours("MkString(double, 3)", Reals(2), OfDouble).Beside("snprintf and string", PrintedDouble, 1.1);
-    Ours("MkString(format)", Integers<int>(), OfFormat).Beside("snprintf and string", PrintedFormat, 1.1);
+    Ours("MkString(format)", Integers<int>(), OfFormat).Beside("snprintf and string", PrintedFormat, 1.08);
     Ours("MkTokenString", Integers<int>(), OfTokens).Beside("std::string +", StdOfTokens, 0);
     return true;
 }();

@@ -50,9 +50,9 @@ TEST(FutexModel, LockHasOneOwnerAndLosesNoWakeUp) {
     explorer.kill = Kill;
     explorer.call = CallLock;
     const auto is_available = [](const State&) { return true; };
-    const Scripts scripts{"ARAR", "AR", "AR"};
-    EXPECT_EQ(Explore(kWord, is_available, scripts), "");
-    EXPECT_EQ(Explore(kWord, is_available, scripts, Fault::kForgetsWakeups), "asleep");
+    EXPECT_EQ(Explore(kWord, is_available, {"AR", "AR", "AR"}), "");
+    EXPECT_EQ(Explore(kWord, is_available, {"ARAR", "ARAR", ""}), "");
+    EXPECT_EQ(Explore(kWord, is_available, {"AR", "AR", "AR"}, Fault::kForgetsWakeups), "asleep");
 }
 
 // A: acquire; a: acquire before a deadline; R: release.
