@@ -37,6 +37,10 @@ TEST(HThread, RunsOnceForEachStart) {
     EXPECT_EQ(runs, 2);
 }
 
+struct Loud {
+    ~Loud() { std::puts("destroyed"); }
+};
+
 TEST(HThread, PrintsHowItEndedAndCanBeStartedAgain) {
     static Runner* current = nullptr;
     struct End {
@@ -48,7 +52,7 @@ TEST(HThread, PrintsHowItEndedAndCanBeStartedAgain) {
     const End ends[] = {
         {"return", [] {}, ""},
         {"exception", [] { throw std::runtime_error("bad"); }, "HThread::_Run_() Uncaught exception: bad\n"},
-        {"number", [] { throw 7; }, unknown},
+        {"object", [] { throw Loud(); }, unknown + "destroyed\n"},
         {"null", WriteToNull, unknown},
         {"division", DivideByZero, unknown},
         {"instruction", RunIllegalInstruction, unknown},
@@ -124,7 +128,7 @@ TEST(HThread, IsAwaitedWithItsTlsDestructorsAndRunsNoneWhenKilled) {
 }
 
 TEST(HThread, RunsOnDetachedWhileItsObjectOwnsAnother) {
-    const HSemaphore left(0), leave[2] = {0, 0};
+    const HSemaphore left(0), leave[3] = {0, 0, 1};
     std::atomic<int> runs{0};
     Runner runner([&] {
         leave[runs++].Lock();
@@ -139,6 +143,9 @@ TEST(HThread, RunsOnDetachedWhileItsObjectOwnsAnother) {
     leave[0].Unlock();
     left.Lock();
     EXPECT_TRUE(runner.IsRunning());  // the end of the first thread has left the second alone
+    Runner::_Run_(&runner);           // waits for nothing: the third of the runs
+    EXPECT_FALSE(runner.IsRunning());
     leave[1].Unlock();
-    runner.Wait();
+    left.Lock();
+    left.Lock();
 }

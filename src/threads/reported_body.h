@@ -11,16 +11,15 @@
 // Calls body(argument). If an exception or a machine fault ends it, prints one line on standard output that
 // begins with `where`. Thread-safe.
 inline void RunReported(const char* where, void (*body)(void*), void* argument) {
+    const auto report_unknown = [=] { std::printf("%s Unknown exception.\n", where); };
     try {
-        if (!RunGuarded(body, argument)) return;
-        // A machine fault counts as an exception of no known type.
+        if (RunGuarded(body, argument)) report_unknown();  // a machine fault
     } catch (const std::exception& exception) {
         std::printf("%s Uncaught exception: %s\n", where, exception.what());
-        return;
     } catch (...) {
         RethrowThreadExit();
+        report_unknown();  // before the exception is destroyed
     }
-    std::printf("%s Unknown exception.\n", where);
 }
 
 #endif

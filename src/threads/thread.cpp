@@ -11,6 +11,8 @@ static_assert(sizeof(ThreadSlot) == sizeof(void*));
 
 namespace {
 
+constexpr char kRunName[] = "HThread::_Run_()";
+
 // The platform's level for a priority; values beyond the last count as normal.
 int LevelOf(HThreadPriority priority) {
     return static_cast<int>(priority <= HThreadPriorityTimeCritical ? priority : HThreadPriorityNormal);
@@ -29,7 +31,12 @@ HThread& HThread::operator=(const HThread&) { return *this; }
 bool HThread::Start(bool) {
     if (IsRunning()) return false;
     const CallerFrame caller(__builtin_return_address(0));
-    const auto body = [](void* thread) { _Run_(static_cast<HThread*>(thread)); };
+    // Not _Run_, because the object may own another thread when this one ends. The platform layer empties
+    // mpoThread if it still points to this thread: the last access to the object.
+    const auto body = [](void* thread) {
+        const auto run = [](void* object) { static_cast<HThread*>(object)->Run(); };
+        RunReported(kRunName, run, thread);
+    };
     if (const int error = StartThread(mpoThread, body, this)) {
         std::printf("HThread::Start(%p) Error: %s\n", static_cast<void*>(this),
                     SystemErrorText(error).c_str());
@@ -62,9 +69,8 @@ void HThread::Yield() { YieldThread(); }
 
 void HThread::DestroyThread() { DetachThread(mpoThread); }
 
-// When this returns, the platform layer empties mpoThread if it still points to this thread: the last access
-// to the object. DestroyThread can't do that here, because the object may own another thread by now.
 void HThread::_Run_(HThread* thread) {
     RunReported(
-        "HThread::_Run_()", [](void* object) { static_cast<HThread*>(object)->Run(); }, thread);
+        kRunName, [](void* object) { static_cast<HThread*>(object)->Run(); }, thread);
+    thread->DestroyThread();
 }

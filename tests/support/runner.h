@@ -12,6 +12,7 @@ class Runner : public HThread {
 public:
     Runner(std::function<void()> run) : moRun(std::move(run)) {}
 
+    using HThread::_Run_;
     using HThread::DestroyThread;
 
     void RunToEnd() {
