@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <pty.h>
+#include <sys/resource.h>
 #include <utmp.h>
 
 #include <thread>
@@ -86,6 +87,34 @@ TEST(Console, WaitsForNoReaderAndNoFullPipe) {
         close(output[1]);
         EXPECT_EQ(TextUntilTheEnd(screen), "wide narrow");
         EXPECT_EQ(TextUntilTheEnd(output[0]), filled == 0 ? "pending" : filling);
+    }
+}
+
+// Pending output needs two descriptors; here the console leaves none, one, or only that of the output.
+TEST(Console, WritesPendingOutputThoughDescriptorsAreShort) {
+    for (const int spare : {0, 1, -1}) {
+        int screen = -1, terminal = -1, output[2];
+        ASSERT_EQ(openpty(&screen, &terminal, nullptr, nullptr, nullptr), 0);
+        ASSERT_EQ(pipe(output), 0);
+        const ChildResult child = RunInChild([&] {
+            login_tty(terminal);
+            dup2(output[1], STDOUT_FILENO);
+            close_range(STDERR_FILENO + 1, ~0U, 0);
+            std::printf("pending");
+            if (spare < 0) close(STDOUT_FILENO);
+            const rlim_t most = STDERR_FILENO + 2 + static_cast<rlim_t>(spare < 0 ? 9 : spare);
+            const rlimit limit{most, most};
+            setrlimit(RLIMIT_NOFILE, &limit);
+            CLAIM(CreateConsole() == 1);
+            std::printf("text");
+            std::_Exit(0);  // flushes nothing
+            return 0;
+        });
+        EXPECT_EQ(child.exit_code, 0);
+        close(terminal);
+        close(output[1]);
+        EXPECT_EQ(TextUntilTheEnd(screen), "text");
+        EXPECT_EQ(TextUntilTheEnd(output[0]), spare < 0 ? "" : "pending");
     }
 }
 

@@ -25,13 +25,18 @@ private:
     int mnDescriptor;
 };
 
-// Opens `path` for reading and writing on a descriptor above those of the standard streams, even if one of
-// those is free. The descriptor is closed on exec. The file never becomes the controlling terminal. -1 on
-// failure.
-inline int OpenAboveStreams(const char* path) noexcept {
-    Descriptor opened(open(path, O_RDWR | O_NOCTTY | O_CLOEXEC));
+// Moves an open descriptor above those of the standard streams, even if one of those is free: a file there would
+// be taken for the stream's. Returns the descriptor, closed on exec if it was moved, or -1 on failure.
+inline int MoveAboveStreams(int descriptor) noexcept {
+    Descriptor opened(descriptor);
     if (opened.Get() > STDERR_FILENO) return opened.Release();
     return fcntl(opened.Get(), F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+}
+
+// Opens `path` for reading and writing on a descriptor above those of the standard streams. The descriptor is
+// closed on exec. The file never becomes the controlling terminal. -1 on failure.
+inline int OpenAboveStreams(const char* path) noexcept {
+    return MoveAboveStreams(open(path, O_RDWR | O_NOCTTY | O_CLOEXEC));
 }
 
 #endif

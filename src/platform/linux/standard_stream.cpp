@@ -4,6 +4,7 @@
 
 #include <cerrno>
 #include <csignal>
+#include <cstdlib>
 #include <ctime>
 #include <cwchar>
 
@@ -63,12 +64,18 @@ bool IsRegularFile(int descriptor) noexcept {
     return fstat(descriptor, &status) == 0 && S_ISREG(status.st_mode);
 }
 
+// An upper limit of what a flush of the stream writes.
+std::size_t PendingBytes(std::FILE* stream) noexcept {
+    const std::size_t most_per_character = std::fwide(stream, 0) > 0 ? MB_CUR_MAX : 1;
+    return __fpending(stream) * most_per_character;
+}
+
 // Opens the file of `descriptor` again for writes that never block: O_NONBLOCK on the descriptor itself would
 // affect every process that shares it. Sockets can't be opened again; they get a plain copy of the descriptor.
 int OpenForPieces(int descriptor) noexcept {
     char path[40];
     std::snprintf(path, sizeof path, "/proc/self/fd/%d", descriptor);
-    const int opened = open(path, O_WRONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
+    const int opened = MoveAboveStreams(open(path, O_WRONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
     return opened >= 0 ? opened : fcntl(descriptor, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
 }
 
@@ -88,6 +95,21 @@ void CopyWithinLimit(int from, int to) noexcept {
         if (written < 0 && errno != EAGAIN && errno != EINTR) return;
         if (written > 0) done += written;
     }
+}
+
+// True if a write of `bytes` does not have to wait, as long as no other process writes to the same file.
+bool HasRoom(int descriptor, std::size_t bytes) noexcept {
+    pollfd writable{descriptor, POLLOUT, 0};
+    return bytes <= kPieceBytes && poll(&writable, 1, 0) == 1;
+}
+
+// Writes pending output where there is no descriptor to collect it: what the file accepts at once. `previous` is
+// the result of OpenForPieces.
+void FlushWithoutWaiting(std::FILE* stream, int previous) noexcept {
+    const SigPipeBlock block;
+    const bool never_blocks = previous >= 0 && (fcntl(previous, F_GETFL) & O_NONBLOCK) != 0;
+    if (never_blocks ? dup2(previous, fileno(stream)) >= 0 : HasRoom(fileno(stream), PendingBytes(stream)))
+        std::fflush(stream);
 }
 
 // setvbuf doesn't reach the buffer of a wide-oriented stream. freopen drops that buffer and the orientation.
@@ -110,13 +132,18 @@ void RedirectStream(std::FILE* stream, int target) noexcept {
     // Regular files are flushed in place: they don't block, and a stream seeks in them.
     const bool may_block = __fpending(stream) != 0 && !IsRegularFile(descriptor);
     const Descriptor previous(may_block ? OpenForPieces(descriptor) : -1);
-    const Descriptor collected(may_block ? memfd_create("pending output", MFD_CLOEXEC) : -1);
-    if (!may_block || dup2(collected.Get(), descriptor) >= 0) std::fflush(stream);
+    const Descriptor collected(may_block ? MoveAboveStreams(memfd_create("pending output", MFD_CLOEXEC))
+                                         : -1);
+    if (may_block && collected.Get() < 0) {
+        FlushWithoutWaiting(stream, previous.Get());
+    } else if (!may_block || dup2(collected.Get(), descriptor) >= 0) {
+        std::fflush(stream);
+    }
     __fpurge(stream);  // input that can't be given back, and output that could not be collected
     DropWideBuffer(stream);
     dup2(target, descriptor);
     std::clearerr(stream);
     std::setvbuf(stream, nullptr, _IONBF, 0);
     funlockfile(stream);
-    if (may_block) CopyWithinLimit(collected.Get(), previous.Get());
+    if (previous.Get() >= 0) CopyWithinLimit(collected.Get(), previous.Get());
 }
