@@ -6,7 +6,8 @@
 // ended it: an invalid memory access, an integer division by zero, an illegal instruction; on a thread of
 // StartThread also an exhausted stack. The frames of the body are abandoned without unwinding, and what they
 // held stays held. Wake-ups that they had to forward are forwarded. Exceptions pass through. Frames nest; the
-// innermost receives.
+// innermost receives. After a fault the thread handles and throws the exceptions that it did at the call, and
+// keeps rounding and traps of floating-point operations as the body had them.
 //
 // Where faults are signals: faults of threads without a frame, and fault signals that were sent, are passed to
 // the handler that the program had before the first call of this function or of StartThread. A handler that

@@ -3,12 +3,24 @@
 
 #include <csetjmp>
 
+#include <cxxabi.h>
 #include <pthread.h>
 #include <signal.h>
 
 #include "platform/linux/fault_handlers.h"
+#include "platform/linux/thread_place.h"
 #include "platform/linux/thread_self.h"
 #include "platform/linux/thread_wait.h"
+
+// What the C++ runtime keeps of a thread's exceptions, as the C++ ABI of 64-bit processors lays it out.
+struct ExceptionState {
+    void* mpoCaught;          // those whose handlers run, by a list
+    unsigned int mnUncaught;  // those that are being thrown
+
+    static ExceptionState& OfThread() noexcept {
+        return *reinterpret_cast<ExceptionState*>(abi::__cxa_get_globals());
+    }
+};
 
 // Part of RunGuarded's stack frame. The frames of a thread form a stack.
 struct FaultFrame {
@@ -18,7 +30,8 @@ struct FaultFrame {
     FaultFrame& operator=(const FaultFrame&) = delete;
 
     FaultFrame* mpoOuter;
-    sigset_t moBlocked;  // the signals that a fault leaves blocked
+    sigset_t moBlocked;           // the signals that a fault leaves blocked
+    ExceptionState moExceptions;  // as a fault leaves it
     sigjmp_buf moPlace;
 };
 
@@ -82,13 +95,15 @@ void OnFault(int signal, siginfo_t* info, void* context) {
     // not hold the block mutex that the second acquires.
     ForwardPendingWakeups();
     AbandonWait();
+    ExceptionState::OfThread() = frame->moExceptions;
     pthread_sigmask(SIG_SETMASK, &frame->moBlocked, nullptr);
+    RestoreFloatControl(*static_cast<const ucontext_t*>(context));
     JumpTo(frame->moPlace, 1);
 }
 
 }  // namespace
 
-FaultFrame::FaultFrame() noexcept : mpoOuter(toSelf.mpoFrame) {
+FaultFrame::FaultFrame() noexcept : mpoOuter(toSelf.mpoFrame), moExceptions(ExceptionState::OfThread()) {
     toSelf.mpoFrame = this;
     sigset_t faults;
     sigemptyset(&faults);

@@ -1,4 +1,4 @@
-// What the registers of an interrupted thread tell, for each processor.
+// The registers of an interrupted thread, for each processor.
 #ifndef ZANBASE_PLATFORM_LINUX_THREAD_PLACE_H
 #define ZANBASE_PLATFORM_LINUX_THREAD_PLACE_H
 
@@ -22,6 +22,14 @@ inline ThreadPlace PlaceIn(const ucontext_t& context) noexcept {
 
 inline long long ResultIn(const ucontext_t& context) noexcept { return context.uc_mcontext.gregs[REG_RAX]; }
 
+// Sets rounding and traps of floating-point operations as the interrupted code had them; the system gives a
+// signal handler the defaults.
+inline void RestoreFloatControl(const ucontext_t& context) noexcept {
+    const auto* const state = context.uc_mcontext.fpregs;
+    if (state == nullptr) return;
+    __asm__ volatile("fldcw %0\n\tldmxcsr %1" : : "m"(state->cwd), "m"(state->mxcsr));
+}
+
 #elif defined(__aarch64__)
 
 constexpr bool kKnowsPlaces = true;
@@ -35,12 +43,15 @@ inline long long ResultIn(const ucontext_t& context) noexcept {
     return static_cast<long long>(context.uc_mcontext.regs[0]);
 }
 
+inline void RestoreFloatControl(const ucontext_t&) noexcept {}  // a handler runs with those of the thread
+
 #else  // places are not looked at
 
 constexpr bool kKnowsPlaces = false;
 constexpr unsigned char kSystemCallCode[] = {0};
 inline ThreadPlace PlaceIn(const ucontext_t&) noexcept { return {}; }
 inline long long ResultIn(const ucontext_t&) noexcept { return 0; }
+inline void RestoreFloatControl(const ucontext_t&) noexcept {}
 
 #endif
 
