@@ -1,9 +1,10 @@
 /// @file
 /// The re-entrant mutex and its scoped holder. All other locks and the library's global tables use them.
 ///
-/// Lock order: no operation of the library holds two of the library's own mutexes at once. A program that
-/// holds several mutexes at once must acquire them in one order everywhere; otherwise its threads can
-/// deadlock.
+/// Lock order: no operation of the library waits for the mutex of one of its tables while it holds that of
+/// another. A program that holds several mutexes at once must acquire them in one order everywhere; otherwise its
+/// threads can deadlock. While its own code runs under the mutex of a table, as `operator new` or in a class
+/// derived from `HMemory`, that mutex is one of them.
 #ifndef ZANBASE_MUTEX_H
 #define ZANBASE_MUTEX_H
 
@@ -16,8 +17,8 @@
 
 struct HNativeLock;
 
-/// A re-entrant mutex: the thread that owns it can acquire it again without blocking. It is free again once
-/// that thread has released it as often as it acquired it.
+/// A re-entrant mutex: the thread that owns it can acquire it again without blocking, up to 2^32 levels deep on
+/// Linux and 2^31 - 1 on Windows. It is free again once that thread has released it as often as it acquired it.
 ///
 ///     HMutex mutex;
 ///     { HMutexLock lock(&mutex);  /* one thread at a time */ }

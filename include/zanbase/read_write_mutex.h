@@ -30,10 +30,12 @@
 /// next acquisition of the write lock. Which of several waiting threads wakes first is unspecified.
 ///
 /// Misuse is not detected. A thread that holds a read lock and asks for the write lock deadlocks with itself.
-/// Destroying a lock that is held or waited for has undefined behaviour. A thread killed by `HThread::Kill`
-/// holds for ever what it holds, and a unit handed to it at that moment is lost: other threads may wait for
-/// ever. After `fork` the child's thread holds what the forking thread held; locks of other threads stay held
-/// for ever there.
+/// Destroying a lock that is held or waited for has undefined behaviour, and so has destroying it while another
+/// thread is still inside an unlock: that the lock could be acquired does not mean that the other thread has
+/// returned. A thread killed by `HThread::Kill` holds for ever what it holds, and a unit handed to it at that
+/// moment is lost: other threads may wait for ever. After `fork` the child's thread holds what the forking
+/// thread held; locks of other threads stay held for ever there. If another thread waited for the write lock or
+/// was inside an operation at the moment of the `fork`, the lock can't be used in the child either.
 ///
 /// When not to use it: acquiring a read lock costs a few times what a `HMutex` costs. It pays where readers
 /// stay inside for long.
@@ -42,7 +44,7 @@ public:
     HReadWriteMutex() = default;
     /// Makes a lock of its own; nothing is copied.
     HReadWriteMutex(const HReadWriteMutex&) = default;
-    /// Requires: no thread holds the lock or waits for it. Not thread-safe.
+    /// Requires: no thread holds the lock, waits for it or is inside an unlock. Not thread-safe.
     virtual ~HReadWriteMutex();
 
     /// Acquires one read lock; waits until the thread may read. Throws `std::bad_alloc` if there is no memory

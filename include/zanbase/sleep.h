@@ -14,6 +14,7 @@
 /// The default routine sleeps for whole milliseconds, `microseconds` / 1000, and repeats that until a tenth
 /// of the requested time, and at least one tick of a millisecond clock, has passed. Below 1000 microseconds
 /// it yields the processor until the clock ticks, which keeps a processor busy when no other thread is ready.
+/// It is not a cancellation point: a request of `pthread_cancel` stays pending. A signal does not end it.
 /// Don't use it where an event can be waited for: `HSemaphore` and `HCondVar` wake at once.
 ZANBASE_API void USleep(int microseconds);
 
