@@ -1,16 +1,21 @@
 // What threads are on Linux: nice values, keys and exits of POSIX, and the child of a fork.
 #include <gtest/gtest.h>
 #include <pthread.h>
+#include <signal.h>
 #include <sys/resource.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <climits>
 #include <sstream>
 #include <thread>
 
+#include "support/blocked_thread.h"
 #include "support/run_in_child.h"
 #include "support/runner.h"
 #include "zanbase/semaphore.h"
+
+extern "C" __attribute__((weak)) void __tsan_init();  // defined under the thread sanitizer
 
 TEST(HThread, IsIdleInTheChildOfAFork) {
     const HSemaphore never(0);
@@ -70,6 +75,82 @@ TEST(HThread, StartsWithoutTheKeysOfAKilledThread) {
     }
 }
 
+TEST(HThread, IsAwaitedWithKeysThatAreSetAgain) {
+    if (__tsan_init != nullptr) GTEST_SKIP() << "the tool ends its own record of the thread in the last pass";
+    static pthread_key_t key;
+    static int passes = 0;
+    pthread_key_create(&key, [](void* value) {
+        ++passes;
+        pthread_setspecific(key, value);
+    });
+    const HSemaphore leave(0);
+    Runner runner([&] {
+        pthread_setspecific(key, &key);
+        leave.Lock();
+    });
+    runner.Start(true);
+    std::thread releaser([&, waiter = HThread::GetCurrentThreadId()] {
+        AwaitSleepOf(waiter);
+        leave.Unlock();
+    });
+    runner.Wait();
+    EXPECT_EQ(passes, PTHREAD_DESTRUCTOR_ITERATIONS);
+    releaser.join();
+}
+
+// Each operation is one in which a kill has to wait, and `end` lets it go on.
+TEST(HThread, IsKilledWhenItsSignalComesThrough) {
+    const HSemaphore entered(0), leave(0);
+    const auto block_all = [&] {
+        sigset_t all, before;
+        sigfillset(&all);
+        pthread_sigmask(SIG_SETMASK, &all, &before);
+        entered.Unlock();
+        leave.Lock();
+        pthread_sigmask(SIG_SETMASK, &before, nullptr);
+        for (;;) pause();
+    };
+    const auto use_all = [&] {
+        for (int number = SIGRTMIN; number <= SIGRTMAX; ++number) signal(number, [](int) {});
+        signal(SIGURG, [](int) {});
+        entered.Unlock();
+        leave.Lock();
+    };
+    for (const std::function<void()>& run :
+         {std::function<void()>(block_all), std::function<void()>(use_all)}) {
+        Runner runner(run);
+        runner.Start(true);
+        entered.Lock();
+        std::atomic<unsigned long long> number{0};
+        std::thread killer([&] {
+            number = HThread::GetCurrentThreadId();
+            runner.Kill();
+        });
+        while (number == 0) std::this_thread::yield();
+        AwaitSleepOf(number);
+        EXPECT_TRUE(runner.IsRunning());
+        leave.Unlock();
+        killer.join();
+        EXPECT_FALSE(runner.IsRunning());
+    }
+}
+
+// Each change of identity signals every thread and waits for all answers.
+TEST(HThread, IsKilledBesideChangesOfIdentity) {
+    std::atomic<bool> done{false};
+    std::thread changer([&] {
+        while (!done) EXPECT_EQ(setgid(getgid()), 0);
+    });
+    const HSemaphore never(0);
+    Runner runner([&] { never.Lock(); });
+    for (int round = 0; round < 100; ++round) {
+        runner.Start(true);
+        runner.Kill();
+    }
+    done = true;
+    changer.join();
+}
+
 TEST(HThread, TakesItsPriorityWheneverItIsSet) {
     const bool may_raise = setpriority(PRIO_PROCESS, 0, -20) == 0 && setpriority(PRIO_PROCESS, 0, 0) == 0;
     const int nices[] = {19, 10, 5, 0, -5, -10, -20, 0, 0};
@@ -95,4 +176,20 @@ TEST(HThread, TakesItsPriorityWheneverItIsSet) {
             runner.Wait();
         }
     }
+}
+
+// Whatever nice value the thread that starts it has set for itself.
+TEST(HThread, BeginsAtThePriorityOfTheProcess) {
+    int nice = -100;
+    Runner runner([&] { nice = getpriority(PRIO_PROCESS, 0); });
+    std::atomic<bool> is_set{false};
+    std::thread starter([&] {
+        while (!is_set) std::this_thread::yield();
+        runner.RunToEnd();
+    });
+    const int raised = getpriority(PRIO_PROCESS, 0) + 1;
+    setpriority(PRIO_PROCESS, static_cast<id_t>(getpid()), raised);  // not of the starter
+    is_set = true;
+    starter.join();
+    EXPECT_EQ(nice, raised);
 }

@@ -25,7 +25,8 @@
 /// After `Start` the worker makes two passes and then hibernates: it sleeps and uses no processor time. Each
 /// accepted signal adds one pass. If an exception escapes `Process`, or a machine fault ends it, one line is
 /// printed on standard output and the worker continues as after any other pass (see `HThread` for what a
-/// fault leaves behind).
+/// fault leaves behind). It keeps rounding and traps of floating-point operations as the pass has set them. After
+/// a fault no exception of the pass is current or uncaught any more; those are not destroyed.
 ///
 /// | Worker      | `IsProcessing` | `Signal`             | Left by                       |
 /// |-------------|----------------|----------------------|-------------------------------|

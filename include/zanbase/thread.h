@@ -16,9 +16,10 @@ struct HNativeThread;
 
 /// How much of a busy processor a thread gets, from least to most. Normal is the priority of the process; a
 /// value beyond the last counts as normal. On Linux a priority sets the nice value of the thread: 39, 10 and
-/// 5 above that of the process, or 5, 10 and 39 below, clamped to -20 to 19. Only privileged processes may
-/// lower a nice value, also back to normal. A refusal is not reported. On Windows the values are the system's
-/// own relative priorities, from `THREAD_PRIORITY_IDLE` to `THREAD_PRIORITY_TIME_CRITICAL`, and need no right.
+/// 5 above that of the process, or 5, 10 and 39 below, clamped to -20 to 19; a nice value that the thread which
+/// calls `Start` has set for itself does not count. Only privileged processes may lower a nice value, also back
+/// to normal. A refusal is not reported. On Windows the values are the system's own relative priorities, from
+/// `THREAD_PRIORITY_IDLE` to `THREAD_PRIORITY_TIME_CRITICAL`, and need no right.
 enum HThreadPriority : unsigned int {
     HThreadPriorityIdle = 0,
     HThreadPriorityLowest = 1,
@@ -90,8 +91,9 @@ public:
     /// everything that the thread did happens before.
     [[nodiscard]] bool IsRunning() const;
 
-    /// Waits until the thread has ended, including the destructors of its thread-local objects. Any number of
-    /// threads may wait. Returns at once if there is no thread, and on the thread itself.
+    /// Waits until the thread has ended, including the destructors of its thread-local objects and of its keys
+    /// (`pthread_key_create`), also of those that are set again meanwhile. Any number of threads may wait. Returns
+    /// at once if there is no thread, and on the thread itself.
     void Wait();
 
     /// Terminates the thread asynchronously and returns when it is gone and the object is idle. Returns at
@@ -103,19 +105,25 @@ public:
     ///
     /// A thread that has not entered `Run` yet does not enter it.
     ///
-    /// On Linux a signal terminates the thread: the highest real-time signal but one, or the next below it
-    /// that the program neither handles nor blocks at the first `Start`. Limits and side effects:
+    /// On Linux a signal terminates the thread: `SIGURG`, or if the program handles or blocks that at the first
+    /// `Start`, the highest real-time signal but one, or the next below it that the program neither handles nor
+    /// blocks. Limits and side effects:
     ///   - If the thread blocks all signals, `Kill` waits until it unblocks them or ends. `Kill` also waits
-    ///     for the end of the thread if the program has a handler for every real-time signal.
-    ///   - A thread inside the C library may hold a lock there, such as that of `malloc`. It is terminated
-    ///     once it has left the library, mostly within microseconds. Two limits end this delay: ten seconds in
-    ///     all, and ten milliseconds in one system call (one second while a thread holds the lock of `stdout`
-    ///     or `stderr`). Then the thread is terminated inside the library.
+    ///     for the end of the thread if the program has a handler for `SIGURG` and every real-time signal; and
+    ///     if it handles `SIGURG`, until the system has room for another signal (`RLIMIT_SIGPENDING`).
+    ///   - A thread inside the C or the C++ library may hold a lock there, such as that of `malloc` or of the
+    ///     locales. It is terminated once it has left the library, mostly within microseconds. Two limits end
+    ///     this delay: ten seconds in all, and ten milliseconds in one system call (one second while a thread
+    ///     holds the lock of `stdout` or `stderr`). Then the thread is terminated inside the library. A library
+    ///     that is linked statically into the program is not recognised: there the thread is terminated at once.
     ///   - So a thread that waits in a system call can leave these locks held: that of `stdin` in
     ///     `fgets(stdin)` or `getline(cin)`, after which every `fflush(nullptr)` deadlocks; that of a stream in
     ///     `printf` to a full pipe; those of the resolver in `getaddrinfo`. End such a wait before the call,
     ///     for instance by closing the other end of the pipe. A callback of `dl_iterate_phdr` leaves the
     ///     loader's lock held.
+    ///   - `setuid` and its kin in other threads are not held up: they signal every thread and wait for all
+    ///     answers, and the thread answers before it is gone. The thread that calls one waits in a system call,
+    ///     as above: terminated there, it leaves the lock held that starts and ends of threads need.
     ///   - Other threads that wait on a `std::condition_variable` together with the thread may miss wake-ups
     ///     from then on. The mutexes, semaphores and condition variables of this library are not affected.
     ///   - Memory leaks: the thread's cache of freed blocks (0.7 kB, and up to 234 kB that the thread has
@@ -156,7 +164,9 @@ protected:
     /// Threads already in `Wait` keep waiting.
     void DestroyThread();
 
-    /// Calls `Run` on the new thread, and prints the line if an exception or a machine fault ends it.
+    /// Calls `Run` on the calling thread, prints the line if an exception or a machine fault ends it, and then
+    /// detaches the object's thread as `DestroyThread` does. A new thread does the same for itself; there is no
+    /// need to call this.
     static void _Run_(HThread* thread);
 
 private:

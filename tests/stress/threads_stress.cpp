@@ -6,8 +6,10 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <locale>
 #include <mutex>
 #include <random>
+#include <sstream>
 #include <string>
 #include <thread>
 #include <vector>
@@ -23,7 +25,7 @@ namespace {
 
 constexpr int kRounds = 20;
 int rounds = kRounds;
-int pipe_ends[2];
+int pipe_ends[2];  // full after the first writes
 std::FILE* const waste = std::fopen("/dev/null", "w");
 
 void Require(bool holds, const char* what) {
@@ -37,24 +39,37 @@ void Allocate() {
     for (unsigned int size = 1; size < 2000; size += 100) texts.emplace_back(size, 'x');
 }
 
+// Pauses, because a thread that is never found outside a library is killed only after seconds.
+void SetLocale() {
+    std::locale::global(std::locale(std::locale::classic(), new std::ctype<char>));
+    for (volatile int step = 0; step < 1000;) step = step + 1;
+}
+
 // Global, so that they outlive their threads though the thread that started those is killed.
 const HSemaphore never(0);
 Runner endless([] { never.Lock(); });
 Runner allocating(Allocate);
 
-void ReadPipe() { Require(read(pipe_ends[0], pipe_ends, 1) != 0, "the pipe stays open"); }
+void WritePipe() { Require(write(pipe_ends[1], pipe_ends, sizeof pipe_ends) > 0, "the pipe stays open"); }
 
 // Nearly always inside the C library, so a kill takes seconds: for longer runs only.
 void MakeThread() { std::thread(Allocate).join(); }
+
+// What a killed thread must not have locked.
+void UseLibraries() {
+    Allocate();
+    std::ostringstream() << 1.5;
+}
 
 // What a thread repeats until it is killed.
 void (*const kOperations[])() = {
     [] {},
     std::this_thread::yield,
     [] { sleep(1000); },
-    ReadPipe,
+    WritePipe,
     [] { endless.Wait(); },
     Allocate,
+    SetLocale,
     [] { std::fprintf(waste, "%f %s\n", 1.0 / 3, std::string(30, 'x').c_str()); },
     MakeThread,
     [] { allocating.Start(true) ? allocating.Wait() : allocating.Kill(); },
@@ -64,7 +79,8 @@ void (*const kOperations[])() = {
 void KillInEveryOperation() {
     std::atomic<int> steps{0};
     for (const auto operation : kOperations) {
-        if (operation == ReadPipe && __tsan_init != nullptr) continue;  // the tool delays signals meanwhile
+        if (operation == WritePipe && __tsan_init != nullptr) continue;  // the tool delays signals meanwhile
+        if (operation == SetLocale && __tsan_init != nullptr) continue;  // kills are not delayed there
         if (operation == MakeThread && rounds == kRounds) continue;
         Runner runner([&] {
             const HMutex mutex;
@@ -75,7 +91,7 @@ void KillInEveryOperation() {
             for (int pause = round % 10; pause > 0; --pause) std::this_thread::yield();
             runner.Kill();
             Require(!runner.IsRunning(), "idle after a kill");
-            std::thread(Allocate).join();
+            std::thread(UseLibraries).join();
         }
     }
 }

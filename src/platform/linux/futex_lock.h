@@ -27,7 +27,7 @@
 // The kernel compares the lower half of the word only. If that has the bit of the sleepers, a Release will wake
 // one, whoever owns the lock.
 //
-// A thread's number is never given to a second thread (system_lock.h). The system reuses its thread
+// A thread's number is never given to a second thread (lock_owner.h). The system reuses its thread
 // identifiers, so the lock of a killed owner would seem to belong to a later thread.
 //
 // Release does not touch the lock after its store of 0: the next owner may destroy it. The wake-up passes the

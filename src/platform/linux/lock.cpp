@@ -1,13 +1,12 @@
 // The re-entrant lock of this system: the algorithm of futex_lock.h in the caller's storage.
 #include "platform/lock.h"
 
+#include "platform/linux/lock_owner.h"
 #include "platform/linux/race_detector.h"
 #include "platform/linux/system_lock.h"
 #include "platform/race_detector.h"
 
 namespace {
-
-std::atomic<SystemLock::Thread> gnLastThread{0};  // even
 
 // The operations as the thread sanitizer is shown them. All locks are shown, also those of the library's own
 // tables: they order threads as well. The block mutex alone is not (thread_block.cpp).
@@ -28,7 +27,7 @@ void EndAcquire(HNativeLock* lock, unsigned int flags) noexcept {
 [[gnu::cold, gnu::noinline]] void AcquireWatched(HNativeLock* lock) noexcept {
     const CallerFrame caller(__builtin_return_address(0));
     BeginAcquire(lock, kTsanReentrant);
-    In(lock).Acquire(LockThread());
+    In(lock).Acquire(ThisLockOwner());
     EndAcquire(lock, kTsanReentrant);
 }
 
@@ -36,7 +35,7 @@ void EndAcquire(HNativeLock* lock, unsigned int flags) noexcept {
     const CallerFrame caller(__builtin_return_address(0));
     constexpr unsigned int kFlags = kTsanReentrant | kTsanTry;
     BeginAcquire(lock, kFlags);
-    const bool acquired = In(lock).TryAcquire(LockThread());
+    const bool acquired = In(lock).TryAcquire(ThisLockOwner());
     EndAcquire(lock, acquired ? kFlags : kFlags | kTsanTryFailed);
     return acquired;
 }
@@ -45,21 +44,12 @@ void EndAcquire(HNativeLock* lock, unsigned int flags) noexcept {
 [[gnu::cold, gnu::noinline]] void ReleaseWatched(HNativeLock* lock) noexcept {
     __tsan_mutex_pre_unlock(lock, 0);
     __tsan_mutex_post_unlock(lock, 0);
-    In(lock).Release(tnLockThread);
+    In(lock).Release(tnLockOwner);
 }
 
 }  // namespace
 
-ZANBASE_FAST_THREAD_LOCAL SystemLock::Thread tnLockThread = 0;
-
-SystemLock::Thread NumberLockThread() noexcept {
-    tnLockThread = gnLastThread.fetch_add(2, std::memory_order_relaxed) + 2;
-    return tnLockThread;
-}
-
-bool OwnsLock(const HNativeLock* lock) noexcept { return In(lock).IsOwnedBy(LockThread()); }
-
-unsigned long long LockOwner() noexcept { return LockThread(); }
+bool OwnsLock(const HNativeLock* lock) noexcept { return In(lock).IsOwnedBy(ThisLockOwner()); }
 
 void InitLock(HNativeLock* lock) noexcept {
     new (lock->storage) SystemLock;
@@ -71,20 +61,20 @@ void InitLock(HNativeLock* lock) noexcept {
 // Not shown: the tool would report a lock whose owner was killed. It forgets a lock when its memory is freed.
 void DestroyLock(HNativeLock*) noexcept {}
 
-// Two calls of Acquire instead of Acquire(LockThread()): a call before the frequent path's own work would make
+// Two calls of Acquire instead of Acquire(ThisLockOwner()): a call before the frequent path's own work would make
 // that path save registers.
 void AcquireLock(HNativeLock* lock) noexcept {
     if (IsThreadSanitizerOn()) return AcquireWatched(lock);
-    if (__builtin_expect(tnLockThread != 0, 1)) return In(lock).Acquire(tnLockThread);
-    In(lock).Acquire(NumberLockThread());
+    if (__builtin_expect(tnLockOwner != 0, 1)) return In(lock).Acquire(tnLockOwner);
+    In(lock).Acquire(NumberLockOwner());
 }
 
 bool TryAcquireLock(HNativeLock* lock) noexcept {
     if (IsThreadSanitizerOn()) return TryAcquireWatched(lock);
-    return In(lock).TryAcquire(LockThread());
+    return In(lock).TryAcquire(ThisLockOwner());
 }
 
 void ReleaseLock(HNativeLock* lock) noexcept {
     if (IsThreadSanitizerOn()) return ReleaseWatched(lock);
-    In(lock).Release(tnLockThread);
+    In(lock).Release(tnLockOwner);
 }

@@ -1,34 +1,20 @@
-// The lock inside a HNativeLock, and the numbers that identify owners of locks.
-#ifndef ZANBASE_PLATFORM_LINUX_SYSTEM_LOCK_H
-#define ZANBASE_PLATFORM_LINUX_SYSTEM_LOCK_H
+// The numbers that identify owners of locks. They are even, and never reused: the system reuses its thread
+// identifiers, so the lock of a killed owner would seem to belong to a later thread.
+#ifndef ZANBASE_PLATFORM_LINUX_LOCK_OWNER_H
+#define ZANBASE_PLATFORM_LINUX_LOCK_OWNER_H
 
-#include <new>
+#include "platform/linux/build.h"
 
-#include "platform/linux/futex_lock.h"
-#include "platform/linux/futex_system.h"
-#include "platform/lock.h"
+using LockOwnerNumber = unsigned long long;  // of a thread never 0
 
-using SystemLock = FutexLock<FutexSystem>;
-static_assert(sizeof(SystemLock) <= sizeof(HNativeLock::storage) &&
-              alignof(SystemLock) <= alignof(HNativeLock));
+// The calling thread's number; 0: it has none yet.
+extern ZANBASE_FAST_THREAD_LOCAL LockOwnerNumber tnLockOwner;
 
-inline SystemLock& In(HNativeLock* lock) noexcept {
-    return *std::launder(reinterpret_cast<SystemLock*>(lock->storage));
-}
+// Gives the calling thread its number and returns it.
+LockOwnerNumber NumberLockOwner() noexcept;
 
-inline const SystemLock& In(const HNativeLock* lock) noexcept {
-    return *std::launder(reinterpret_cast<const SystemLock*>(lock->storage));
-}
-
-// The calling thread's number as an owner of locks; 0: it has none yet. Numbers are even and never
-// reused.
-extern ZANBASE_FAST_THREAD_LOCAL SystemLock::Thread tnLockThread;
-
-// Gives the calling thread its number.
-SystemLock::Thread NumberLockThread() noexcept;
-
-inline SystemLock::Thread LockThread() noexcept {
-    return __builtin_expect(tnLockThread != 0, 1) ? tnLockThread : NumberLockThread();
+inline LockOwnerNumber ThisLockOwner() noexcept {
+    return __builtin_expect(tnLockOwner != 0, 1) ? tnLockOwner : NumberLockOwner();
 }
 
 #endif

@@ -8,6 +8,7 @@ set(ZANBASE_PLATFORM_SOURCES
     futex.cpp
     guard.cpp
     lock.cpp
+    lock_owner.cpp
     messages.cpp
     processors.cpp
     race_detector.cpp
@@ -17,6 +18,7 @@ set(ZANBASE_PLATFORM_SOURCES
     terminal_window.cpp
     thread.cpp
     thread_block.cpp
+    thread_exit.cpp
     thread_kill.cpp
     thread_kill_signal.cpp
     thread_self.cpp
@@ -30,6 +32,9 @@ if(ZANBASE_KILL_SAFETY)
     list(APPEND ZANBASE_PLATFORM_SOURCES thread_kill_safety.cpp)
     add_compile_definitions(ZANBASE_KILL_SAFETY)
 endif()
+
+# For the pthread_cleanup_push of C; see there.
+set_source_files_properties(platform/linux/thread_exit.cpp PROPERTIES COMPILE_OPTIONS -fno-exceptions)
 
 # The library calls its own functions directly: no caller may replace one, and a call through the PLT costs more.
 set(ZANBASE_PLATFORM_COMPILE_OPTIONS -fno-semantic-interposition -fno-plt)

@@ -11,6 +11,8 @@
 #include <unistd.h>
 
 #include "platform/linux/fault_handlers.h"
+#include "platform/linux/kill_deferral.h"
+#include "platform/linux/thread_exit.h"
 #include "platform/linux/thread_kill.h"
 #include "platform/linux/thread_kill_safety.h"
 #include "platform/linux/thread_kill_signal.h"
@@ -21,31 +23,37 @@ namespace {
 // What each priority level adds to the nice value of the process.
 constexpr int kNiceOffsets[] = {39, 10, 5, 0, -5, -10, -39};
 
+int ProcessNice() noexcept {
+    return getpriority(PRIO_PROCESS, static_cast<id_t>(getpid()));  // that of the first thread
+}
+
 // Every process may raise a nice value; only privileged ones may lower it.
 void ApplyPriority(const HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
-    const int own = getpriority(PRIO_PROCESS, static_cast<id_t>(getpid()));  // that of the first thread
-    const int nice = std::clamp(own + kNiceOffsets[block->mnPriority], -20, 19);
+    const int nice = std::clamp(ProcessNice() + kNiceOffsets[block->mnPriority], -20, 19);
     setpriority(PRIO_PROCESS, block->mnNumber, nice);
 }
 
-// True if KillThread was called before this step: then the body must not run.
-bool MakeFirstStep(HNativeThread* block) noexcept {
+// Makes the calling thread ready for its body and the block Running. False if KillThread was called before: then
+// the body must not run.
+bool EnterUnlessKilled(HNativeThread* block) noexcept {
     UnblockKillSignal();
     InstallSignalStack(block->mpoSignalStack);
     const BlockLock lock;
     EnterBlock(block);
-    if (block->mbPriorityPending) ApplyPriority(block);
-    return block->mbKillRequested;
+    // The thread has the nice value of the thread that made it, whatever that had set for itself.
+    if (block->mnPriority != kNormalPriority || getpriority(PRIO_PROCESS, 0) != ProcessNice())
+        ApplyPriority(block);
+    return !block->mbKillRequested;
 }
 
 void RunBody(HNativeThread* block) {
-    if (MakeFirstStep(block)) ExitKilledThread();
-    // Closes the block also when pthread_exit unwinds the body.
-    struct Closer {
+    if (!EnterUnlessKilled(block)) ExitKilledThread();
+    // Leaves the block also when pthread_exit unwinds the body.
+    struct Leaver {
         HNativeThread* mpoBlock;
-        ~Closer() { CloseBlock(mpoBlock); }
+        ~Leaver() { LeaveBlock(mpoBlock, ThreadState::Leaving); }
     };
-    const Closer closer{block};
+    const Leaver leaver{block};
     block->mpfnBody(block->mpoArgument);
 }
 
@@ -54,10 +62,12 @@ void* RunThread(void* block) {
     return nullptr;
 }
 
-// Before the first thread is made, so that KillThread finds a signal that is unblocked on every thread.
-void ChooseKillSignal() noexcept {
+// What has to be done before the first thread is made.
+void PrepareKills() noexcept {
+    FindRuntimeCode();
+    PrepareThreadExit();
     const BlockLock lock;
-    KillSignal();
+    ChooseKillSignal(OnKillSignal);
 }
 
 }  // namespace
@@ -65,9 +75,8 @@ void ChooseKillSignal() noexcept {
 int StartThread(ThreadSlot& slot, void (*body)(void*), void* argument) noexcept {
     const DeferKill defer_kill;
     InstallFaultHandlers();
-    FindLibraryCode();
-    ChooseKillSignal();
-    ReapKilledThreads();
+    PrepareKills();
+    JoinKilledThreads();
     HNativeThread* const block = OpenBlock(slot);
     if (block == nullptr) return ENOMEM;
     block->mpfnBody = body;
@@ -99,11 +108,7 @@ void SetNativePriority(ThreadSlot& slot, int level) noexcept {
     HNativeThread* const block = slot.load(std::memory_order_relaxed);
     if (block == nullptr) return;
     block->mnPriority = level;
-    if (block->mState == ThreadState::Running) {
-        ApplyPriority(block);
-    } else {
-        block->mbPriorityPending = true;
-    }
+    if (block->mState == ThreadState::Running) ApplyPriority(block);  // else its first step does
 }
 
 // The exception of pthread_exit has no object; the undefined-behaviour sanitizer takes it for a null

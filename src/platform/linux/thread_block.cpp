@@ -5,10 +5,9 @@
 #include <cstdlib>
 #include <new>
 
+#include "platform/linux/kill_deferral.h"
+#include "platform/linux/lock_owner.h"
 #include "platform/linux/system_lock.h"
-#include "platform/linux/thread_kill.h"
-#include "platform/linux/thread_self.h"
-#include "platform/linux/thread_wait.h"
 #include "platform/race_detector.h"
 
 BlockMutex goBlockMutex;
@@ -18,8 +17,8 @@ namespace {
 HNativeLock goLock;                                                     // inside goBlockMutex
 HNativeThread* gpoNewest ZANBASE_GUARDED_BY(goBlockMutex) = nullptr;    // all blocks, by mpoOlder
 HNativeThread* gpoFree ZANBASE_GUARDED_BY(goBlockMutex) = nullptr;      // Ended, no waiter
-HNativeThread* gpoUnreaped ZANBASE_GUARDED_BY(goBlockMutex) = nullptr;  // Killed, no waiter
-pthread_key_t gnExitKey;  // the value is the thread's block until that is Ended
+HNativeThread* gpoUnjoined ZANBASE_GUARDED_BY(goBlockMutex) = nullptr;  // Killed, no waiter
+pthread_key_t gnExitKey;  // the value is the thread's block until the thread leaves that
 
 void Push(HNativeThread*& list, HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
     block->mpoNext = list;
@@ -54,30 +53,35 @@ void EmptySlot(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
     block->mpoSlot = nullptr;
 }
 
-// TLS destructor of gnExitKey. Destructors run in up to four passes while one re-sets its value; re-arming
-// twice makes this one run in pass 3, after ordinary destructors. Pass 4 is the sanitizers'.
-void OnExitKey(void* value) {
-    constexpr unsigned int kPass = 3;
-    auto* const block = static_cast<HNativeThread*>(value);
-    if (toSelf.mpoBlock == block) {
-        // pthread_exit ended the body below a C frame without unwind tables, so it could not unwind RunBody.
-        toSelf.mpoFrame = nullptr;
-        if (!CloseBlock(block)) return;
+// TLS destructor of gnExitKey: pthread_exit ended the body below a C frame without unwind tables, so it could
+// not unwind the frame that leaves the block.
+void OnExitKey(void* block) {
+    toSelf.mpoFrame = nullptr;
+    LeaveBlock(static_cast<HNativeThread*>(block), ThreadState::Leaving);
+}
+
+// Requires: the block has no waiter.
+void ReleaseUnawaited(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
+    switch (block->mState) {
+        case ThreadState::Leaving:
+            pthread_detach(block->moThread);
+            MarkEnded(block);
+            break;
+        case ThreadState::Killed:
+            Push(gpoUnjoined, block);
+            break;
+        case ThreadState::Ended:
+            Push(gpoFree, block);
+            break;
+        default:
+            break;  // the thread continues
     }
-    if (++toSelf.mnExitPasses < kPass && pthread_setspecific(gnExitKey, block) == 0) return;
-    {
-        const BlockLock lock;
-        if (block->mState != ThreadState::Exiting) return;  // killed, and returned by RunUntilKilled
-        MarkEnded(block);
-    }
-    WakeWaiters(block);
 }
 
 // Clears what leads to the threads that the child of a fork does not have: all but the calling one.
 void ReleaseInChild() noexcept ZANBASE_RELEASE(goBlockMutex) {
     toSelf.mnNumber = 0;
-    if (toSelf.mpoBlock == nullptr) pthread_setspecific(gnExitKey, nullptr);  // forked by a TLS destructor
-    gpoFree = gpoUnreaped = nullptr;
+    gpoFree = gpoUnjoined = nullptr;
     for (HNativeThread* block = gpoNewest; block != nullptr; block = block->mpoOlder) {
         block->mnWaiters = 0;
         if (block == toSelf.mpoBlock) {
@@ -105,11 +109,11 @@ __attribute__((constructor)) void Prepare() {
 // this mutex; shown, it would order threads that have nothing else in common and hide their races.
 void BlockMutex::Acquire() noexcept ZANBASE_NO_THREAD_SAFETY_ANALYSIS {  // this is the primitive
     DeferKill::Begin();
-    In(&goLock).Acquire(LockThread());
+    In(&goLock).Acquire(ThisLockOwner());
 }
 
 void BlockMutex::Release() noexcept ZANBASE_NO_THREAD_SAFETY_ANALYSIS {
-    In(&goLock).Release(tnLockThread);
+    In(&goLock).Release(tnLockOwner);
     DeferKill::End();
 }
 
@@ -120,8 +124,6 @@ HNativeThread* OpenBlock(ThreadSlot& slot) noexcept {
     block->mpoSlot = &slot;
     block->mState = ThreadState::Starting;
     block->mnPriority = kNormalPriority;
-    // A new thread inherits the nice value of the thread that makes it.
-    block->mbPriorityPending = toSelf.mpoBlock != nullptr && toSelf.mpoBlock->mnPriority != kNormalPriority;
     block->mbKillRequested = false;
     block->moLastPlace = {};
     slot.store(block, std::memory_order_release);
@@ -145,43 +147,37 @@ void EnterBlock(HNativeThread* block) noexcept {
     pthread_setspecific(gnExitKey, block);  // if this fails, a pthread_exit past RunBody is not noticed
 }
 
-bool CloseBlock(HNativeThread* block) noexcept {
+void LeaveBlock(HNativeThread* block, ThreadState how) noexcept {
     RemoveSignalStack();  // the next thread of the block uses the same memory
-    const BlockLock lock;
-    toSelf.mpoBlock = nullptr;
-    toSelf.mbKillPending = false;
-    EmptySlot(block);  // no further waiter can come
-    pthread_detach(block->moThread);
-    const bool has_waiters = block->mnWaiters != 0;
-    if (has_waiters && pthread_setspecific(gnExitKey, block) == 0) {
-        block->mState = ThreadState::Exiting;
-        return true;
-    }
     pthread_setspecific(gnExitKey, nullptr);
-    MarkEnded(block);
-    if (has_waiters) WakeWaiters(block);
-    return false;
+    {
+        const BlockLock lock;
+        toSelf.mpoBlock = nullptr;
+        toSelf.mpfnDeferredKill = nullptr;
+        MarkLeft(block, how);
+    }
+    WakeWaiters(block);
 }
 
-void MarkKilled(HNativeThread* block) noexcept {
-    EmptySlot(block);
-    block->mState = ThreadState::Killed;
-    if (block->mnWaiters == 0) Push(gpoUnreaped, block);
+void MarkLeft(HNativeThread* block, ThreadState how) noexcept {
+    EmptySlot(block);  // no further waiter can come
+    block->mState = how;
     block->mnGeneration.fetch_add(1, std::memory_order_relaxed);
+    if (block->mnWaiters == 0) ReleaseUnawaited(block);
 }
 
 void MarkEnded(HNativeThread* block) noexcept {
     NoteRelease(block);
     block->mState = ThreadState::Ended;
-    if (block->mnWaiters == 0) Push(gpoFree, block);
     block->mnGeneration.fetch_add(1, std::memory_order_relaxed);
+    if (block->mnWaiters == 0) ReleaseUnawaited(block);
 }
 
 void RemoveWaiter(HNativeThread* block) noexcept {
     toSelf.mpoAwaited = nullptr;
-    if (--block->mnWaiters != 0) return;
-    if (block->mState == ThreadState::Ended) Push(gpoFree, block);
-    if (block->mState == ThreadState::Killed) Push(gpoUnreaped, block);
+    if (--block->mnWaiters == 0) ReleaseUnawaited(block);
 }
 
-HNativeThread* TakeUnreaped() noexcept { return Pop(gpoUnreaped); }
+HNativeThread* TakeUnjoined() noexcept { return Pop(gpoUnjoined); }
+
+void WakeWaiters(HNativeThread* block) noexcept { WakeSleepers(block->mnGeneration, kEverySleeper); }

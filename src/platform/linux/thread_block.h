@@ -1,17 +1,18 @@
 // The control block of a thread. Its owner, its waiters and the thread itself share it.
 //
-//   state     meaning                                                              next state
-//   Starting  made by StartThread                                                  Running, or Ended if the
-//                                                                                  system made no thread
-//   Running   the thread has made its first step                                   Exiting, Ended or Killed
-//   Exiting   the body has ended; TLS destructors run, and a thread waits for them  Ended
-//   Killed    the thread executes the end of ExitKilledThread; its stack remains   Reaping
-//   Reaping   a waiter, or the next StartThread, is in pthread_join for it         Ended
-//   Ended     only waiters use the block                                           Starting, when reused
+//   state     meaning                                                            next state
+//   Starting  made by StartThread                                                Running, or Ended if the
+//                                                                                system made no thread
+//   Running   the thread has made its first step                                 Leaving or Killed
+//   Leaving   the body has ended; the thread exits, with its TLS destructors     Joining, or Ended when
+//                                                                                nobody waits
+//   Killed    the thread exits, and may still use its signal stack               Joining
+//   Joining   a waiter, or the next StartThread, is joining the thread           Ended, or as before
+//   Ended     only waiters use the block                                         Starting, when reused
 //
-// A slot points to a block only while the block is Starting or Running, and no longer after DetachThread.
-// A thread whose body ends calls pthread_detach for itself. A killed thread can't, so another thread has to
-// call pthread_join before the C library reuses its stack.
+// A slot points to a block only while the block is Starting or Running, and no longer after DetachThread. The
+// thread itself does not access a block that is Leaving or Killed.
+// A thread that is Leaving is detached when it has no waiter, or no longer one.
 //
 // A block that is Ended and has no waiter is put on the free list. Blocks are never deleted, so a late
 // wake-up finds valid memory.
@@ -44,7 +45,7 @@ public:
     BlockLock& operator=(const BlockLock&) = delete;
 };
 
-enum class ThreadState { Starting, Running, Exiting, Killed, Reaping, Ended };
+enum class ThreadState { Starting, Running, Leaving, Killed, Joining, Ended };
 
 // Where a thread is: its instruction and the top of its stack.
 struct ThreadPlace {
@@ -61,14 +62,13 @@ struct HNativeThread {
     HNativeThread* mpoOlder;  // the block made before this one
     void* mpoSignalStack;     // owned; kSignalStackBytes
 
-    HNativeThread* mpoNext ZANBASE_GUARDED_BY(goBlockMutex);  // on the list of free or of unreaped blocks
+    HNativeThread* mpoNext ZANBASE_GUARDED_BY(goBlockMutex);  // on the list of free or of unjoined blocks
     ThreadSlot* mpoSlot ZANBASE_GUARDED_BY(goBlockMutex);     // the slot that points here, or null
     ThreadState mState ZANBASE_GUARDED_BY(goBlockMutex);
     unsigned int mnWaiters ZANBASE_GUARDED_BY(goBlockMutex);  // threads inside JoinThread or KillThread
     pthread_t moThread ZANBASE_GUARDED_BY(goBlockMutex);      // valid from Running on
     unsigned int mnNumber ZANBASE_GUARDED_BY(goBlockMutex);   // valid from Running on
     int mnPriority ZANBASE_GUARDED_BY(goBlockMutex);          // the level wanted
-    bool mbPriorityPending ZANBASE_GUARDED_BY(goBlockMutex);  // the first step has to apply it
 
     // Counts the events after which waiters must look at the block again. They sleep on it. Its accesses are
     // relaxed, because a waiter reads the rest of the block under the block mutex. What the thread itself has
@@ -94,21 +94,24 @@ void AbandonBlock(HNativeThread* block) noexcept;
 // Makes `block` the calling thread's own and Running.
 void EnterBlock(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex);
 
-// Ends the calling thread's ownership of its block at the end of the body. True if TLS destructors have to
-// run before the block is Ended.
-bool CloseBlock(HNativeThread* block) noexcept;
+// Ends the calling thread's ownership of its block, which becomes Leaving or Killed, and wakes the waiters. A
+// kill that was deferred is dropped.
+void LeaveBlock(HNativeThread* block, ThreadState how) noexcept;
 
-// Empties the slot and makes the block Killed. Its thread executes no further code of a body and does not
-// access the block again.
-void MarkKilled(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex);
+// Empties the slot and makes the block Leaving or Killed. The caller wakes the waiters after it has released
+// the block mutex.
+void MarkLeft(HNativeThread* block, ThreadState how) noexcept ZANBASE_REQUIRES(goBlockMutex);
 
-// Makes the block Ended. The caller wakes the waiters after it has released the block mutex.
+// Makes the block Ended. The caller wakes the waiters, as above.
 void MarkEnded(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex);
 
 // Ends the calling thread's wait for the block.
 void RemoveWaiter(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex);
 
 // Takes a Killed block without waiters off its list; null if there is none.
-HNativeThread* TakeUnreaped() noexcept ZANBASE_REQUIRES(goBlockMutex);
+HNativeThread* TakeUnjoined() noexcept ZANBASE_REQUIRES(goBlockMutex);
+
+// Wakes the waiters of `block` after a change of its generation. The block may have been reused by then.
+void WakeWaiters(HNativeThread* block) noexcept;
 
 #endif

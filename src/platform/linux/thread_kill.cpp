@@ -1,21 +1,23 @@
-// Asynchronous termination: the handler of a real-time signal exits the thread by the raw exit system call.
+// Asynchronous termination: the handler of a signal exits the thread by the raw exit system call.
 //
 // No destructors, cancellation handlers or TLS destructors run; the C library's per-thread caches leak. A lock
-// of the C library that the thread holds, such as malloc's, would stay held, and other threads would deadlock.
-// So the handler returns if the thread may hold one (see thread_kill_safety.h), and KillThread sends the
-// signal again.
+// of the C or C++ library that the thread holds, such as malloc's, would stay held, and other threads would
+// deadlock. So the handler returns if the thread may hold one (see thread_kill_safety.h), and KillThread sends
+// the signal again.
 #include "platform/linux/thread_kill.h"
 
 #include <cerrno>
 #include <climits>
+#include <ctime>
 
 #include <pthread.h>
-#include <signal.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
 #include "platform/clock.h"
 #include "platform/linux/cancellation.h"
+#include "platform/linux/kill_deferral.h"
+#include "platform/linux/thread_exit.h"
 #include "platform/linux/thread_kill_safety.h"
 #include "platform/linux/thread_kill_signal.h"
 #include "platform/linux/thread_wait.h"
@@ -29,33 +31,46 @@ void DropThreadKeys() noexcept {
     for (pthread_key_t key = 0; key < PTHREAD_KEYS_MAX; ++key) pthread_setspecific(key, nullptr);
 }
 
-// Requests that the thread of `block` exit, and waits until it has exited or its signal handler has returned.
-// Returns true if the request must be repeated.
+void BlockSignals() noexcept {
+    sigset_t all;
+    sigfillset(&all);  // those of the C library are left out
+    pthread_sigmask(SIG_BLOCK, &all, nullptr);
+}
+
+bool IsAlive(const HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
+    return block->mState == ThreadState::Starting || block->mState == ThreadState::Running;
+}
+
+// What a request to exit has led to.
+enum class KillResult { Gone, StillBusy, NotSent };
+
+// Requests that the thread of `block` exit, and waits until it has left the block or its signal handler has
+// returned.
 // Requires: the calling thread is a waiter of the block.
-bool RequestKill(HNativeThread* block) noexcept {
+KillResult RequestKill(HNativeThread* block) noexcept {
     const bool output_is_held = StandardOutputIsHeld();
     unsigned int seen = 0;
     {
         const BlockLock lock;
+        if (!IsAlive(block)) return KillResult::Gone;
         seen = block->mnGeneration.load(std::memory_order_relaxed);
         if (!block->mbKillRequested) block->mnKillRequestedAt = ReadTicks();
         block->mbOutputIsHeld = output_is_held;
         block->mbKillRequested = true;
-        if (block->mState == ThreadState::Running) {
-            const int signal = KillSignal();
-            if (signal == 0) return false;
-            // The thread can't end while this one holds the mutex, so no other thread has its number.
-            if (syscall(SYS_tgkill, getpid(), block->mnNumber, signal) != 0) {
-                if (errno != ESRCH) return true;  // the queue of signals is full
-                MarkKilled(block);                // the thread has called exit(2) by itself
-                return false;
-            }
-        } else if (block->mState != ThreadState::Starting) {
-            return false;
-        }
+        // The thread can't end while this one holds the mutex, so no other thread has its number.
+        const int error = block->mState == ThreadState::Running ? SendKillSignal(block->mnNumber) : 0;
+        if (error == ESRCH) MarkLeft(block, ThreadState::Killed);  // it has called exit(2) by itself
+        if (error != 0) return error == ESRCH ? KillResult::Gone : KillResult::NotSent;
     }
     WaitForNewGeneration(block, seen);
-    return true;
+    const BlockLock lock;
+    return IsAlive(block) ? KillResult::StillBusy : KillResult::Gone;
+}
+
+// The last steps of a killed thread, on whichever stack it is.
+void LeaveAndExit(void* block) {
+    LeaveBlock(static_cast<HNativeThread*>(block), ThreadState::Killed);
+    for (;;) syscall(SYS_exit, 0);
 }
 
 }  // namespace
@@ -64,12 +79,13 @@ void OnKillSignal(int, siginfo_t*, void* context) {
     HNativeThread* const block = toSelf.mpoBlock;
     if (block == nullptr || !block->mbKillRequested.load(std::memory_order_relaxed)) return;  // not from us
     if (toSelf.mnKillDeferrals != 0) {
-        toSelf.mbKillPending = true;
+        toSelf.mpfnDeferredKill = ExitKilledThread;
         return;
     }
     const int error = errno;
-    if (!MayHoldLibraryLock(block, context)) ExitKilledThread();
-    NotifyWaiters(block);
+    if (!MayHoldRuntimeLock(block, context)) ExitKilledThread();
+    block->mnGeneration.fetch_add(1, std::memory_order_relaxed);
+    WakeWaiters(block);
     errno = error;
 }
 
@@ -78,26 +94,26 @@ void KillThread(ThreadSlot& slot) noexcept {
     if (block == nullptr) return;
     if (block == toSelf.mpoBlock) ExitKilledThread();
     const NoCancellation no_cancellation;
-    // Without a pause the thread might never leave its signal handler.
-    constexpr timespec kPause{0, 50000};
-    while (RequestKill(block)) nanosleep(&kPause, nullptr);
+    constexpr timespec kPause{0, 50000};  // without it the thread might never leave its signal handler
+    constexpr timespec kUnsentPause{0, 5000000};  // until the system has room for a signal
+    for (;;) {
+        const KillResult result = RequestKill(block);
+        if (result == KillResult::Gone) break;
+        nanosleep(result == KillResult::NotSent ? &kUnsentPause : &kPause, nullptr);
+    }
     WaitForThreadEnd(block);
 }
 
 void ExitKilledThread() noexcept {
     DeferKill::Begin();  // for ever
+    BlockSignals();
     ForwardPendingWakeups();
     AbandonWait();
     DropThreadKeys();
     HNativeThread* const block = toSelf.mpoBlock;
-    {
-        const BlockLock lock;
-        toSelf.mpoBlock = nullptr;
-        MarkKilled(block);
-    }
-    WakeWaiters(block);
-    if (toSelf.mpoKilledExit != nullptr) JumpTo(*toSelf.mpoKilledExit, 1);
-    for (;;) syscall(SYS_exit, 0);
+    if (toSelf.mpoKilledExit == nullptr) CallAsExiting(LeaveAndExit, block);
+    LeaveBlock(block, ThreadState::Killed);
+    JumpTo(*toSelf.mpoKilledExit, 1);
 }
 
 void RunUntilKilled(void (*body)(HNativeThread*), HNativeThread* block) {

@@ -1,32 +1,34 @@
-// A thread may hold a lock of the C library while it executes the library's code, or code that the kernel
-// provides for it (the vDSO). It can stay there for long only in a system call. These places count as safe:
+// A thread may hold a lock of a runtime library while it executes that library's code, or code that the kernel
+// provides (the vDSO). It can stay there for long only in a system call. These places count as safe:
 //
-// - sched_yield: the library does not call it under a lock. A thread may spend all its time there.
-// - A wait of this back end: it uses the library's syscall function, without a lock of the library.
-// - The instruction after a system call that the signal has made fail with EINTR. The library makes no such
-//   call under its own locks. The thread is killed there, so the program does not see the error.
+// - sched_yield: the C library does not call it under a lock. A thread may spend all its time there.
+// - A wait of this back end: it uses the C library's syscall function, without a lock of that library.
+// - The instruction after a system call that the signal has made fail with EINTR. The runtime libraries make no
+//   such call under their own locks. The thread is killed there, so the program does not see the error.
 // - The same system call with the same stack for kBlockedMs: the thread waits for input, or for a mutex of
-//   the program. The library's own locks are released sooner, unless the machine is very busy. While a thread
+//   the program. The libraries' own locks are released sooner, unless the machine is very busy. While a thread
 //   holds the lock of stdout or stderr, the limit is kOutputMs: it may be writing to a full pipe that is read
 //   later.
 //
 // Not prevented: a thread that waits longer for room in a pipe, or for input of a stream, is killed with the
-// stream locked. A thread that executes the program's code under a lock of the library, such as a callback of
+// stream locked. A thread that executes the program's code under a lock of a library, such as a callback of
 // dl_iterate_phdr, is killed with that lock held.
 #include "platform/linux/thread_kill_safety.h"
 
 #include <algorithm>
 #include <cstdio>
 #include <iterator>
+#include <locale>
 
 #include <dlfcn.h>
 #include <gnu/libc-version.h>
 #include <link.h>
 #include <sched.h>
 #include <sys/auxv.h>
+#include <unistd.h>
 
 #include "platform/clock.h"
-#include "platform/linux/thread_kill.h"
+#include "platform/linux/kill_deferral.h"
 #include "platform/linux/thread_place.h"
 
 namespace {
@@ -36,13 +38,17 @@ struct CodeRange {
     std::uintptr_t end;
 };
 
-struct LibraryCode {
-    CodeRange ranges[4];  // those not found stay empty
+constexpr std::size_t kLibraries = 5;
+
+struct RuntimeCode {
+    CodeRange libraries[kLibraries];  // those not found stay empty
     std::size_t count;
+    CodeRange yield;         // the function sched_yield
+    CodeRange system_calls;  // the function syscall
 };
 
-LibraryCode goLibraryCode{};          // written once, before the first thread is made
-std::atomic<bool> gbSearched{false};  // written under the block mutex
+RuntimeCode goRuntimeCode{};          // written once, before the first thread is made
+std::atomic<bool> gbSearched{false};  // written under the block mutex; its release publishes goRuntimeCode
 
 // Limits in milliseconds.
 constexpr unsigned int kGiveUpMs = 10000;  // since the request, for a thread never found outside the library
@@ -57,8 +63,8 @@ bool Contains(const dl_phdr_info* module, std::uintptr_t address) noexcept {
 }
 
 struct Search {
-    std::uintptr_t marks[4];  // addresses within the modules wanted
-    LibraryCode found;
+    std::uintptr_t marks[kLibraries];  // addresses within the libraries wanted
+    RuntimeCode found;
 };
 
 // Records the code of a module that contains a mark. The program itself, the module without a name, is left
@@ -70,25 +76,47 @@ int RecordLibraryCode(dl_phdr_info* module, std::size_t, void* argument) {
     for (int i = 0; i < module->dlpi_phnum; ++i) {
         const auto& segment = module->dlpi_phdr[i];
         if (segment.p_type != PT_LOAD || (segment.p_flags & PF_X) == 0) continue;
-        if (found.count == std::size(found.ranges)) break;
+        if (found.count == std::size(found.libraries)) break;
         const std::uintptr_t begin = module->dlpi_addr + segment.p_vaddr;
-        found.ranges[found.count++] = {begin, begin + segment.p_memsz};
+        found.libraries[found.count++] = {begin, begin + segment.p_memsz};
     }
     return 0;
 }
 
-bool IsLibraryCode(std::uintptr_t code) noexcept {
-    return std::any_of(std::begin(goLibraryCode.ranges), std::end(goLibraryCode.ranges),
-                       [=](const CodeRange& range) { return range.begin <= code && code < range.end; });
+// The code of a function by its entry in the symbol table; empty if it has none.
+CodeRange CodeOf(std::uintptr_t function) noexcept {
+    Dl_info info{};
+    void* entry = nullptr;
+    // NOLINTNEXTLINE(performance-no-int-to-ptr): the address of a function
+    const auto* const address = reinterpret_cast<const void*>(function);
+    if (dladdr1(address, &info, &entry, RTLD_DL_SYMENT) == 0 || entry == nullptr) return {};
+    return {function, function + static_cast<const ElfW(Sym)*>(entry)->st_size};
 }
 
-bool IsYield(std::uintptr_t code) noexcept {
-    constexpr std::uintptr_t kYieldBytes = 16;
-    return code - reinterpret_cast<std::uintptr_t>(&sched_yield) < kYieldBytes;
+bool IsIn(const CodeRange& range, std::uintptr_t code) noexcept {
+    return range.begin <= code && code < range.end;
 }
 
-bool IsWaitOfOurs() noexcept {
-    return toPendingWakeups.mpoWord != nullptr || toPendingWakeups.mpoCondition != nullptr;
+bool IsRuntimeCode(std::uintptr_t code) noexcept {
+    const auto& libraries = goRuntimeCode.libraries;
+    return std::any_of(std::begin(libraries), std::end(libraries),
+                       [=](const CodeRange& library) { return IsIn(library, code); });
+}
+
+// The place counts as well: a handler of the C library may have interrupted the wait.
+bool IsWaitOfOurs(std::uintptr_t code) noexcept {
+    return IsIn(goRuntimeCode.system_calls, code) &&
+           (toPendingWakeups.mpoWord != nullptr || toPendingWakeups.mpoCondition != nullptr);
+}
+
+// True if the thread has been at this place for longer than it would hold a lock of a library, see above.
+bool IsBlocked(HNativeThread* block, const ThreadPlace& place, unsigned int now) noexcept {
+    ThreadPlace& last = block->moLastPlace;
+    if (place.mnCode != last.mnCode || place.mnStack != last.mnStack) {
+        last = place;
+        block->mnLastPlaceSince = now;
+    }
+    return now - block->mnLastPlaceSince >= kBlockedMs;
 }
 
 bool IsHeld(std::FILE* stream) noexcept {
@@ -99,20 +127,23 @@ bool IsHeld(std::FILE* stream) noexcept {
 
 }  // namespace
 
-void FindLibraryCode() noexcept {
+void FindRuntimeCode() noexcept {
     // Without places, threads are killed wherever they are. Under the thread sanitizer too: it delivers signals
     // late, with a place that the thread may have left long ago.
     if (!kKnowsPlaces || IsThreadSanitizerOn() || gbSearched.load(std::memory_order_acquire)) return;
     Search search{
         {reinterpret_cast<std::uintptr_t>(&gnu_get_libc_version),
+         reinterpret_cast<std::uintptr_t>(&std::locale::classic),           // the C++ library
          getauxval(AT_BASE),                                                // the loader
          getauxval(AT_SYSINFO_EHDR),                                        // the vDSO
          reinterpret_cast<std::uintptr_t>(dlsym(RTLD_DEFAULT, "malloc"))},  // may be another library's
         {}};
     dl_iterate_phdr(RecordLibraryCode, &search);
+    search.found.yield = CodeOf(reinterpret_cast<std::uintptr_t>(&sched_yield));
+    search.found.system_calls = CodeOf(reinterpret_cast<std::uintptr_t>(&syscall));
     const BlockLock lock;
-    if (!gbSearched) goLibraryCode = search.found;
-    gbSearched = true;
+    if (!gbSearched.load(std::memory_order_relaxed)) goRuntimeCode = search.found;
+    gbSearched.store(true, std::memory_order_release);
 }
 
 bool StandardOutputIsHeld() noexcept {
@@ -120,21 +151,18 @@ bool StandardOutputIsHeld() noexcept {
     return IsHeld(stdout) || IsHeld(stderr);
 }
 
-bool MayHoldLibraryLock(HNativeThread* block, const void* context) noexcept {
+bool MayHoldRuntimeLock(HNativeThread* block, const void* context) noexcept {
     const auto& interrupted = *static_cast<const ucontext_t*>(context);
     const ThreadPlace place = PlaceIn(interrupted);
-    if (!IsLibraryCode(place.mnCode) || IsYield(place.mnCode) || IsWaitOfOurs() ||
-        IsInterruptedCall(interrupted))
+    if (!IsRuntimeCode(place.mnCode) || IsIn(goRuntimeCode.yield, place.mnCode) ||
+        IsWaitOfOurs(place.mnCode) || IsInterruptedCall(interrupted))
         return false;
     const unsigned int now = ReadTicks();
-    const unsigned int asked_for = now - block->mnKillRequestedAt;
+    const unsigned int requested_for = now - block->mnKillRequestedAt;
     const bool is_call = IsSystemCall(place.mnCode);
     const bool output_is_held = block->mbOutputIsHeld.load(std::memory_order_relaxed);
-    ThreadPlace& last = block->moLastPlace;
-    if (!is_call || output_is_held || place.mnCode != last.mnCode || place.mnStack != last.mnStack) {
-        last = place;
-        block->mnLastPlaceSince = now;
-    }
-    return now - block->mnLastPlaceSince < kBlockedMs &&
-           asked_for < (is_call && output_is_held ? kOutputMs : kGiveUpMs);
+    if (requested_for >= kGiveUpMs) return false;
+    if (is_call && !output_is_held) return !IsBlocked(block, place, now);
+    block->moLastPlace = {};
+    return !is_call || requested_for < kOutputMs;
 }

@@ -1,9 +1,15 @@
-// Choice of a real-time signal that the program does not use.
+// Choice of signals that the program does not use.
 #include "platform/linux/thread_kill_signal.h"
 
+#include <cerrno>
+
 #include <pthread.h>
+#include <sys/syscall.h>
+#include <unistd.h>
 
 namespace {
+
+KillHandler gpfnHandler = nullptr;  // written under the block mutex
 
 std::atomic<int> gnKillSignal{0};  // 0: none; written under the block mutex
 
@@ -12,7 +18,7 @@ using Action = struct sigaction;
 bool IsOurs(int signal) noexcept {
     Action action{};
     return signal != 0 && sigaction(signal, nullptr, &action) == 0 && (action.sa_flags & SA_SIGINFO) != 0 &&
-           action.sa_sigaction == OnKillSignal;
+           action.sa_sigaction == gpfnHandler;
 }
 
 bool HasHandler(int signal) noexcept {
@@ -32,34 +38,33 @@ bool IsDeliverable(int signal) noexcept {
     return sigismember(&with_it, signal) == 1;
 }
 
-// The highest real-time signal below SIGRTMAX that has no handler; 0 if there is none. A signal in `excluded`
-// is taken only if all others have a handler.
-int FindUnusedSignal(const sigset_t& excluded) noexcept {
-    int excluded_choice = 0;
-    for (int signal = SIGRTMAX - 1; signal >= SIGRTMIN; --signal) {
+// SIGURG, or else the highest real-time signal below SIGRTMAX, without a handler; 0 if there is none. A signal
+// that the calling thread blocks is taken only if all others have a handler: a program that reads a signal by
+// signalfd or sigwait blocks it.
+int FindUnusedSignal() noexcept {
+    sigset_t blocked;
+    pthread_sigmask(SIG_BLOCK, nullptr, &blocked);
+    int blocked_choice = 0;
+    for (int candidate = SIGRTMAX; candidate >= SIGRTMIN; --candidate) {
+        const int signal = candidate == SIGRTMAX ? SIGURG : candidate;
         if (HasHandler(signal) || !IsDeliverable(signal)) continue;
-        if (sigismember(&excluded, signal) == 0) return signal;
-        if (excluded_choice == 0) excluded_choice = signal;
+        if (sigismember(&blocked, signal) == 0) return signal;
+        if (blocked_choice == 0) blocked_choice = signal;
     }
-    return excluded_choice;
+    return blocked_choice;
 }
 
 }  // namespace
 
-int KillSignal() noexcept {
-    if (IsOurs(gnKillSignal)) return gnKillSignal;
-    // A program that reads a signal by signalfd or sigwait blocks it and has no handler for it.
-    sigset_t blocked;
-    pthread_sigmask(SIG_BLOCK, nullptr, &blocked);
-    const int signal = FindUnusedSignal(blocked);
-    if (signal != 0) {
-        Action ours{};
-        ours.sa_sigaction = OnKillSignal;
-        ours.sa_flags = SA_SIGINFO | SA_ONSTACK | SA_RESTART;
-        sigfillset(&ours.sa_mask);
-        sigaction(signal, &ours, nullptr);
-    }
-    return gnKillSignal = signal;
+void ChooseKillSignal(KillHandler handler) noexcept {
+    gpfnHandler = handler;
+    if (IsOurs(gnKillSignal)) return;
+    gnKillSignal = FindUnusedSignal();
+    Action ours{};
+    ours.sa_sigaction = handler;
+    ours.sa_flags = SA_SIGINFO | SA_ONSTACK | SA_RESTART;
+    sigfillset(&ours.sa_mask);  // without the C library's own signals
+    if (gnKillSignal != 0) sigaction(gnKillSignal, &ours, nullptr);
 }
 
 void UnblockKillSignal() noexcept {
@@ -67,4 +72,10 @@ void UnblockKillSignal() noexcept {
     sigemptyset(&signals);
     sigaddset(&signals, gnKillSignal);
     pthread_sigmask(SIG_UNBLOCK, &signals, nullptr);
+}
+
+int SendKillSignal(unsigned int thread) noexcept {
+    ChooseKillSignal(gpfnHandler);
+    if (gnKillSignal == 0) return EAGAIN;
+    return syscall(SYS_tgkill, getpid(), thread, gnKillSignal.load()) == 0 ? 0 : errno;
 }

@@ -21,10 +21,9 @@ struct ThreadSelf {
     FaultFrame* mpoFrame;       // the innermost frame of RunGuarded, or null
     sigjmp_buf* mpoKilledExit;  // see RunUntilKilled
     volatile unsigned int mnKillDeferrals;  // see DeferKill
-    volatile bool mbKillPending;            // a kill arrived while it was deferred
+    void (*volatile mpfnDeferredKill)();    // terminates the thread once no scope defers kills; null: no kill
     bool mbHasSignalStack;                  // InstallSignalStack installed one
     unsigned int mnNumber;                  // the system's number of the thread; 0: not asked for yet
-    unsigned int mnExitPasses;              // passes of TLS destructors so far
 };
 
 extern ZANBASE_FAST_THREAD_LOCAL ThreadSelf toSelf;

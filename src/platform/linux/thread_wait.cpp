@@ -1,45 +1,64 @@
-// Waiting for the end of a thread, and pthread_join for the killed ones.
+// Waiting for the end of a thread: one waiter joins it, the others sleep until that is done.
 #include "platform/linux/thread_wait.h"
 
+#include <cerrno>
+#include <ctime>
+
 #include "platform/linux/cancellation.h"
-#include "platform/linux/thread_kill.h"
-#include "platform/linux/thread_self.h"
+#include "platform/linux/kill_deferral.h"
 #include "platform/race_detector.h"
 
 namespace {
 
-// Reclaims the stack of a Killed thread. Releases the block mutex meanwhile, and with it the mutex's deferral
-// of kills.
-// Requires: the caller defers kills itself. If the calling thread were killed in pthread_join, no other thread
-// could join the Killed thread again.
-void Reap(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
-    block->mState = ThreadState::Reaping;
-    const pthread_t thread = block->moThread;
-    goBlockMutex.Release();
-    {
-        const NoCancellation no_cancellation;
-        pthread_join(thread, nullptr);
-    }
-    goBlockMutex.Acquire();
-    MarkEnded(block);
+// Waits in pthread_timedjoin_np until the thread has ended, or for at most a hundredth of a second. A thread that
+// can't be joined, because its body has detached it, counts as ended.
+bool JoinWithinLimit(pthread_t thread) noexcept {
+    constexpr long kLimitNanoseconds = 10000000;
+    constexpr long kNanosecondsPerSecond = 1000000000;
+    timespec deadline{};
+    clock_gettime(CLOCK_REALTIME, &deadline);
+    deadline.tv_nsec += kLimitNanoseconds;
+    deadline.tv_sec += deadline.tv_nsec / kNanosecondsPerSecond;
+    deadline.tv_nsec %= kNanosecondsPerSecond;
+    const NoCancellation no_cancellation;
+    return pthread_timedjoin_np(thread, nullptr, &deadline) != ETIMEDOUT;
 }
 
-// If the thread of the block has ended, removes the calling thread as a waiter and returns true. Otherwise
-// returns false, with the block's generation in `seen`.
-bool RemoveWaiterIfEnded(HNativeThread* block, unsigned int& seen) noexcept {
+// Joins the thread of a block that is Leaving or Killed. Then the block is Ended, or at the limit as before.
+// Releases the block mutex meanwhile.
+// Requires: the calling thread defers kills beyond the block mutex: if it were killed while it joins, no other
+// thread could join. A kill of it waits for this call, therefore the limit.
+void Join(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
+    const ThreadState state_before = block->mState;
+    const pthread_t thread = block->moThread;
+    block->mState = ThreadState::Joining;
+    goBlockMutex.Release();
+    const bool has_ended = JoinWithinLimit(thread);
+    goBlockMutex.Acquire();
+    has_ended ? MarkEnded(block) : MarkLeft(block, state_before);
+}
+
+bool IsJoinable(ThreadState state) noexcept {
+    return state == ThreadState::Leaving || state == ThreadState::Killed;
+}
+
+// One step of a wait: joins a thread that is leaving, and removes the calling thread as a waiter if the thread
+// has ended. Returns the block's state before that, and its generation in `seen`.
+ThreadState StepTowardsEnd(HNativeThread* block, unsigned int& seen) noexcept {
     const DeferKill defer_kill;
-    bool is_reaper = false;
+    ThreadState state{};
+    bool has_joined = false;
     {
         const BlockLock lock;
+        has_joined = IsJoinable(block->mState);
+        if (has_joined) Join(block);
         seen = block->mnGeneration.load(std::memory_order_relaxed);
-        is_reaper = block->mState == ThreadState::Killed;
-        if (is_reaper) Reap(block);
-        if (block->mState != ThreadState::Ended) return false;
-        RemoveWaiter(block);
+        state = block->mState;
+        if (state == ThreadState::Ended) RemoveWaiter(block);
     }
-    NoteAcquire(block);
-    if (is_reaper) WakeWaiters(block);
-    return true;
+    if (state == ThreadState::Ended) NoteAcquire(block);
+    if (has_joined) WakeWaiters(block);
+    return state;
 }
 
 }  // namespace
@@ -55,13 +74,22 @@ HNativeThread* AddWaiter(ThreadSlot& slot) noexcept {
 }
 
 void WaitForThreadEnd(HNativeThread* block) noexcept {
-    for (unsigned int seen = 0; !RemoveWaiterIfEnded(block, seen);) WaitForNewGeneration(block, seen);
+    for (unsigned int seen = 0;;) {
+        const ThreadState state = StepTowardsEnd(block, seen);
+        if (state == ThreadState::Ended) return;
+        if (!IsJoinable(state)) WaitForNewGeneration(block, seen);
+    }
 }
 
 void AbandonWait() noexcept {
-    if (toSelf.mpoAwaited == nullptr) return;
-    const BlockLock lock;
-    RemoveWaiter(toSelf.mpoAwaited);
+    HNativeThread* const block = toSelf.mpoAwaited;
+    if (block == nullptr) return;
+    {
+        const BlockLock lock;
+        block->mnGeneration.fetch_add(1, std::memory_order_relaxed);
+        RemoveWaiter(block);
+    }
+    WakeWaiters(block);  // one of them has to join the thread if this one was about to
 }
 
 void WaitForNewGeneration(HNativeThread* block, unsigned int seen) noexcept {
@@ -70,15 +98,8 @@ void WaitForNewGeneration(HNativeThread* block, unsigned int seen) noexcept {
         SleepWhile(block->mnGeneration, seen, nullptr);
 }
 
-void WakeWaiters(HNativeThread* block) noexcept { WakeSleepers(block->mnGeneration, kEverySleeper); }
-
-void NotifyWaiters(HNativeThread* block) noexcept {
-    block->mnGeneration.fetch_add(1, std::memory_order_relaxed);
-    WakeWaiters(block);
-}
-
-void ReapKilledThreads() noexcept {
+void JoinKilledThreads() noexcept {
     const DeferKill defer_kill;
     const BlockLock lock;
-    while (HNativeThread* const block = TakeUnreaped()) Reap(block);
+    while (HNativeThread* const block = TakeUnjoined()) Join(block);
 }

@@ -19,13 +19,7 @@ void AbandonWait() noexcept;
 // Requires: the calling thread is a waiter of the block and does not hold the block mutex.
 void WaitForNewGeneration(HNativeThread* block, unsigned int seen) noexcept;
 
-// Wakes the waiters of `block` after a change of its generation. The block may have been reused by then.
-void WakeWaiters(HNativeThread* block) noexcept;
-
-// Changes the block's generation and wakes its waiters, so that they look at the block again.
-void NotifyWaiters(HNativeThread* block) noexcept;
-
-// Reclaims the stacks of killed threads that have no waiter.
-void ReapKilledThreads() noexcept;
+// Joins the killed threads that have no waiter, so that their stacks and blocks are used again.
+void JoinKilledThreads() noexcept;
 
 #endif
