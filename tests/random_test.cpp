@@ -30,11 +30,3 @@ TEST(Random, TakesAnySeedAndReplacesZeroByTheClock) {
         EXPECT_EQ(IMPRandInt(), c.first_draw) << c.seed;
     }
 }
-
-TEST(Random, SumsTwelveUniformNumbersToANormalOne) {
-    IMPInitRandom(42);
-    double sum = -6.0;
-    for (int draw = 0; draw < 12; ++draw) sum += IMPRandom();
-    IMPInitRandom(42);
-    EXPECT_EQ(IMPRandNorm(-2.0), sum * -2.0);
-}

@@ -47,7 +47,8 @@ ZANBASE_API const char* IMPGetMajorRev();
 /// calls leave the streams alone.
 ///
 /// The call waits for a bounded time. It drops pending output that the old file does not accept within a
-/// second (a full pipe, or one without a reader, which raises no SIGPIPE). On Linux, if another thread is using a
+/// second (a full pipe, or one without a reader, which raises no SIGPIPE), or at once if the process has no free
+/// descriptor. On Linux, if another thread is using a
 /// stream for longer than a tenth of a second, because it waits for input for example, the stream uses the
 /// console from its next system call on, but stays buffered. A wide-oriented stream loses its orientation.
 ///
@@ -69,7 +70,9 @@ ZANBASE_API int CreateConsole();
 
 /// Removes the console that `CreateConsole` made: the standard streams that use it are connected to the null
 /// device, unbuffered, by the same rules, and a window of the library's own closes. Returns 1 on success, 0
-/// if there is no such console, or no null device (then nothing changes). The console can't be made again.
+/// if there is no such console, or no null device (then nothing changes). The console can't be made again. On
+/// Windows it removes the console of the process even if that was there before, as in a program started from a
+/// command prompt, and 0 means that there was none.
 /// Thread-safety: as `CreateConsole`.
 ZANBASE_API int DestroyConsole();
 
