@@ -9,13 +9,35 @@
 
 #include "diskio/ledger.h"
 #include "environment/message_catalogue.h"
+#include "platform/clock.h"
 #include "support/blocked_thread.h"
 #include "text/name_ring.h"
 #include "timing/row_table.h"
 #include "zanbase/memory.h"
 #include "zanbase/thread.h"
 
+// A clock on which a pause takes longer than it lasts.
+static std::atomic<unsigned int> now_ms{0}, pause_ms{1};
+
+WallClock ReadWallClock() noexcept { return {0, 0}; }
+unsigned int ReadTicks() noexcept { return now_ms; }
+void SleepFor(unsigned int ms) noexcept {
+    usleep(1000 * ms);
+    now_ms += pause_ms;
+}
+
 namespace {
+
+// True if the child of a fork finds that `act` succeeds.
+template <class Act>
+bool SucceedsInChild(Act act) {
+    const pid_t child = fork();
+    // The raw call: at _exit the thread sanitizer reports that the child has not joined the other threads.
+    if (child == 0) syscall(SYS_exit_group, act() ? 0 : 1);
+    int status = -1;
+    waitpid(child, &status, 0);
+    return status == 0;
+}
 
 struct Tracker : HMemory {
     using HMemory::moMutex;
@@ -34,13 +56,18 @@ TEST(Fork, WaitsUntilNoOtherThreadIsInsideATable) {
             AwaitSleepOf(main_thread);
         });
         while (!inside) std::this_thread::yield();
-        const pid_t child = fork();
-        // The raw call: at _exit the thread sanitizer reports that the child has not joined the other thread.
-        if (child == 0) syscall(SYS_exit_group, mutex->TryLock() ? 0 : 1);
-        int status = -1;
-        waitpid(child, &status, 0);
+        EXPECT_TRUE(SucceedsInChild([mutex] { return mutex->TryLock(); }));
         other.join();
-        EXPECT_EQ(status, 0);
+    }
+}
+
+TEST(Fork, GivesUpAMutexWhoseOwnerIsGone) {
+    pause_ms = 1000;
+    std::thread([] { goNameRing.moRingMutex.Lock(); }).join();
+    for (const unsigned int wait_ms : {5000U, 1000U}) {  // once given up, it is not waited for again
+        const unsigned int start = now_ms;
+        EXPECT_TRUE(SucceedsInChild([] { return !goNameRing.moRingMutex.TryLock(); }));
+        EXPECT_EQ(now_ms - start, wait_ms);
     }
 }
 
