@@ -11,10 +11,10 @@
 #include "environment/message_catalogue.h"
 #include "platform/clock.h"
 #include "support/blocked_thread.h"
+#include "support/runner.h"
 #include "text/name_ring.h"
 #include "timing/row_table.h"
 #include "zanbase/memory.h"
-#include "zanbase/thread.h"
 
 // A clock on which a pause takes longer than it lasts.
 static std::atomic<unsigned int> now_ms{0}, pause_ms{1};
@@ -43,7 +43,8 @@ struct Tracker : HMemory {
     using HMemory::moMutex;
 };
 
-// The other thread opens a file while it is inside, for which it needs a lock that fork() acquires too.
+// The other thread opens a file and starts a thread while it is inside. For each it needs a lock that fork() acquires
+// too.
 TEST(Fork, WaitsUntilNoOtherThreadIsInsideATable) {
     const unsigned long long main_thread = HThread::GetCurrentThreadId();
     const HMutex* const mutexes[] = {&Tracker::moMutex, mpoDiskIOMutex, &goTimerGrowthMutex,
@@ -54,6 +55,7 @@ TEST(Fork, WaitsUntilNoOtherThreadIsInsideATable) {
             const HMutexLock lock(mutex);
             inside = true;
             AwaitSleepOf(main_thread);
+            Runner([] {}).RunToEnd();
         });
         while (!inside) std::this_thread::yield();
         EXPECT_TRUE(SucceedsInChild([mutex] { return mutex->TryLock(); }));

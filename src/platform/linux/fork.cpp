@@ -6,6 +6,9 @@
 // may open a file, or allocate through an operator new that records. So the list is acquired first, with nothing
 // owned, and our locks are only tried; if one of them is busy, all are released before the next attempt. fork()
 // then acquires the list once more; its lock is re-entrant.
+//
+// The mutex of the thread blocks is one of ours: its owner may be about to allocate, and the owner of a table may be
+// about to start a thread.
 #include "platform/fork.h"
 
 #include <atomic>
@@ -14,6 +17,7 @@
 
 #include "platform/clock.h"
 #include "platform/linux/build.h"
+#include "platform/linux/thread_block.h"
 #include "platform/thread.h"
 
 // Exported by glibc and declared in no header. Weak: a C library without them must still load this one. A fork
@@ -39,7 +43,7 @@ bool HasStreamList() {
     return _IO_list_lock != nullptr && _IO_list_unlock != nullptr && _IO_list_resetlock != nullptr;
 }
 
-void ReleaseOwned() {
+void ReleaseTables() {
     for (unsigned int number = 0; number < goLocks.count; ++number) {
         if ((tnOwned >> number & 1) != 0) goLocks.release(number);
     }
@@ -70,21 +74,23 @@ private:
     unsigned int mnSince[ForkLocks::kMost] = {};  // ticks
 };
 
-// Acquires all locks but those that are given up, or none.
-bool TryAcquireAll(BusyLocks& busy) {
+// Acquires the block mutex, which no thread holds for long, and all locks but those that are given up; or none.
+bool TryAcquireAll(BusyLocks& busy) ZANBASE_TRY_ACQUIRE(true, goBlockMutex) {
+    if (!goBlockMutex.TryAcquire()) return false;
     for (unsigned int number = 0; number < goLocks.count; ++number) {
         if (goLocks.try_acquire(number)) {
             tnOwned |= 1U << number;
             busy.NoteFree(number);
         } else if (!busy.NoteBusy(number)) {
-            ReleaseOwned();
+            ReleaseTables();
+            goBlockMutex.Release();
             return false;
         }
     }
     return true;
 }
 
-void BeforeFork() {
+void BeforeFork() ZANBASE_ACQUIRE(goBlockMutex) {
     constexpr int kAttemptsAtOnce = 100;  // a table is busy for microseconds, unless a report is written
     BusyLocks busy;
     for (int attempt = 0;; ++attempt) {
@@ -99,15 +105,18 @@ void BeforeFork() {
     }
 }
 
-void InParent() {
-    ReleaseOwned();
+// The block mutex last: a kill that was deferred takes effect with its release.
+void InParent() ZANBASE_RELEASE(goBlockMutex) {
+    ReleaseTables();
     if (HasStreamList()) _IO_list_unlock();
+    goBlockMutex.Release();
 }
 
 // fork() resets the list in the child of a process with threads, so there it is not owned any more.
-void InChild() {
-    ReleaseOwned();
+void InChild() ZANBASE_RELEASE(goBlockMutex) {
+    ReleaseTables();
     if (HasStreamList()) _IO_list_resetlock();
+    ReleaseBlocksInChild();
 }
 
 }  // namespace

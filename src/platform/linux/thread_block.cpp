@@ -78,8 +78,9 @@ void ReleaseUnawaited(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMut
     }
 }
 
-// Clears what leads to the threads that the child of a fork does not have: all but the calling one.
-void ReleaseInChild() noexcept ZANBASE_RELEASE(goBlockMutex) {
+}  // namespace
+
+void ReleaseBlocksInChild() noexcept {
     toSelf.mnNumber = 0;
     gpoFree = gpoUnjoined = nullptr;
     for (HNativeThread* block = gpoNewest; block != nullptr; block = block->mpoOlder) {
@@ -94,13 +95,11 @@ void ReleaseInChild() noexcept ZANBASE_RELEASE(goBlockMutex) {
     goBlockMutex.Release();
 }
 
-void AcquireBeforeFork() noexcept ZANBASE_ACQUIRE(goBlockMutex) { goBlockMutex.Acquire(); }
-void ReleaseInParent() noexcept ZANBASE_RELEASE(goBlockMutex) { goBlockMutex.Release(); }
+namespace {
 
 __attribute__((constructor)) void Prepare() {
     InitLock(&goLock);
     if (pthread_key_create(&gnExitKey, OnExitKey) != 0) gnExitKey = PTHREAD_KEYS_MAX;  // setting it fails
-    pthread_atfork(AcquireBeforeFork, ReleaseInParent, ReleaseInChild);
 }
 
 }  // namespace
@@ -110,6 +109,13 @@ __attribute__((constructor)) void Prepare() {
 void BlockMutex::Acquire() noexcept ZANBASE_NO_THREAD_SAFETY_ANALYSIS {  // this is the primitive
     DeferKill::Begin();
     In(&goLock).Acquire(ThisLockOwner());
+}
+
+bool BlockMutex::TryAcquire() noexcept ZANBASE_NO_THREAD_SAFETY_ANALYSIS {
+    DeferKill::Begin();
+    const bool acquired = In(&goLock).TryAcquire(LockThread());
+    if (!acquired) DeferKill::End();
+    return acquired;
 }
 
 void BlockMutex::Release() noexcept ZANBASE_NO_THREAD_SAFETY_ANALYSIS {

@@ -32,6 +32,8 @@
 class ZANBASE_CAPABILITY("mutex") BlockMutex {
 public:
     void Acquire() noexcept ZANBASE_ACQUIRE();
+    bool TryAcquire() noexcept
+        ZANBASE_TRY_ACQUIRE(true);  // for a fork, which waits for no lock while it owns another
     void Release() noexcept ZANBASE_RELEASE();
 };
 extern BlockMutex goBlockMutex;
@@ -84,6 +86,10 @@ struct HNativeThread {
     ThreadPlace moLastPlace;        // where the handler found the thread last
     unsigned int mnLastPlaceSince;  // the tick at which it found the thread there first
 };
+
+// In the child of a fork: ends the blocks of the threads that the child does not have, all but the calling one, and
+// releases the block mutex.
+void ReleaseBlocksInChild() noexcept ZANBASE_RELEASE(goBlockMutex);
 
 // Makes `slot` point to a block in state Starting and returns it; null if there is no memory.
 HNativeThread* OpenBlock(ThreadSlot& slot) noexcept;
