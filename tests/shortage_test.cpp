@@ -57,6 +57,10 @@ void operator delete(void* block) noexcept { __wrap_free(block); }
 void operator delete(void* block, std::size_t) noexcept { __wrap_free(block); }
 void operator delete(void* block, std::align_val_t) noexcept { __wrap_free(block); }
 void operator delete(void* block, std::size_t, std::align_val_t) noexcept { __wrap_free(block); }
+// As the C++ library has it; the address sanitizer's does not call the one above.
+void* operator new[](std::size_t size, std::align_val_t alignment) { return operator new(size, alignment); }
+void operator delete[](void* block, std::align_val_t) noexcept { __wrap_free(block); }
+void operator delete[](void* block, std::size_t, std::align_val_t) noexcept { __wrap_free(block); }
 
 namespace {
 
