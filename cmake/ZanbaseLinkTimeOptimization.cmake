@@ -27,9 +27,6 @@ function(zanbase_optimise_at_link library objects others)
         target_link_options(${library} PRIVATE $<${optimised}:-flto-partition=one>)
         target_link_options(${others} INTERFACE $<$<AND:${optimised},$<NOT:${whole}>>:-fno-lto>)
     else()
-        # In one piece: it is small, routines in assembly may not be apart from their users, and g++ 12 for Windows
-        # fails on several.
-        target_link_options(${library} PRIVATE $<${optimised}:-flto-partition=one>)
         target_link_options(${others} INTERFACE $<${optimised}:${CMAKE_CXX_COMPILE_OPTIONS_IPO}>)
     endif()
 endfunction()

@@ -24,6 +24,7 @@
 #include "zanbase/string_makers.h"
 #include "zanbase/terminal.h"
 #include "zanbase/thread.h"
+#include "zanbase/version.h"
 
 /// @defgroup locks Locks
 /// Mutex, condition variable, semaphore and read-write locks, with scoped holders.
@@ -46,12 +47,5 @@
 /// Header-only helpers that feed the accounts and lend the locks to the standard library's holders.
 /// @defgroup environment Environment
 /// Message catalogue, random numbers, terminal codes, and a text console.
-
-/// Major version of these headers. The CMake package and `zanbase.pc` have the same numbers.
-#define ZANBASE_VERSION_MAJOR 0
-#define ZANBASE_VERSION_MINOR 1  ///< minor version
-#define ZANBASE_VERSION_PATCH 0  ///< patch level
-/// The version as one number that can be compared: 0.1.0 is 100.
-#define ZANBASE_VERSION (ZANBASE_VERSION_MAJOR * 10000 + ZANBASE_VERSION_MINOR * 100 + ZANBASE_VERSION_PATCH)
 
 #endif

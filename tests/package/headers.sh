@@ -1,14 +1,16 @@
 #!/usr/bin/env bash
-# headers.sh COMPILER SOURCES BUILD: every public header compiles alone with COMPILER as C++17, 20 and 23, without a
-# warning; and wrong calls, each beside its right form, get the warning that the headers ask for.
+# headers.sh COMPILER SOURCES BUILD: every public header compiles alone with COMPILER as C++17, and all together as C++20
+# and 23, without a warning; and wrong calls, each beside its right form, get the warning that the headers ask for.
 set -euo pipefail
 compile=("$1" -fsyntax-only -Werror -Wall -Wextra -Wpedantic -Wconversion -Wshadow -Wold-style-cast
     -Wdeprecated-copy -I"$2/include" -I"$3/include" -x c++ -)
 
-for standard in 17 20 2b; do
-    for header in "$2"/include/zanbase/{,adapters/}*.h; do
-        "${compile[@]}" -std=c++$standard <<<"#include \"$header\"" || { echo "in $header, C++$standard" && exit 1; }
-    done
+headers=("$2"/include/zanbase/{,adapters/}*.h)
+for header in "${headers[@]}"; do
+    "${compile[@]}" -std=c++17 <<<"#include \"$header\"" || { echo "in $header" && exit 1; }
+done
+for standard in 20 2b; do
+    printf '#include "%s"\n' "${headers[@]}" | "${compile[@]}" -std=c++$standard || { echo "C++$standard" && exit 1; }
 done
 
 # compare COMMAND: each line of the input is WARNING|RIGHT|WRONG; COMMAND compiles a statement, in which RIGHT gets no

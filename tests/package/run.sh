@@ -14,6 +14,11 @@ if [ "$way" != pkg-config ]; then
         -DCMAKE_PREFIX_PATH="$work/moved" >/dev/null
     cmake --build "$work/build" >"$work/log" || { cat "$work/log" && exit 1; }
     "$work/build/consumer"
+    # A subproject is installed with its parent.
+    if [ "$way" = subproject ]; then
+        cmake --install "$work/build" --prefix "$work/installed" >/dev/null
+        "$work/installed/bin/consumer"
+    fi
     exit
 fi
 
@@ -22,6 +27,7 @@ LD_LIBRARY_PATH=$(dirname "$(find "$work/moved" -name libzanbase.so)")
 export PKG_CONFIG_PATH LD_LIBRARY_PATH
 [ -n "$(pkg-config --variable=boost_version zanbase)" ]
 read -ra flags <<<"-std=c++17 -Wall -Wextra -Werror $(pkg-config --cflags zanbase)"
+flags+=(-DPACKAGE_VERSION="\"$(pkg-config --modversion zanbase)\"")
 read -ra libraries <<<"$(pkg-config --libs zanbase)"
 # No header of Boost may be needed: the preprocessor tells every file that a translation unit reads.
 if "$compiler" "${flags[@]}" -M "$consumer/main.cpp" | grep -F /boost/; then exit 1; fi

@@ -14,6 +14,7 @@ if [ "$way" = cmake ]; then
 else
     export PKG_CONFIG_LIBDIR=$work/moved/lib/pkgconfig
     read -ra flags <<<"$(pkg-config --cflags zanbase) $consumer/main.cpp $(pkg-config --libs zanbase)"
+    flags+=(-DPACKAGE_VERSION="\"$(pkg-config --modversion zanbase)\"")
     x86_64-w64-mingw32-g++-posix -std=c++17 -Wall -Wextra -Werror "${flags[@]}" -o "$work/consumer.exe"
 fi
 WINEPATH="Z:$work/moved/bin;$WINEPATH" "$wine" "$work/consumer.exe"

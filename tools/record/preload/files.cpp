@@ -8,6 +8,7 @@
 #include <cstring>
 #include <ctime>
 
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
 #include <unistd.h>
@@ -60,7 +61,7 @@ std::uint64_t HashText(const char* text) {
 void ReadName(int descriptor, std::array<char, PATH_MAX>& name) {
     std::array<char, 40> link{};
     std::snprintf(link.data(), link.size(), "/proc/self/fd/%d", descriptor);
-    const long length = syscall(SYS_readlink, link.data(), name.data(), name.size() - 1);
+    const long length = syscall(SYS_readlinkat, AT_FDCWD, link.data(), name.data(), name.size() - 1);
     name[length < 0 ? 0 : static_cast<std::size_t>(length)] = 0;
 }
 

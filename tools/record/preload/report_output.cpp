@@ -89,7 +89,7 @@ int MoveHigh(int descriptor) {
 bool IsResultFile(int descriptor) {
     const std::string link = "/proc/self/fd/" + std::to_string(descriptor);
     std::array<char, 64> name{};
-    syscall(SYS_readlink, link.c_str(), name.data(), name.size() - 1);
+    syscall(SYS_readlinkat, AT_FDCWD, link.c_str(), name.data(), name.size() - 1);
     return std::string_view(name.data()).find(std::string("/memfd:") + kResultName) == 0;
 }
 
