@@ -9,6 +9,10 @@ import json
 import math
 import sys
 
+if sys.argv[1:] in (["-h"], ["--help"]):
+    print(__doc__)
+    sys.exit()
+
 LEAST_CHANGE = 0.02
 
 

@@ -9,6 +9,10 @@ import re
 import subprocess
 import sys
 
+if sys.argv[1:] in (["-h"], ["--help"]):
+    print(__doc__)
+    sys.exit()
+
 BEGIN, END = "<!-- written by scripts/bench --report -->\n", "<!-- end -->\n"
 
 

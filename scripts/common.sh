@@ -1,8 +1,16 @@
-# What the scripts share: messages, and packages that are installed only where they are missing.
+# What the scripts share: messages, the versions of tools, and packages that are installed only where they are missing.
 # To be sourced; `me` is the script's name in messages.
 
 me=${0##*/}
 top=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
+
+# The compilers are the distribution's own. What the style tools find depends on their version.
+clang_packages=(clang libomp-dev 'libclang-rt-dev|libclang-rt-14-dev')
+clang_format=clang-format-14
+clang_tidy=clang-tidy-14
+build_packages=(g++ cmake ninja-build 'libboost1.81-dev|libboost-dev')
+test_packages=(pkg-config "${clang_packages[@]}" gettext locales libgtest-dev libgmock-dev
+    libvalijson-dev nlohmann-json3-dev libdw-dev relacy-dev xterm xvfb valgrind)
 
 fail() {
     echo "scripts/$me: $*" >&2
@@ -14,12 +22,37 @@ print_manual() {
     sed -n '2,/^[^#]/{/^#/s/^# \{0,1\}//p}' "$0"
 }
 
+# A script's own options come after this, so that asking for the manual installs and builds nothing.
+case ${1:-} in
+-h | --help)
+    print_manual
+    exit
+    ;;
+esac
+
+refuse_option() {
+    fail "unknown option $1; try --help"
+}
+
+# timed WHAT COMMAND…: runs COMMAND, and prints WHAT and the time that it took on standard error.
+timed() {
+    local start=$SECONDS status=0
+    printf '%s … ' "$1" >&2
+    "${@:2}" || status=$?
+    echo "$((SECONDS - start)) s" >&2
+    return $status
+}
+
 installed() {
     [ "$(dpkg-query -W -f '${db:Status-Status}' "$1" 2>/dev/null)" = installed ]
 }
 
 as_root() {
     if [ "$(id -u)" = 0 ]; then "$@"; else sudo "$@"; fi
+}
+
+can_be_had() {
+    LC_ALL=C apt-cache policy "$1" 2>/dev/null | grep -q 'Candidate: [^(]'
 }
 
 # need PACKAGE…: installs those that are missing (Debian and Ubuntu); `a|b` takes b where a can't be had.
@@ -34,14 +67,16 @@ need() {
     done
     [ ${#missing[@]} -gt 0 ] || return 0
     [ "$(id -u)" = 0 ] || command -v sudo >/dev/null || fail "cannot install ${missing[*]}: neither root nor sudo"
-    echo "installing: ${missing[*]}" >&2
-    local log
+    timed "installing ${missing[*]}" install_packages "${missing[@]}"
+}
+
+install_packages() {
+    local log choice name wanted=()
     log=$(mktemp)
-    as_root apt-get update -qq >"$log" 2>&1 || fail "cannot install ${missing[*]}: $(tail -n 1 "$log")"
-    local wanted=()
-    for choice in "${missing[@]}"; do
+    as_root apt-get update -qq >"$log" 2>&1 || fail "cannot install $*: $(tail -n 1 "$log")"
+    for choice in "$@"; do
         for name in ${choice//|/ }; do
-            if apt-cache show "$name" >/dev/null 2>&1; then break; fi
+            if can_be_had "$name"; then break; fi
         done
         wanted+=("$name")
     done
@@ -50,17 +85,20 @@ need() {
     rm -f "$log"
 }
 
-build_packages=(g++ cmake ninja-build 'libboost1.81-dev|libboost-dev')
-test_packages=(pkg-config clang-14 libomp-14-dev libclang-rt-14-dev gettext locales libgtest-dev libgmock-dev
-    libvalijson-dev nlohmann-json3-dev libdw-dev relacy-dev xterm xvfb valgrind)
-
 # configure_and_build PRESET TARGET…: prints the build's output only if it fails.
 configure_and_build() {
-    local preset=$1 log=$top/build/$1.log
+    timed "building $1" build_quietly "$@"
+}
+
+build_quietly() {
+    local preset=$1 log=$top/build/$1.log cache=$top/build/$1/CMakeCache.txt fresh=()
     shift
     mkdir -p "$top/build"
-    if ! (cd "$top" && cmake --preset "$preset" && cmake --build --preset "$preset" ${1:+--target "$@"}) \
-        >"$log" 2>&1; then
+    # A preset's variables don't replace all that a folder was configured with.
+    if [ "$top/CMakePresets.json" -nt "$cache" ]; then fresh=(--fresh); fi
+    if ! (cd "$top" && cmake --preset "$preset" "${fresh[@]}" && touch "$cache" &&
+        cmake --build --preset "$preset" ${1:+--target "$@"}) >"$log" 2>&1; then
+        echo >&2
         tail -n 60 "$log" >&2
         fail "the $preset build failed; its whole output is in build/$preset.log"
     fi

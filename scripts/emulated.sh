@@ -46,7 +46,7 @@ run_emulated_tests() {
 
 run_aarch64_lane() {
     echo "== aarch64"
-    make_emulated_root aarch64
+    timed 'preparing aarch64' make_emulated_root aarch64
     configure_and_build aarch64
     run_emulated_tests aarch64 "$top/build/aarch64"
 }

@@ -12,6 +12,10 @@ import subprocess
 import sys
 import xml.etree.ElementTree as ElementTree
 
+if sys.argv[1:] in (["-h"], ["--help"]):
+    print(__doc__)
+    sys.exit()
+
 NO_SLOT = 1 << 63  # abidw writes a number beyond this for a destructor's base variant, which has no slot
 
 

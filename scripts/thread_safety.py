@@ -8,6 +8,10 @@ import pathlib
 import sys
 import xml.etree.ElementTree as xml
 
+if sys.argv[1:] in (["-h"], ["--help"]):
+    print(__doc__)
+    sys.exit()
+
 
 def place(node):
     return node.find("location").get("file") + ":" + node.find("location").get("line")

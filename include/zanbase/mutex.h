@@ -21,7 +21,10 @@ struct HNativeLock;
 /// Linux and 2^31 - 1 on Windows. It is free again once that thread has released it as often as it acquired it.
 ///
 ///     HMutex mutex;
-///     { HMutexLock lock(&mutex);  /* one thread at a time */ }
+///     {
+///         HMutexLock lock(&mutex);
+///         // one thread at a time
+///     }
 ///
 /// Thread-safe: any number of threads may call any operation of one mutex at the same time. Releasing
 /// happens-before the next acquisition. There is no fairness: a thread that releases and acquires again can
