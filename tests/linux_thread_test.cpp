@@ -153,6 +153,7 @@ TEST(HThread, IsKilledBesideChangesOfIdentity) {
 
 TEST(HThread, TakesItsPriorityWheneverItIsSet) {
     const bool may_raise = setpriority(PRIO_PROCESS, 0, -20) == 0 && setpriority(PRIO_PROCESS, 0, 0) == 0;
+    const int own = getpriority(PRIO_PROCESS, 0);  // above 0 under nice
     const int nices[] = {19, 10, 5, 0, -5, -10, -20, 0, 0};
     std::atomic<id_t> number{0};
     const HSemaphore leave(0);
@@ -162,7 +163,7 @@ TEST(HThread, TakesItsPriorityWheneverItIsSet) {
     });
     for (unsigned int value = 0; value < std::size(nices); ++value) {  // the last two are no priorities
         const auto priority = static_cast<HThreadPriority>(value);
-        const int due = may_raise ? nices[value] : std::max(nices[value], 0);
+        const int due = may_raise ? nices[value] : std::clamp(own + nices[value], own, 19);
         for (const bool is_set_before : {true, false}) {
             runner.SetPriority(is_set_before ? priority : HThreadPriorityNormal);
             number = 0;
