@@ -5,7 +5,7 @@ me=${0##*/}
 top=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
 
 # The compilers are the distribution's own. What the style tools find depends on their version.
-clang_packages=(clang libomp-dev 'libclang-rt-dev|libclang-rt-14-dev')
+clang_packages=(clang libomp-dev libclang-rt-dev)
 clang_format=clang-format-14
 clang_tidy=clang-tidy-14
 build_packages=(g++ cmake ninja-build 'libboost1.81-dev|libboost-dev')
@@ -52,7 +52,9 @@ as_root() {
 }
 
 can_be_had() {
-    LC_ALL=C apt-cache policy "$1" 2>/dev/null | grep -q 'Candidate: [^(]'
+    local policy
+    policy=$(LC_ALL=C apt-cache policy "$1" 2>/dev/null)
+    [[ $policy == *'Candidate: '[^\(]* ]]
 }
 
 # need PACKAGE…: installs those that are missing (Debian and Ubuntu); `a|b` takes b where a can't be had.
