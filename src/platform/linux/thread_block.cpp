@@ -113,7 +113,7 @@ void BlockMutex::Acquire() noexcept ZANBASE_NO_THREAD_SAFETY_ANALYSIS {  // this
 
 bool BlockMutex::TryAcquire() noexcept ZANBASE_NO_THREAD_SAFETY_ANALYSIS {
     DeferKill::Begin();
-    const bool acquired = In(&goLock).TryAcquire(LockThread());
+    const bool acquired = In(&goLock).TryAcquire(ThisLockOwner());
     if (!acquired) DeferKill::End();
     return acquired;
 }
