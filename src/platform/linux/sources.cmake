@@ -24,10 +24,10 @@ set(ZANBASE_PLATFORM_SOURCES
     thread_self.cpp
     thread_wait.cpp)
 
-# Delays a kill while the thread may hold a lock of the C library, so that none of these locks stays held. OFF: kills
-# take effect at once, and 200 lines that depend on the processor and the C library are not built; but a process in
+# Delays a kill while the thread may hold a lock of the C or C++ library, so that none of these locks stays held. OFF:
+# kills take effect at once, and 200 lines that depend on the processor and the C library are not built; but a process in
 # which a thread was killed inside malloc or printf deadlocks.
-option(ZANBASE_KILL_SAFETY "Delay a kill while the thread may hold a lock of the C library" ON)
+option(ZANBASE_KILL_SAFETY "Delay a kill while the thread may hold a lock of the C or C++ library" ON)
 if(ZANBASE_KILL_SAFETY)
     list(APPEND ZANBASE_PLATFORM_SOURCES thread_kill_safety.cpp)
     add_compile_definitions(ZANBASE_KILL_SAFETY)

@@ -3,7 +3,8 @@
 //
 // The CMake option ZANBASE_KILL_SAFETY=OFF leaves this check out. Then a thread is killed at once wherever it
 // is, no processor-specific code is built and the first StartThread does not search the loaded libraries; but
-// a thread killed inside malloc or printf leaves their locks held, and other threads deadlock.
+// a thread killed inside malloc or printf leaves their locks held, and other threads deadlock; and one killed
+// while it answers a change of identity (thread_exit.h) never ends.
 #ifndef ZANBASE_PLATFORM_LINUX_THREAD_KILL_SAFETY_H
 #define ZANBASE_PLATFORM_LINUX_THREAD_KILL_SAFETY_H
 
