@@ -38,7 +38,9 @@ ElfFile::~ElfFile() {
 
 template <class Object>
 const Object* ElfFile::At(std::uint64_t offset, std::uint64_t count) const {
-    if (offset > mnImageBytes || count > (mnImageBytes - offset) / sizeof(Object)) return nullptr;
+    if (offset > mnImageBytes || offset % alignof(Object) != 0 ||
+        count > (mnImageBytes - offset) / sizeof(Object))
+        return nullptr;
     return reinterpret_cast<const Object*>(mpcImage + offset);
 }
 

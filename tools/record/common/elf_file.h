@@ -42,7 +42,7 @@ public:
     std::uint64_t Bias(std::uint64_t start, std::uint64_t offset) const;
 
 private:
-    // `count` objects at `offset`, or null if they are not all in the file.
+    // `count` objects at `offset`, or null if they are not all in the file or not aligned.
     template <class Object>
     const Object* At(std::uint64_t offset, std::uint64_t count = 1) const;
     const Elf64_Phdr* Segments() const;
