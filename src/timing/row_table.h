@@ -9,6 +9,9 @@
 // - A slot is written by the thread of its row, or with exclusive access to the table.
 // - Slots are made before they are used, so that a thread that uses its own allocates nothing. The exception is a
 //   slot added while another thread adds rows: either may miss the other's part, so At makes what is missing.
+//
+// Both are templates over the atomic variables as well, for the models of tests/models. The memory orders are held by
+// MemoryModel.RowTableNeedsItsOrders.
 #ifndef ZANBASE_TIMING_ROW_TABLE_H
 #define ZANBASE_TIMING_ROW_TABLE_H
 
@@ -24,12 +27,12 @@ extern HMutex& goTimerGrowthMutex;  // built in load_time.cpp, never destroyed
 
 // An array whose items are made on demand, by any thread, and keep their address. Requires: kFirst is a multiple of
 // the items of a Line.
-template <class Item, std::size_t kFirst>
+template <class Item, std::size_t kFirst, template <class> class Atomic = std::atomic>
 class GrowingArray {
 public:
     GrowingArray() = default;
     ~GrowingArray() {
-        for (std::atomic<Line*>& segment : maSegments) delete[] segment.load(std::memory_order_relaxed);
+        for (Atomic<Line*>& segment : maSegments) delete[] segment.load(std::memory_order_relaxed);
     }
     GrowingArray(const GrowingArray&) = delete;
     GrowingArray& operator=(const GrowingArray&) = delete;
@@ -86,11 +89,11 @@ private:
         return lines.release();
     }
 
-    std::array<std::atomic<Line*>, kSegments> maSegments{};
+    std::array<Atomic<Line*>, kSegments> maSegments{};
 };
 
 // An operation that throws std::bad_alloc has no visible effect.
-template <class Slot>
+template <class Slot, template <class> class Atomic = std::atomic>
 class RowTable {
 public:
     explicit RowTable(std::size_t rows) { AddRows(rows, 0); }
@@ -122,8 +125,8 @@ private:
     static constexpr std::size_t kFirstSlots = 64;
     static constexpr std::size_t kFirstRows = 16;
 
-    GrowingArray<GrowingArray<Slot, kFirstSlots>, kFirstRows> moRows;
-    std::atomic<std::size_t> mnRows{0};
+    GrowingArray<GrowingArray<Slot, kFirstSlots, Atomic>, kFirstRows, Atomic> moRows;
+    Atomic<std::size_t> mnRows{0};
 };
 
 #endif

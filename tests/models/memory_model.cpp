@@ -7,6 +7,7 @@
 #include "platform/linux/futex_condition.h"
 #include "platform/linux/futex_lock.h"
 #include "platform/linux/futex_semaphore.h"
+#include "timing/row_table.h"
 
 namespace {
 
@@ -143,5 +144,27 @@ TEST(MemoryModel, ReadPreferringLockNeedsItsOrders) {
 TEST(MemoryModel, WritePreferringLockNeedsItsOrders) {
     ExpectNeedsItsOrders<ReadWriteSuite<Downgrade::kBarred>>(5);
 }
+
+// Two threads make the same slots, and one finds them, while another thread adds a row in a new segment.
+struct RowTableSuite : rl::test_suite<RowTableSuite, 3> {
+    static constexpr std::size_t kRows = 16;  // of the first segment
+    RowTable<RelacyPlain, RelacyAtomic> table{kRows};
+
+    static void Read(const RelacyPlain* slot) {
+        if (slot != nullptr) static_cast<void>(static_cast<unsigned int>(*slot));
+    }
+
+    void thread(unsigned int thread) {
+        if (thread == 0) return table.AddRows(kRows + 1, 1);
+        if (thread == 1) ++table.At(0, 0);
+        if (thread == 2) {
+            Read(table.Find(0, 1));
+            Read(&table.At(0, 2));
+        }
+        Read(table.Find(table.RowCount() - 1, 0));
+    }
+};
+
+TEST(MemoryModel, RowTableNeedsItsOrders) { ExpectNeedsItsOrders<RowTableSuite>(5); }
 
 }  // namespace
