@@ -10,7 +10,9 @@ clang_format=clang-format-14
 clang_tidy=clang-tidy-14
 build_packages=(g++ cmake ninja-build 'libboost1.81-dev|libboost-dev')
 test_packages=(pkg-config "${clang_packages[@]}" gettext locales libgtest-dev libgmock-dev
-    libvalijson-dev nlohmann-json3-dev libdw-dev relacy-dev xterm xvfb valgrind)
+    libvalijson-dev nlohmann-json3-dev libdw-dev relacy-dev xterm xvfb valgrind
+    'libc++-14-dev|libc++-19-dev' 'libc++abi-14-dev|libc++abi-19-dev' libprotozero-dev zlib1g-dev catch2
+    libbenchmark-dev python3-prometheus-client golang-go)
 
 fail() {
     echo "scripts/$me: $*" >&2

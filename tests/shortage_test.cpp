@@ -75,8 +75,10 @@ std::string Accounts() {
         std::remove_if(rows.begin(), rows.end(), [](const auto& row) { return row.mnLiveBlocks == 0; }),
         rows.end());
     for (HMemorySnapshot::Row& row : rows) row.mnAllocated = row.mnAllocCount = 0;
-    const HDiskIOSnapshot files = HDiskIOSnapshot::Take();
-    const GlobalTimerSnapshot timers = GlobalTimerSnapshot::Take();
+    HDiskIOSnapshot files = HDiskIOSnapshot::Take();
+    GlobalTimerSnapshot timers = GlobalTimerSnapshot::Take();
+    memory.mdTime = files.mdTime = timers.mdTime = 0;
+    for (GlobalTimerSnapshot::Row& row : timers.maRows) row.mdOpenSeconds = 0;
     std::ostringstream text;
     HWriteJson(text, &memory, &files, &timers);
     return text.str();

@@ -10,8 +10,6 @@
 /// @addtogroup timing
 /// @{
 
-struct GlobalTimerSnapshot;
-
 /// The process's flat list of cumulative timers. There is one instance.
 ///
 ///     const auto load = GlobalTimer::GetInstance().RegisterNewTimer("load");
@@ -83,7 +81,7 @@ public:
     GlobalTimer& operator=(const GlobalTimer&);
 
 private:
-    friend struct GlobalTimerSnapshot;  // reads the rows
+    friend struct GlobalTimerAccess;  // reads the rows for snapshots
     struct TimerSlot;
     struct Impl;
 

@@ -17,6 +17,10 @@
 /// @addtogroup memory
 /// @{
 
+#ifndef ZANBASE_HOME_LAYOUT
+#error \
+    "zanbase/memory_tables.h shows the library's own containers: it works with libstdc++ without _GLIBCXX_DEBUG only"
+#endif
 #if BOOST_VERSION != ZANBASE_BOOST_VERSION
 #error "zanbase was built with another version of Boost: see ZANBASE_BOOST_VERSION in zanbase/boost_version.h"
 #endif

@@ -86,8 +86,13 @@ public:
     OMPNested(bool enable);
     ~OMPNested();
 
-    /// Copies the recorded values and shares the thread count; calls nothing in the runtime.
+    /// Copies the recorded values and shares the thread count; calls nothing in the runtime. Not with another standard
+    /// library than the library's: the share is a `std::shared_ptr`.
+#ifndef ZANBASE_FOREIGN_LIBRARY
     OMPNested(const OMPNested&) = default;
+#else
+    OMPNested(const OMPNested&) = delete;
+#endif
 
     /// Copies the recorded values and shares the thread count.
     OMPNested& operator=(const OMPNested&);

@@ -15,6 +15,11 @@
 /// @addtogroup locks
 /// @{
 
+/// @cond
+// The bytes of the members of `HReadPrefMutex` and `HWritePrefMutex`, as the library has them.
+constexpr std::size_t kReadWriteMemberBytes = 120;
+/// @endcond
+
 /// A lock that many readers or one writer can hold: the interface of both kinds.
 ///
 ///     HWritePrefMutex mutex;
@@ -95,6 +100,7 @@ public:
 private:
     friend struct HReadWriteSteps;
 
+#ifdef ZANBASE_HOME_LAYOUT
     mutable unsigned int mnReaders = 0;  // read locks of all threads, nested too; guarded by moReaderMutex
     mutable unsigned int mnWriters = 0;  // depth of the write lock; guarded by moWriterMutex
     mutable ReadCounts moReaderThreads;  // guarded by moReaderMutex
@@ -107,6 +113,14 @@ private:
     HSemaphore moGate;      // acquired by a reader to enter, and by a writer until it leaves
     mutable ReadCounts::node_type
         moSpareCount;  // saves the next first reader an allocation; guarded by moReaderMutex
+#else
+    // The library's members. In this mode their types have another layout, so only the library accesses them.
+    alignas(8) unsigned char maMembers[kReadWriteMemberBytes];
+
+public:
+    HReadPrefMutex(const HReadPrefMutex&) = delete;
+    HReadPrefMutex& operator=(const HReadPrefMutex&) = delete;
+#endif
 };
 
 /// The kind that prefers writers: while a writer waits, only threads that are reading already can acquire
@@ -128,6 +142,7 @@ public:
 private:
     friend struct HReadWriteSteps;
 
+#ifdef ZANBASE_HOME_LAYOUT
     // As in HReadPrefMutex, but mnWriterThread is set and cleared under moWriterMutex.
     mutable unsigned int mnReaders = 0;
     mutable unsigned int mnWriters = 0;
@@ -138,6 +153,14 @@ private:
     HSemaphore moGate;
     HSemaphore moResource;
     mutable ReadCounts::node_type moSpareCount;
+#else
+    // The library's members. In this mode their types have another layout, so only the library accesses them.
+    alignas(8) unsigned char maMembers[kReadWriteMemberBytes];
+
+public:
+    HWritePrefMutex(const HWritePrefMutex&) = delete;
+    HWritePrefMutex& operator=(const HWritePrefMutex&) = delete;
+#endif
 };
 
 /// Holds one read lock of a `HReadWriteMutex` for a scope, or nothing.

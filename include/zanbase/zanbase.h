@@ -45,6 +45,8 @@
 /// The accounts of memory, disk and timers as values that can be compared, added up and written.
 /// @defgroup adapters Adapters
 /// Header-only helpers that feed the accounts and lend the locks to the standard library's holders.
+/// @defgroup integrations Integrations
+/// Headers that need another library: profiles, a reader of the JSON, and budgets for test frameworks.
 /// @defgroup environment Environment
 /// Message catalogue, random numbers, terminal codes, and a text console.
 

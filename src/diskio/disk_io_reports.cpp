@@ -3,6 +3,7 @@
 #include "memory/report_lock.h"
 #include "memory/report_text.h"
 #include "zanbase/disk_io.h"
+#include "zanbase/tracker_pause.h"
 
 namespace {
 
@@ -12,6 +13,7 @@ bool HasFiles() { return mpoDiskIOFileMap != nullptr && !mpoDiskIOFileMap->empty
 }  // namespace
 
 bool HDiskIOReportFile(std::FILE* stream, const std::string& name) {
+    const HTrackerPause pause;
     DiskIOFileMap::const_iterator file;
     const auto has_text = [&] {
         return HasFiles() && (file = mpoDiskIOFileMap->find(name)) != mpoDiskIOFileMap->end();
@@ -23,12 +25,14 @@ bool HDiskIOReportFile(std::FILE* stream, const std::string& name) {
 }
 
 void HDiskIOSummaryReport(std::FILE* stream) {
+    const HTrackerPause pause;
     const ReportLock lock(*mpoDiskIOMutex, stream, HasFiles);
     if (!lock) return;
     WriteText(stream, DiskIOSummaryText(*mpoDiskIOFileMap));
 }
 
 void HDiskIOUsageReport(std::FILE* stream) {
+    const HTrackerPause pause;
     const ReportLock lock(*mpoDiskIOMutex, stream, HasFiles);
     if (!lock) return;
     // Copies of the names: the write function of the stream may reset the ledger.

@@ -1,50 +1,13 @@
-// The disk ledger as a value.
-#include <algorithm>
-#include <iterator>
-
+// The disk ledger as plain data.
 #include "diskio/ledger.h"
-#include "snapshot/snapshot_rows.h"
-#include "zanbase/snapshot.h"
+#include "snapshot/taken_data.h"
 
 namespace {
 
-struct DiskIORules {
-    using Row = HDiskIOSnapshot::Row;
-    using Operation = HDiskIOSnapshot::Operation;
+using TakenDiskIO = TakenData<HDiskIOData, HDiskIOFileData>;
 
-    static bool KeyLess(const Row& left, const Row& right) { return left.moName < right.moName; }
-
-    static Row WithoutFigures(const Row& row) {
-        Row key;
-        key.moName = row.moName;
-        return key;
-    }
-
-    static void Add(Row& row, const Row& other, int sign) {
-        for (const auto member : kOperations) {
-            Operation& sum = row.*member;
-            const Operation& term = other.*member;
-            sum.mnCount = Combined(sum.mnCount, term.mnCount, sign);
-            sum.mdSeconds = Combined(sum.mdSeconds, term.mdSeconds, sign);
-            sum.mnBytes = Combined(sum.mnBytes, term.mnBytes, sign);
-        }
-    }
-
-    static bool IsZero(const Row& row) {
-        return std::all_of(std::begin(kOperations), std::end(kOperations), [&row](auto member) {
-            const Operation& operation = row.*member;
-            return operation.mnCount == 0 && operation.mdSeconds == 0 && operation.mnBytes == 0;
-        });
-    }
-
-private:
-    static constexpr Operation Row::*kOperations[] = {&Row::moOpen, &Row::moClose, &Row::moSeek, &Row::moRead,
-                                                      &Row::moWrite};
-};
-
-HDiskIOSnapshot::Row CopyOf(const DiskIOFileMap::value_type& file) {
-    const DiskIOUsage& usage = file.second;
-    return {file.first,
+HDiskIOFileData CopyOf(HTextData name, const DiskIOUsage& usage) {
+    return {name,
             {usage.mnOpenCount, usage.mdOpenTime, 0},
             {usage.mnCloseCount, usage.mdCloseTime, 0},
             {usage.mnSeekCount, usage.mdSeekTime, 0},
@@ -54,19 +17,14 @@ HDiskIOSnapshot::Row CopyOf(const DiskIOFileMap::value_type& file) {
 
 }  // namespace
 
-HDiskIOSnapshot HDiskIOSnapshot::Take() {
-    HDiskIOSnapshot snapshot;
-    const HMutexLock lock(mpoDiskIOMutex);
-    if (mpoDiskIOFileMap == nullptr) return snapshot;
-    snapshot.maRows.reserve(mpoDiskIOFileMap->size());
-    for (const auto& file : *mpoDiskIOFileMap) snapshot.maRows.push_back(CopyOf(file));
-    return snapshot;
+const HDiskIOData* HTakeDiskIOData() noexcept {
+    return Take<TakenDiskIO>([](TakenDiskIO& taken) {
+        const HMutexLock lock(mpoDiskIOMutex);
+        if (mpoDiskIOFileMap == nullptr) return;
+        taken.maRows.reserve(mpoDiskIOFileMap->size());
+        for (const auto& [name, usage] : *mpoDiskIOFileMap)
+            taken.maRows.push_back(CopyOf(taken.Keep(name), usage));
+    });
 }
 
-HDiskIOSnapshot HDiskIOSnapshot::Since(const HDiskIOSnapshot& earlier) const {
-    return {RowsSince<DiskIORules>(maRows, earlier.maRows)};
-}
-
-void HDiskIOSnapshot::Merge(const HDiskIOSnapshot& other) {
-    maRows = CombinedRows<DiskIORules>(maRows, other.maRows, 1);
-}
+void HReleaseData(const HDiskIOData* data) noexcept { Release<TakenDiskIO>(data); }

@@ -15,6 +15,10 @@ unsigned long long Self() { return LockOwner(); }
 
 HReadWriteMutex::~HReadWriteMutex() = default;
 
+// Callers in other modes of the standard library reserve this many bytes.
+static_assert(sizeof(HReadPrefMutex) == sizeof(HReadWriteMutex) + kReadWriteMemberBytes);
+static_assert(sizeof(HWritePrefMutex) == sizeof(HReadPrefMutex));
+
 HReadPrefMutex::HReadPrefMutex() = default;
 HReadPrefMutex::~HReadPrefMutex() = default;
 void HReadPrefMutex::ReadLock() const { HReadWriteSteps::ReadLockAtOnce(*this, Self()); }

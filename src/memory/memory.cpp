@@ -13,6 +13,7 @@
 #include <utility>
 
 #include "zanbase/memory_tables.h"
+#include "zanbase/tracker_pause.h"
 
 HMemory::FileMap* HMemory::mpoFileMap = nullptr;
 HMemory::MemoryMap* HMemory::mpoMemoryMap = nullptr;
@@ -126,6 +127,7 @@ void HMemory::Free(void* ptr) {
 }
 
 void HMemory::Push() {
+    const HTrackerPause pause;
     const HMutexLock lock(&moMutex);
     if (mpoFileMap == nullptr) return;
     mpoMemoryStack->push_back({*mpoFileMap, *mpoMemoryMap, mnTotalMemory, mnPeekMemory});
@@ -135,6 +137,7 @@ void HMemory::Push() {
 // The saved state is removed afterwards, so its tables are moved and not copied. This needs no memory and so
 // can't stop halfway.
 void HMemory::Pop() {
+    const HTrackerPause pause;
     const HMutexLock lock(&moMutex);
     if (mpoFileMap == nullptr || mpoMemoryStack->empty()) return;
     MemoryState& saved = mpoMemoryStack->back();
@@ -146,6 +149,7 @@ void HMemory::Pop() {
 }
 
 void HMemory::Reset() {
+    const HTrackerPause pause;
     const HMutexLock lock(&moMutex);
     if (mpoFileMap == nullptr) return;
     UsageReset();
@@ -155,6 +159,7 @@ void HMemory::Reset() {
 }
 
 void HMemory::UsageReset() {
+    const HTrackerPause pause;
     const HMutexLock lock(&moMutex);
     if (mpoFileMap == nullptr) return;
     mpoFileMap->clear();

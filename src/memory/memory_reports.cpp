@@ -9,6 +9,7 @@
 #include "memory/report_lock.h"
 #include "memory/report_text.h"
 #include "zanbase/memory_tables.h"
+#include "zanbase/tracker_pause.h"
 
 namespace {
 
@@ -19,6 +20,7 @@ ReportWriter WriterTo(std::FILE* stream) {
 }  // namespace
 
 void HMemory::LeakReport(std::FILE* stream) {
+    const HTrackerPause pause;
     const auto has_text = [] { return mpoMemoryMap != nullptr && !mpoMemoryMap->empty(); };
     const ReportLock lock(moMutex, stream, has_text);
     if (!lock) return;
@@ -34,6 +36,7 @@ void HMemory::LeakReport(std::FILE* stream) {
 }
 
 void HMemory::UsageReport(std::FILE* stream) {
+    const HTrackerPause pause;
     const auto has_text = [] { return mpoFileMap != nullptr && !mpoFileMap->empty(); };
     const ReportLock lock(moMutex, stream, has_text);
     if (!lock) return;

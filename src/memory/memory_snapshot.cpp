@@ -1,105 +1,127 @@
-// The tracker as a value.
+// The tracker as plain data.
 #include <algorithm>
-#include <cstddef>
+#include <cstdint>
 #include <functional>
-#include <iterator>
 #include <memory_resource>
 #include <tuple>
 #include <utility>
+#include <vector>
 
-#include "snapshot/snapshot_rows.h"
+#include "snapshot/taken_data.h"
 #include "zanbase/memory_tables.h"
-#include "zanbase/snapshot.h"
 
 namespace {
 
-struct MemoryRules {
-    using Row = HMemorySnapshot::Row;
+using TakenMemory = TakenData<HMemoryData, HMemorySiteData>;
 
-    static bool KeyLess(const Row& left, const Row& right) {
-        return std::tie(left.moFile, left.mnLine) < std::tie(right.moFile, right.mnLine);
-    }
+auto Figures(const HMemorySiteData& row) {
+    return std::tie(row.mnLiveBlocks, row.mnLiveBytes, row.mnAllocated, row.mnFreed, row.mnAllocCount,
+                    row.mnFreeCount);
+}
 
-    static Row WithoutFigures(const Row& row) {
-        Row key;
-        key.moFile = row.moFile;
-        key.mnLine = row.mnLine;
-        return key;
-    }
-
-    static void Add(Row& row, const Row& other, int sign) {
-        for (const auto figure : kFigures) row.*figure = Combined(row.*figure, other.*figure, sign);
-    }
-
-    static bool IsZero(const Row& row) {
-        return std::all_of(std::begin(kFigures), std::end(kFigures),
-                           [&row](auto figure) { return row.*figure == 0; });
-    }
-
-private:
-    static constexpr long long Row::*kFigures[] = {&Row::mnLiveBlocks, &Row::mnLiveBytes,  &Row::mnAllocated,
-                                                   &Row::mnFreed,      &Row::mnAllocCount, &Row::mnFreeCount};
-};
-
-// Reads the tracker's tables; moMutex is held from start to end.
+// Reads the tracker's tables. The index lies in a buffer of its own, which is a fifth faster than an allocation for
+// each node; not over the default resource, which is the program's and may record its blocks in these tables.
 class TableReader : public HMemory {
 public:
-    using Row = HMemorySnapshot::Row;
+    explicit TableReader(TakenMemory& taken) : moTaken(taken) {}
 
-    static HMemorySnapshot Copy() {
-        HMemorySnapshot snapshot;
+    // The rows in no order; their texts are still the program's, which owns them until moMutex is released. So their
+    // copies are made here, one for each address.
+    void Copy() {
         const HMutexLock lock(&moMutex);
-        if (mpoFileMap == nullptr) return snapshot;
-        snapshot.mnTotal = static_cast<long long>(mnTotalMemory);
-        snapshot.mnPeak = static_cast<long long>(mnPeekMemory);
-        // A fifth faster than an allocation for each node. Not over the default resource: that is the program's,
-        // and may record its blocks in the tables that are read here.
-        std::pmr::monotonic_buffer_resource nodes(std::pmr::new_delete_resource());
-        Indices indices(mpoFileMap->size(), boost::hash<CallSite>(), std::equal_to<CallSite>(), &nodes);
-        snapshot.maRows.reserve(mpoFileMap->size());
-        for (const auto& [site, usage] : *mpoFileMap) AddUsage(RowOf(snapshot, indices, site), usage);
+        if (mpoFileMap == nullptr) return;
+        moTaken.mnTotal = static_cast<long long>(mnTotalMemory);
+        moTaken.mnPeak = static_cast<long long>(mnPeekMemory);
+        moTaken.maRows.reserve(mpoFileMap->size());
+        moIndices.reserve(mpoFileMap->size());
+        for (const auto& [site, usage] : *mpoFileMap) AddUsage(RowOf(site), usage);
         for (const auto& [address, block] : *mpoMemoryMap) {
-            Row& row = RowOf(snapshot, indices, {block.mpcFile, block.mnLine});
+            HMemorySiteData& row = RowOf({block.mpcFile, block.mnLine});
             ++row.mnLiveBlocks;
-            row.mnLiveBytes = Combined(row.mnLiveBytes, static_cast<long long>(block.mnSize), 1);
+            row.mnLiveBytes =
+                static_cast<long long>(static_cast<std::size_t>(row.mnLiveBytes) + block.mnSize);
         }
-        return snapshot;
+        for (HMemorySiteData& row : moTaken.maRows) {
+            const auto [text, is_new] = moTexts.try_emplace(row.moFile.mpcBytes, moTaken.maTexts.size());
+            if (is_new) moTaken.Keep(row.moFile.mpcBytes);
+            maTextOfRow.push_back(static_cast<std::uint32_t>(text->second));
+        }
+    }
+
+    // Brings the rows into the order of text, line and figures, so that equal accounts give equal rows. Texts are
+    // compared once for each address; after that the order is one of numbers.
+    void Sort() {
+        const std::vector<std::uint32_t> ranks = RanksOfTexts();
+        std::vector<std::pair<std::uint64_t, std::size_t>> order;
+        order.reserve(moTaken.maRows.size());
+        for (std::size_t row = 0; row < moTaken.maRows.size(); ++row) {
+            const std::uint64_t rank = ranks[maTextOfRow[row]];
+            const auto line = static_cast<std::uint32_t>(moTaken.maRows[row].mnLine) ^ 0x80000000U;
+            order.emplace_back(rank << 32U | line, row);
+        }
+        std::sort(order.begin(), order.end(), [this](const auto& left, const auto& right) {
+            if (left.first != right.first) return left.first < right.first;
+            return Figures(moTaken.maRows[left.second]) < Figures(moTaken.maRows[right.second]);
+        });
+        std::vector<HMemorySiteData> sorted;
+        sorted.reserve(order.size());
+        for (const auto& [key, row] : order) {
+            const std::string& text = moTaken.maTexts[maTextOfRow[row]];
+            sorted.push_back(moTaken.maRows[row]);
+            sorted.back().moFile = {text.data(), text.size()};
+        }
+        moTaken.maRows = std::move(sorted);
     }
 
 private:
-    using Indices = boost::unordered::unordered_map<
-        CallSite, std::size_t, boost::hash<CallSite>, std::equal_to<CallSite>,
-        std::pmr::polymorphic_allocator<std::pair<const CallSite, std::size_t>>>;
+    template <class Key>
+    using Indices =
+        boost::unordered::unordered_map<Key, std::size_t, boost::hash<Key>, std::equal_to<Key>,
+                                        std::pmr::polymorphic_allocator<std::pair<const Key, std::size_t>>>;
 
-    static Row& RowOf(HMemorySnapshot& snapshot, Indices& indices, const CallSite& site) {
-        const auto [entry, is_new] = indices.try_emplace(site, snapshot.maRows.size());
-        if (is_new) {
-            Row& row = snapshot.maRows.emplace_back();
-            row.moFile = site.first;
-            row.mnLine = site.second;
-        }
-        return snapshot.maRows[entry->second];
+    HMemorySiteData& RowOf(const CallSite& site) {
+        const auto [entry, is_new] = moIndices.try_emplace(site, moTaken.maRows.size());
+        if (is_new) moTaken.maRows.push_back({{site.first, 0}, site.second, 0, 0, 0, 0, 0, 0});
+        return moTaken.maRows[entry->second];
     }
 
-    static void AddUsage(Row& row, const MemoryUsage& usage) {
+    static void AddUsage(HMemorySiteData& row, const MemoryUsage& usage) {
         row.mnAllocated = static_cast<long long>(usage.mnAllocated);
         row.mnFreed = static_cast<long long>(usage.mnFreed);
         row.mnAllocCount = usage.mnAllocCount;
         row.mnFreeCount = usage.mnFreeCount;
     }
+
+    // The place of each text in their order; equal texts have the same.
+    [[nodiscard]] std::vector<std::uint32_t> RanksOfTexts() const {
+        const auto& texts = moTaken.maTexts;
+        std::vector<std::uint32_t> order(texts.size());
+        for (std::size_t text = 0; text < order.size(); ++text)
+            order[text] = static_cast<std::uint32_t>(text);
+        std::sort(order.begin(), order.end(),
+                  [&](std::uint32_t left, std::uint32_t right) { return texts[left] < texts[right]; });
+        std::vector<std::uint32_t> ranks(texts.size());
+        for (std::size_t place = 1; place < order.size(); ++place)
+            ranks[order[place]] =
+                ranks[order[place - 1]] + (texts[order[place - 1]] != texts[order[place]] ? 1U : 0U);
+        return ranks;
+    }
+
+    TakenMemory& moTaken;
+    std::pmr::monotonic_buffer_resource moNodes{std::pmr::new_delete_resource()};
+    Indices<CallSite> moIndices{&moNodes};   // of a row, by its site
+    Indices<const char*> moTexts{&moNodes};  // of a text, by its address in the program
+    std::vector<std::uint32_t> maTextOfRow;  // the index of each row's text
 };
 
 }  // namespace
 
-HMemorySnapshot HMemorySnapshot::Take() { return TableReader::Copy(); }
-
-HMemorySnapshot HMemorySnapshot::Since(const HMemorySnapshot& earlier) const {
-    return {RowsSince<MemoryRules>(maRows, earlier.maRows), Combined(mnTotal, earlier.mnTotal, -1),
-            Combined(mnPeak, earlier.mnPeak, -1)};
+const HMemoryData* HTakeMemoryData() noexcept {
+    return Take<TakenMemory>([](TakenMemory& taken) {
+        TableReader reader(taken);
+        reader.Copy();
+        reader.Sort();
+    });
 }
 
-void HMemorySnapshot::Merge(const HMemorySnapshot& other) {
-    maRows = CombinedRows<MemoryRules>(maRows, other.maRows, 1);
-    mnTotal = Combined(mnTotal, other.mnTotal, 1);
-    mnPeak = Combined(mnPeak, other.mnPeak, 1);
-}
+void HReleaseData(const HMemoryData* data) noexcept { Release<TakenMemory>(data); }

@@ -2,22 +2,22 @@
 #include <algorithm>
 #include <cmath>
 #include <string_view>
-#include <vector>
 
 #include "snapshot/text_sink.h"
-#include "zanbase/snapshot_text.h"
+#include "zanbase/account_data.h"
 
 namespace {
 
 // "KEY":"text", and with it "KEY_hex" for a text that is not UTF-8.
-void AddText(TextSink& sink, std::string_view key, std::string_view text) {
+void AddText(TextSink& sink, std::string_view key, const HTextData& data) {
+    const std::string_view text = ViewOf(data);
     sink.Add("\"").Add(key).Add("\":").AddJsonString(text);
     if (!IsUtf8(text)) sink.Add(",\"").Add(key).Add("_hex\":\"").AddHex(text).Add("\"");
 }
 
 void AddSeconds(TextSink& sink, double seconds) { sink.AddNumber(seconds, "null"); }
 
-void AddRow(TextSink& sink, const HMemorySnapshot::Row& row) {
+void AddRow(TextSink& sink, const HMemorySiteData& row) {
     AddText(sink, "file", row.moFile);
     sink.Add(",\"line\":").AddNumber(static_cast<long long>(row.mnLine));
     sink.Add(",\"live_blocks\":").AddNumber(row.mnLiveBlocks);
@@ -28,15 +28,14 @@ void AddRow(TextSink& sink, const HMemorySnapshot::Row& row) {
     sink.Add(",\"free_count\":").AddNumber(row.mnFreeCount);
 }
 
-void AddOperation(TextSink& sink, std::string_view key, const HDiskIOSnapshot::Operation& operation,
-                  bool moves_bytes) {
+void AddOperation(TextSink& sink, std::string_view key, const HDiskIOOperation& operation, bool moves_bytes) {
     sink.Add(",\"").Add(key).Add("\":{\"count\":").AddNumber(operation.mnCount);
     AddSeconds(sink.Add(",\"seconds\":"), operation.mdSeconds);
     if (moves_bytes) sink.Add(",\"bytes\":").AddNumber(operation.mnBytes);
     sink.Add("}");
 }
 
-void AddRow(TextSink& sink, const HDiskIOSnapshot::Row& row) {
+void AddRow(TextSink& sink, const HDiskIOFileData& row) {
     AddText(sink, "name", row.moName);
     AddOperation(sink, "open", row.moOpen, false);
     AddOperation(sink, "close", row.moClose, false);
@@ -45,51 +44,65 @@ void AddRow(TextSink& sink, const HDiskIOSnapshot::Row& row) {
     AddOperation(sink, "write", row.moWrite, true);
 }
 
-void AddRow(TextSink& sink, const GlobalTimerSnapshot::Row& row) {
+void AddRow(TextSink& sink, const HTimerRowData& row) {
     AddText(sink, "name", row.moName);
     AddSeconds(sink.Add(",\"seconds\":"), row.mdSeconds);
     sink.Add(",\"threads\":[");
     std::string_view separator;
-    for (const double seconds : row.maThreadSeconds) {
-        AddSeconds(sink.Add(separator), seconds);
+    for (std::size_t thread = 0; thread < row.mnThreads; ++thread) {
+        AddSeconds(sink.Add(separator), row.mpdThreadSeconds[thread]);
         separator = ",";
     }
-    sink.Add("]");
+    AddSeconds(sink.Add("],\"open_seconds\":"), row.mdOpenSeconds);
 }
 
 // The member "rows", each row on a line of its own.
-template <class Row>
-void AddRows(TextSink& sink, const std::vector<Row>& rows) {
+template <class Data>
+void AddRows(TextSink& sink, const Data& data) {
     sink.Add("\"rows\":[");
     std::string_view separator = "\n{";
-    for (const Row& row : rows) {
-        AddRow(sink.Add(separator), row);
+    for (std::size_t row = 0; row < data.mnRows; ++row) {
+        AddRow(sink.Add(separator), data.mpoRows[row]);
         sink.Add("}");
         separator = ",\n{";
     }
     sink.Add("]}");
 }
 
-std::size_t ThreadCount(const GlobalTimerSnapshot& timers) {
+// What is known of when and where an account was taken.
+template <class Data>
+void AddOrigin(TextSink& sink, const Data& data) {
+    if (data.mdTime != 0) AddSeconds(sink.Add("\"time\":"), data.mdTime);
+    if (data.mdTime != 0) sink.Add(",");
+    if (data.mnProcess != 0) sink.Add("\"process\":").AddNumber(data.mnProcess).Add(",");
+}
+
+std::size_t ThreadCount(const HTimerData& timers) {
     std::size_t count = 0;
-    for (const auto& row : timers.maRows) count = std::max(count, row.maThreadSeconds.size());
+    for (std::size_t row = 0; row < timers.mnRows; ++row)
+        count = std::max(count, timers.mpoRows[row].mnThreads);
     return count;
 }
 
-constexpr char kThreadMember[] = "\"pid\":1,\"tid\":";
+// A trace viewer keeps processes apart by their numbers; one that is unknown is 1.
+TextSink& AddThreadMembers(TextSink& sink, const HTimerData& timers, std::size_t thread) {
+    sink.Add("\"pid\":").AddNumber(timers.mnProcess != 0 ? timers.mnProcess : 1LL);
+    return sink.Add(",\"tid\":").AddNumber(static_cast<long long>(thread));
+}
 
 // The timers of one thread, one after the other.
-void AddThreadEvents(TextSink& sink, const GlobalTimerSnapshot& timers, std::size_t thread) {
+void AddThreadEvents(TextSink& sink, const HTimerData& timers, std::size_t thread) {
     double start = 0;
-    for (const auto& row : timers.maRows) {
-        const double seconds = thread < row.maThreadSeconds.size() ? row.maThreadSeconds[thread] : 0;
+    for (std::size_t index = 0; index < timers.mnRows; ++index) {
+        const HTimerRowData& row = timers.mpoRows[index];
+        const double seconds = thread < row.mnThreads ? row.mpdThreadSeconds[thread] : 0;
         if (!(seconds > 0) || !std::isfinite(seconds)) continue;
         const double duration = std::round(seconds * 1e6);
-        sink.Add(",\n{\"ph\":\"X\",\"cat\":\"timer\",").Add(kThreadMember);
-        sink.AddNumber(static_cast<long long>(thread)).Add(",\"ts\":").AddNumber(start, "0");
-        sink.Add(",\"dur\":").AddNumber(duration, "0").Add(",\"name\":").AddJsonString(row.moName);
-        sink.Add(",\"args\":{");
-        if (!IsUtf8(row.moName)) sink.Add("\"name_hex\":\"").AddHex(row.moName).Add("\"");
+        AddThreadMembers(sink.Add(",\n{\"ph\":\"X\",\"cat\":\"timer\","), timers, thread);
+        sink.Add(",\"ts\":").AddNumber(start, "0").Add(",\"dur\":").AddNumber(duration, "0").Add(",");
+        AddText(sink, "name", row.moName);
+        AddSeconds(sink.Add(",\"args\":{\"seconds\":"), seconds);
+        AddSeconds(sink.Add(",\"seconds_of_all_threads\":"), row.mdSeconds);
         sink.Add("}}");
         start += duration;
     }
@@ -97,41 +110,35 @@ void AddThreadEvents(TextSink& sink, const GlobalTimerSnapshot& timers, std::siz
 
 }  // namespace
 
-bool HWriteJson(std::ostream& stream, const HMemorySnapshot* memory, const HDiskIOSnapshot* diskIO,
-                const GlobalTimerSnapshot* timers) {
-    TextSink sink(stream);
+bool HWriteJsonData(const HTextOutput& output, const HMemoryData* memory, const HDiskIOData* diskIO,
+                    const HTimerData* timers) {
+    TextSink sink(output);
     sink.Add("{\"schema\":\"zanbase-snapshot\",\"version\":").AddNumber(kSnapshotJsonVersion + 0LL);
     if (memory != nullptr) {
-        sink.Add(",\n\"memory\":{\"total\":").AddNumber(memory->mnTotal);
+        AddOrigin(sink.Add(",\n\"memory\":{"), *memory);
+        sink.Add("\"total\":").AddNumber(memory->mnTotal);
         sink.Add(",\"peak\":").AddNumber(memory->mnPeak).Add(",");
-        AddRows(sink, memory->maRows);
+        AddRows(sink, *memory);
     }
-    if (diskIO != nullptr) AddRows(sink.Add(",\n\"disk_io\":{"), diskIO->maRows);
-    if (timers != nullptr) AddRows(sink.Add(",\n\"timers\":{"), timers->maRows);
+    if (diskIO != nullptr) {
+        AddOrigin(sink.Add(",\n\"disk_io\":{"), *diskIO);
+        AddRows(sink, *diskIO);
+    }
+    if (timers != nullptr) {
+        AddOrigin(sink.Add(",\n\"timers\":{"), *timers);
+        AddRows(sink, *timers);
+    }
     return sink.Add("}\n").Finish();
 }
 
-bool HWriteJson(std::ostream& stream, const HMemorySnapshot& memory) {
-    return HWriteJson(stream, &memory, nullptr, nullptr);
-}
-
-bool HWriteJson(std::ostream& stream, const HDiskIOSnapshot& diskIO) {
-    return HWriteJson(stream, nullptr, &diskIO, nullptr);
-}
-
-bool HWriteJson(std::ostream& stream, const GlobalTimerSnapshot& timers) {
-    return HWriteJson(stream, nullptr, nullptr, &timers);
-}
-
-bool HWriteChromeTrace(std::ostream& stream, const GlobalTimerSnapshot& timers) {
-    TextSink sink(stream);
-    sink.Add("{\"displayTimeUnit\":\"ms\",\"traceEvents\":[\n");
-    sink.Add("{\"ph\":\"M\",\"pid\":1,\"tid\":0,\"name\":\"process_name\",\"args\":{\"name\":\"timers\"}}");
+bool HWriteChromeTraceData(const HTextOutput& output, const HTimerData& timers) {
+    TextSink sink(output);
+    sink.Add("{\"displayTimeUnit\":\"ms\",\"traceEvents\":[\n{\"ph\":\"M\",");
+    AddThreadMembers(sink, timers, 0).Add(",\"name\":\"process_name\",\"args\":{\"name\":\"timers\"}}");
     for (std::size_t thread = 0; thread < ThreadCount(timers); ++thread) {
-        const auto number = static_cast<long long>(thread);
-        sink.Add(",\n{\"ph\":\"M\",").Add(kThreadMember).AddNumber(number);
+        AddThreadMembers(sink.Add(",\n{\"ph\":\"M\","), timers, thread);
         sink.Add(",\"name\":\"thread_name\",\"args\":{\"name\":\"OpenMP thread ")
-            .AddNumber(number)
+            .AddNumber(static_cast<long long>(thread))
             .Add("\"}}");
         AddThreadEvents(sink, timers, thread);
     }

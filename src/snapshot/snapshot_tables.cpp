@@ -1,15 +1,16 @@
 // The texts that have a line for each row: CSV, and call sites as folded stacks.
+#include <algorithm>
 #include <initializer_list>
-#include <string>
 #include <string_view>
 
 #include "snapshot/text_sink.h"
-#include "zanbase/snapshot_text.h"
+#include "zanbase/account_data.h"
 
 namespace {
 
 // A field in quotes, with the quotes in it doubled.
-void AddQuoted(TextSink& sink, std::string_view text) {
+void AddQuoted(TextSink& sink, const HTextData& data) {
+    std::string_view text = ViewOf(data);
     sink.Add("\"");
     for (std::size_t quote; (quote = text.find('"')) != std::string_view::npos; text.remove_prefix(quote + 1))
         sink.Add(text.substr(0, quote)).Add("\"\"");
@@ -20,16 +21,16 @@ void AddFields(TextSink& sink, std::initializer_list<long long> numbers) {
     for (const long long number : numbers) sink.Add(",").AddNumber(number);
 }
 
-void AddOperation(TextSink& sink, const HDiskIOSnapshot::Operation& operation) {
+void AddOperation(TextSink& sink, const HDiskIOOperation& operation) {
     sink.Add(",").AddNumber(operation.mnCount).Add(",").AddNumber(operation.mdSeconds, "");
 }
 
-void AddTransfer(TextSink& sink, const HDiskIOSnapshot::Operation& operation) {
+void AddTransfer(TextSink& sink, const HDiskIOOperation& operation) {
     AddOperation(sink, operation);
     sink.Add(",").AddNumber(operation.mnBytes);
 }
 
-long long FigureOf(const HMemorySnapshot::Row& row, HMemoryFigure figure) {
+long long FigureOf(const HMemorySiteData& row, HMemoryFigure figure) {
     switch (figure) {
         case HMemoryFigure::kLiveBytes:
             return row.mnLiveBytes;
@@ -44,31 +45,28 @@ long long FigureOf(const HMemorySnapshot::Row& row, HMemoryFigure figure) {
 }
 
 // The parts of `path` as frames, without empty ones.
-std::string FramesOf(std::string_view path) {
-    std::string frames;
+void AddFrames(TextSink& sink, std::string_view path) {
+    bool has_frame = false;
     while (!path.empty()) {
-        const char byte = path.front();
-        const std::size_t length = Utf8CharacterLength(path);
-        if (byte == '/' || byte == '\\') {
-            if (!frames.empty() && frames.back() != ';') frames += ';';
-        } else if (length == 0) {
-            frames += "\xEF\xBF\xBD";
-        } else if (byte == ';' || byte == '\x7F' || static_cast<unsigned char>(byte) < ' ') {
-            frames += '_';
-        } else {
-            frames += path.substr(0, length);
-        }
-        path.remove_prefix(length == 0 ? 1 : length);
+        const std::string_view part = path.substr(0, path.find_first_of("/\\"));
+        path.remove_prefix(std::min(part.size() + 1, path.size()));
+        if (part.empty()) continue;
+        if (has_frame) sink.Add(";");
+        has_frame = true;
+        sink.AddUtf8(part, [](char byte) -> std::string_view {
+            const bool is_control = static_cast<unsigned char>(byte) < ' ' || byte == '\x7F';
+            return byte == ';' || is_control ? "_" : "";
+        });
     }
-    return frames;
 }
 
 }  // namespace
 
-bool HWriteCsv(std::ostream& stream, const HMemorySnapshot& memory) {
-    TextSink sink(stream);
+bool HWriteCsvData(const HTextOutput& output, const HMemoryData& memory) {
+    TextSink sink(output);
     sink.Add("file,line,live_blocks,live_bytes,allocated,freed,alloc_count,free_count\n");
-    for (const auto& row : memory.maRows) {
+    for (std::size_t index = 0; index < memory.mnRows; ++index) {
+        const HMemorySiteData& row = memory.mpoRows[index];
         AddQuoted(sink, row.moFile);
         AddFields(sink, {row.mnLine, row.mnLiveBlocks, row.mnLiveBytes, row.mnAllocated, row.mnFreed,
                          row.mnAllocCount, row.mnFreeCount});
@@ -77,11 +75,12 @@ bool HWriteCsv(std::ostream& stream, const HMemorySnapshot& memory) {
     return sink.Finish();
 }
 
-bool HWriteCsv(std::ostream& stream, const HDiskIOSnapshot& diskIO) {
-    TextSink sink(stream);
+bool HWriteCsvData(const HTextOutput& output, const HDiskIOData& diskIO) {
+    TextSink sink(output);
     sink.Add("name,open_count,open_seconds,close_count,close_seconds,seek_count,seek_seconds,")
         .Add("read_count,read_seconds,read_bytes,write_count,write_seconds,write_bytes\n");
-    for (const auto& row : diskIO.maRows) {
+    for (std::size_t index = 0; index < diskIO.mnRows; ++index) {
+        const HDiskIOFileData& row = diskIO.mpoRows[index];
         AddQuoted(sink, row.moName);
         for (const auto* operation : {&row.moOpen, &row.moClose, &row.moSeek}) AddOperation(sink, *operation);
         for (const auto* operation : {&row.moRead, &row.moWrite}) AddTransfer(sink, *operation);
@@ -90,25 +89,27 @@ bool HWriteCsv(std::ostream& stream, const HDiskIOSnapshot& diskIO) {
     return sink.Finish();
 }
 
-bool HWriteCsv(std::ostream& stream, const GlobalTimerSnapshot& timers) {
-    TextSink sink(stream);
+bool HWriteCsvData(const HTextOutput& output, const HTimerData& timers) {
+    TextSink sink(output);
     sink.Add("name,thread,seconds\n");
-    for (const auto& row : timers.maRows) {
-        long long thread = 0;
-        for (const double seconds : row.maThreadSeconds) {
+    for (std::size_t index = 0; index < timers.mnRows; ++index) {
+        const HTimerRowData& row = timers.mpoRows[index];
+        for (std::size_t thread = 0; thread < row.mnThreads; ++thread) {
             AddQuoted(sink, row.moName);
-            sink.Add(",").AddNumber(thread++).Add(",").AddNumber(seconds, "").Add("\n");
+            sink.Add(",").AddNumber(static_cast<long long>(thread)).Add(",");
+            sink.AddNumber(row.mpdThreadSeconds[thread], "").Add("\n");
         }
     }
     return sink.Finish();
 }
 
-bool HWriteFoldedStacks(std::ostream& stream, const HMemorySnapshot& memory, HMemoryFigure figure) {
-    TextSink sink(stream);
-    for (const auto& row : memory.maRows) {
+bool HWriteFoldedStacksData(const HTextOutput& output, const HMemoryData& memory, HMemoryFigure figure) {
+    TextSink sink(output);
+    for (std::size_t index = 0; index < memory.mnRows; ++index) {
+        const HMemorySiteData& row = memory.mpoRows[index];
         const long long value = FigureOf(row, figure);
         if (value <= 0) continue;
-        sink.Add(FramesOf(row.moFile));
+        AddFrames(sink, ViewOf(row.moFile));
         if (row.mnLine > 0) sink.Add(":").AddNumber(static_cast<long long>(row.mnLine));
         sink.Add(" ").AddNumber(value).Add("\n");
     }

@@ -1,7 +1,6 @@
 // Numbers and strings as the text formats need them.
 #include "snapshot/text_sink.h"
 
-#include <array>
 #include <charconv>
 #include <cmath>
 
@@ -66,6 +65,10 @@ bool IsUtf8(std::string_view text) {
     return true;
 }
 
+std::size_t HUtf8CharacterLength(const char* bytes, std::size_t count) noexcept {
+    return Utf8CharacterLength({bytes, count});
+}
+
 TextSink& TextSink::AddNumber(long long number) {
     std::array<char, 24> digits;
     const auto end = std::to_chars(digits.data(), digits.data() + digits.size(), number).ptr;
@@ -117,9 +120,4 @@ TextSink& TextSink::AddHex(std::string_view bytes) {
         Add({digits, sizeof digits});
     }
     return *this;
-}
-
-void TextSink::WritePiece() {
-    moStream.write(moBuffer.data(), static_cast<std::streamsize>(moBuffer.size()));
-    moBuffer.clear();
 }

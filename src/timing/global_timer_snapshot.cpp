@@ -1,40 +1,30 @@
-// The arithmetic of the timers' snapshots; `Take` is beside the timers, whose rows only they know.
-#include <algorithm>
-#include <cstddef>
+// The timers as plain data.
+#include <deque>
+#include <vector>
 
-#include "snapshot/snapshot_rows.h"
-#include "zanbase/snapshot.h"
+#include "snapshot/taken_data.h"
+#include "timing/timer_rows.h"
 
 namespace {
 
-struct TimerRules {
-    using Row = GlobalTimerSnapshot::Row;
-
-    static bool KeyLess(const Row& left, const Row& right) { return left.moName < right.moName; }
-
-    static Row WithoutFigures(const Row& row) { return {row.moName, 0, {}}; }
-
-    static void Add(Row& row, const Row& other, int sign) {
-        row.mdSeconds = Combined(row.mdSeconds, other.mdSeconds, sign);
-        row.maThreadSeconds.resize(std::max(row.maThreadSeconds.size(), other.maThreadSeconds.size()));
-        for (std::size_t thread = 0; thread < other.maThreadSeconds.size(); ++thread) {
-            double& seconds = row.maThreadSeconds[thread];
-            seconds = Combined(seconds, other.maThreadSeconds[thread], sign);
-        }
-    }
-
-    static bool IsZero(const Row& row) {
-        return row.mdSeconds == 0 && std::all_of(row.maThreadSeconds.begin(), row.maThreadSeconds.end(),
-                                                 [](double seconds) { return seconds == 0; });
-    }
+struct TakenTimers : TakenData<HTimerData, HTimerRowData> {
+    std::deque<std::vector<double>> maThreads;  // its elements don't move
 };
+
+constexpr double kMicroseconds = 1000000.0;
 
 }  // namespace
 
-GlobalTimerSnapshot GlobalTimerSnapshot::Since(const GlobalTimerSnapshot& earlier) const {
-    return {RowsSince<TimerRules>(maRows, earlier.maRows)};
+const HTimerData* HTakeTimerData() noexcept {
+    return Take<TakenTimers>([](TakenTimers& taken) {
+        for (TimerTotals& timer : GlobalTimerAccess::Totals()) {
+            const double total = timer.Total();
+            std::vector<double>& threads = taken.maThreads.emplace_back(std::move(timer.maThreads));
+            for (double& seconds : threads) seconds /= kMicroseconds;
+            taken.maRows.push_back({taken.Keep(timer.moName), total / kMicroseconds, threads.data(),
+                                    threads.size(), timer.mdOpen / kMicroseconds});
+        }
+    });
 }
 
-void GlobalTimerSnapshot::Merge(const GlobalTimerSnapshot& other) {
-    maRows = CombinedRows<TimerRules>(maRows, other.maRows, 1);
-}
+void HReleaseData(const HTimerData* data) noexcept { Release<TakenTimers>(data); }

@@ -53,6 +53,17 @@ public:
         return ItemOf(lines, place);
     }
 
+    // Calls `visit` with each item that was made. Thread-safe if `visit` is.
+    template <class Visit>
+    void ForEach(Visit visit) {
+        for (std::size_t segment = 0; segment < kSegments; ++segment) {
+            Line* const lines = maSegments[segment].load(std::memory_order_acquire);
+            const std::size_t count = lines != nullptr ? (kFirst << segment) / kLineItems : 0;
+            for (std::size_t line = 0; line < count; ++line)
+                for (Item& item : lines[line].maItems) visit(item);
+        }
+    }
+
 private:
     static constexpr std::size_t kLineItems = 16;
     static constexpr std::size_t kSegments = 32;

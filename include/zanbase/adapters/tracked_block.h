@@ -1,5 +1,6 @@
 /// @file
-/// The pieces of tracked memory: the call site, the pause, and functions that record one block. They are for
+/// The pieces of tracked memory: the call site, and functions that record one block unless the thread has an
+/// `HTrackerPause`. They are for
 /// code that has an allocator of its own, or that replaces the global `operator new`.
 ///
 ///     void* Allocate(std::size_t size, const HCallSite& site = HCallSite::Here()) {
@@ -19,9 +20,11 @@
 #define ZANBASE_ADAPTERS_TRACKED_BLOCK_H
 
 #include <cstddef>
+#include <cstdlib>
 #include <new>
 
 #include "zanbase/memory.h"
+#include "zanbase/tracker_pause.h"
 
 #if __cplusplus >= 202002L
 #include <version>
@@ -45,52 +48,24 @@ struct HCallSite {
     }
 
 #ifdef __cpp_lib_source_location
-    /// The place that `where` tells.
+    /// The place that `where` names.
     static constexpr HCallSite At(const std::source_location& where) {
         return {where.file_name(), static_cast<int>(where.line())};
     }
 #endif
 };
 
-/// While one of these exists on a thread, blocks are not recorded on that thread, neither by the functions
-/// below nor by the adapters over them. Pauses nest. Not thread-safe: an object belongs to the thread that made it.
-///
-/// In a program whose `operator new` records, put a pause around the tracker's own operations (reports,
-/// snapshots, `Push`, `Pop`, the resets): those allocate and free while they walk over its tables.
-/// Requires: no block that was recorded is freed during the pause; its record would stay.
-class HTrackerPause {
-public:
-    /// Starts a pause.
-    HTrackerPause() noexcept { ++mnPauses; }
-    /// Ends it.
-    ~HTrackerPause() { --mnPauses; }
-    HTrackerPause(const HTrackerPause&) = delete;
-    HTrackerPause& operator=(const HTrackerPause&) = delete;
-
-    /// True if the calling thread has a pause.
-    [[nodiscard]] static bool IsActive() noexcept { return mnPauses != 0; }
-
-private:
-    static inline thread_local int mnPauses = 0;
-};
-
 /// Records the block at `ptr`, unless the thread has a pause. What the tracker allocates for its record is
 /// not recorded, so a replaced `operator new` may call this. Thread-safe.
 inline void HTrackAlloc(void* ptr, std::size_t size, const HCallSite& site) {
     if (HTrackerPause::IsActive()) return;
-    const HTrackerPause pause;
-    HMemory::Alloc(ptr, size, site.mpcFile, site.mnLine);
+    if (!HTrackBlock(ptr, size, site.mpcFile, site.mnLine)) ZANBASE_THROW_BAD_ALLOC();
 }
 
 /// Records that the block at `ptr` is given back, unless the thread has a pause. Call it before the block is
 /// given back. If the tracker has no memory for it, the record stays. Thread-safe.
 inline void HTrackFree(void* ptr) noexcept {
-    if (HTrackerPause::IsActive()) return;
-    const HTrackerPause pause;
-    try {
-        HMemory::Free(ptr);
-    } catch (const std::bad_alloc&) {
-    }
+    if (!HTrackerPause::IsActive()) HTrackBlockEnd(ptr);
 }
 
 /// Calls `allocate`, records its block of `size` bytes and returns it. If that can't be recorded, calls
@@ -101,12 +76,9 @@ auto HTrackedAllocation(std::size_t size, const HCallSite& site, Allocate alloca
     const bool is_recorded = !HTrackerPause::IsActive();
     const HTrackerPause pause;
     const auto block = allocate();
-    if (!is_recorded) return block;
-    try {
-        HMemory::Alloc(block, size, site.mpcFile, site.mnLine);
-    } catch (...) {
+    if (is_recorded && !HTrackBlock(block, size, site.mpcFile, site.mnLine)) {
         deallocate(block);
-        throw;
+        ZANBASE_THROW_BAD_ALLOC();
     }
     return block;
 }

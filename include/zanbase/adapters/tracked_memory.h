@@ -17,19 +17,25 @@
 #define ZANBASE_ADAPTERS_TRACKED_MEMORY_H
 
 #include <cstddef>
+#include <cstdlib>
 #include <memory>
-#include <memory_resource>
 #include <new>
 #include <type_traits>
 #include <utility>
+
+#if __has_include(<memory_resource>)
+#include <memory_resource>
+#endif
 
 #include "zanbase/adapters/tracked_block.h"
 
 /// @addtogroup adapters
 /// @{
 
+#ifdef __cpp_lib_memory_resource
 /// A memory resource that takes blocks from `upstream` and records them at one call site, by default the line
-/// that makes the resource. Thread-safe if `upstream` is.
+/// that makes the resource. `std::make_unique` and the like would make it on a line of the standard library: pass
+/// them `HCallSite::Here()`. Thread-safe if `upstream` is.
 class HTrackedResource : public std::pmr::memory_resource {
 public:
     /// Takes from the default resource of the moment.
@@ -50,25 +56,36 @@ private:
         HTrackedDeallocation(block, [&](void* given) { mpoUpstream->deallocate(given, bytes, alignment); });
     }
 
+    // Without type information two resources over one upstream count as different; containers then move element by
+    // element between them.
     bool do_is_equal(const std::pmr::memory_resource& other) const noexcept override {
+#ifdef __cpp_rtti
         const auto* const tracked = dynamic_cast<const HTrackedResource*>(&other);
         return tracked != nullptr && tracked->mpoUpstream->is_equal(*mpoUpstream);
+#else
+        return this == &other;
+#endif
     }
 
     std::pmr::memory_resource* mpoUpstream;  // not owned
     HCallSite moSite;
 };
+#endif
 
-/// An allocator that takes from `Upstream` and records at one call site. It has no default constructor:
-/// constructed by a container it would record a line of the standard library. Thread-safe if `Upstream` is.
+/// An allocator that takes from `Upstream` and records at one call site. Everything else is as `Upstream` does it:
+/// how elements are constructed and destroyed, and which allocator a container has after a copy, move or swap.
+/// Thread-safe if `Upstream` is.
 template <class T, class Upstream = std::allocator<T>>
 class HTrackedAllocator {
     using Traits = std::allocator_traits<Upstream>;
     static_assert(std::is_same_v<typename Traits::pointer, T*>, "the tracker knows plain pointers only");
+    static_assert(std::is_same_v<typename Traits::value_type, T>, "the upstream allocates another type");
 
 public:
     /// @cond
     using value_type = T;
+    using size_type = typename Traits::size_type;
+    using difference_type = typename Traits::difference_type;
     using propagate_on_container_copy_assignment = typename Traits::propagate_on_container_copy_assignment;
     using propagate_on_container_move_assignment = typename Traits::propagate_on_container_move_assignment;
     using propagate_on_container_swap = typename Traits::propagate_on_container_swap;
@@ -79,23 +96,41 @@ public:
     };
     /// @endcond
 
+    /// Records at "allocator without a call site", line 0: an allocator made inside the standard library has no line
+    /// of the program. Pass one with a site to each container.
+    HTrackedAllocator() : HTrackedAllocator(HCallSite{"allocator without a call site", 0}) {}
     /// Records at `site` what it takes from `upstream`.
     HTrackedAllocator(const HCallSite& site, const Upstream& upstream = Upstream())
         : moUpstream(upstream), moSite(site) {}
     /// For another type, the same site and a copy of the upstream.
-    template <class Other, class OtherUpstream>
+    template <class Other, class OtherUpstream,
+              class = std::enable_if_t<std::is_constructible_v<Upstream, const OtherUpstream&>>>
     HTrackedAllocator(const HTrackedAllocator<Other, OtherUpstream>& other) noexcept
         : moUpstream(other.GetUpstream()), moSite(other.GetSite()) {}
 
     /// Room for `count` objects.
-    [[nodiscard]] T* allocate(std::size_t count) {
+    [[nodiscard]] T* allocate(size_type count) {
+        // Where the product would overflow, the upstream throws.
         return HTrackedAllocation(
             count * sizeof(T), moSite, [&] { return Traits::allocate(moUpstream, count); },
             [&](T* block) { Traits::deallocate(moUpstream, block, count); });
     }
     /// Gives the room back.
-    void deallocate(T* block, std::size_t count) {
+    void deallocate(T* block, size_type count) {
         HTrackedDeallocation(block, [&](T* given) { Traits::deallocate(moUpstream, given, count); });
+    }
+    /// The largest count.
+    [[nodiscard]] size_type max_size() const noexcept { return Traits::max_size(moUpstream); }
+
+    /// Constructs an object as the upstream does: a `std::pmr::polymorphic_allocator` passes its resource on.
+    template <class Object, class... Arguments>
+    void construct(Object* place, Arguments&&... arguments) {
+        Traits::construct(moUpstream, place, std::forward<Arguments>(arguments)...);
+    }
+    /// Destroys an object as the upstream does.
+    template <class Object>
+    void destroy(Object* object) {
+        Traits::destroy(moUpstream, object);
     }
 
     /// For a copy of a container: the same site, and the upstream that `Upstream` selects for copies.
@@ -104,42 +139,64 @@ public:
     }
 
     /// What it takes from.
-    [[nodiscard]] const Upstream& GetUpstream() const { return moUpstream; }
+    [[nodiscard]] const Upstream& GetUpstream() const noexcept { return moUpstream; }
     /// Where it records.
-    [[nodiscard]] const HCallSite& GetSite() const { return moSite; }
-
-    /// Equal if the upstreams are; the site does not matter.
-    friend bool operator==(const HTrackedAllocator& one, const HTrackedAllocator& other) {
-        return one.moUpstream == other.moUpstream;
-    }
-    /// The opposite.
-    friend bool operator!=(const HTrackedAllocator& one, const HTrackedAllocator& other) {
-        return !(one == other);
-    }
+    [[nodiscard]] const HCallSite& GetSite() const noexcept { return moSite; }
 
 private:
     Upstream moUpstream;
     HCallSite moSite;
 };
 
-/// Destroys an object of `HMakeTracked`. Thread-safe for different objects. Requires: if `T` is a base of the
-/// object's class, it has a virtual destructor.
+/// Equal if the upstreams are; the site does not matter. Thread-safe, as any plain value.
+template <class T, class Upstream, class Other, class OtherUpstream>
+bool operator==(const HTrackedAllocator<T, Upstream>& one,
+                const HTrackedAllocator<Other, OtherUpstream>& other) {
+    return one.GetUpstream() == Upstream(other.GetUpstream());
+}
+/// The opposite. Thread-safe, as any plain value.
+template <class T, class Upstream, class Other, class OtherUpstream>
+bool operator!=(const HTrackedAllocator<T, Upstream>& one,
+                const HTrackedAllocator<Other, OtherUpstream>& other) {
+    return !(one == other);
+}
+
+/// Destroys an object of `HMakeTracked`, whichever of its bases `T` is: it knows the block and the class of the whole
+/// object. Thread-safe for different objects.
 template <class T>
-struct HTrackedDelete {
+class HTrackedDelete {
+public:
+    /// For a pointer that owns nothing, or an object of exactly the class `T`.
     HTrackedDelete() = default;
     /// For a pointer to a base.
     template <class Derived, class = std::enable_if_t<std::is_convertible_v<Derived*, T*>>>
-    HTrackedDelete(const HTrackedDelete<Derived>&) noexcept {}
+    HTrackedDelete(const HTrackedDelete<Derived>& other) noexcept
+        : mpWhole(other.mpWhole), mpfnDestroy(other.mpfnDestroy) {}
 
     /// Destroys `object`, which is not null, and records that its block is given back.
     void operator()(T* object) const noexcept {
-        const volatile void* block = object;
-        if constexpr (std::is_polymorphic_v<T>) {
-            block = dynamic_cast<const volatile void*>(object);  // of the whole object
+        void* const whole = mpWhole != nullptr ? mpWhole : const_cast<std::remove_cv_t<T>*>(object);
+        if (mpfnDestroy != nullptr) {
+            mpfnDestroy(whole);
+        } else if constexpr (std::is_destructible_v<T>) {
+            object->~T();
         }
-        object->~T();
-        HTrackedDeallocation(const_cast<void*>(block), [](void* given) { ::operator delete(given); });
+        HTrackedDeallocation(whole, [](void* given) { ::operator delete(given); });
     }
+
+private:
+    template <class Other>
+    friend class HTrackedDelete;
+    template <class Object, class... Arguments>
+    friend std::unique_ptr<Object, HTrackedDelete<Object>> HMakeTracked(const HCallSite& site,
+                                                                        Arguments&&... arguments);
+
+    explicit HTrackedDelete(void* whole) noexcept
+        : mpWhole(whole), mpfnDestroy([](void* object) { static_cast<T*>(object)->~T(); }) {}
+
+    // Of the object as it was made; null in a default deleter.
+    void* mpWhole = nullptr;
+    void (*mpfnDestroy)(void*) = nullptr;
 };
 
 /// Owns one object that the tracker knows. For arrays use a container.
@@ -157,9 +214,8 @@ template <class T, class... Arguments>
             sizeof(T), site, [] { return ::operator new(sizeof(T)); },
             [](void* failed) { ::operator delete(failed); }),
         [](void* unused) { HTrackedDeallocation(unused, [](void* given) { ::operator delete(given); }); });
-    HTrackedPtr<T> object(::new (block.get()) T(std::forward<Arguments>(arguments)...));
-    block.release();
-    return object;
+    T* const object = ::new (block.get()) T(std::forward<Arguments>(arguments)...);
+    return HTrackedPtr<T>(object, HTrackedDelete<T>(block.release()));
 }
 
 /// @}

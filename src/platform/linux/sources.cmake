@@ -10,6 +10,7 @@ set(ZANBASE_PLATFORM_SOURCES
     lock.cpp
     lock_owner.cpp
     messages.cpp
+    process.cpp
     processors.cpp
     race_detector.cpp
     semaphore.cpp

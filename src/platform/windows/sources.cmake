@@ -8,6 +8,7 @@ set(ZANBASE_PLATFORM_SOURCES
     guard.cpp
     lock.cpp
     messages.cpp
+    process.cpp
     processors.cpp
     race_detector.cpp
     semaphore.cpp
