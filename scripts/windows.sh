@@ -1,7 +1,7 @@
 # What the scripts share about programs for 64-bit Windows: packages, and a Wine of our own to run the programs.
 # To be sourced after common.sh.
 
-windows_packages=("${build_packages[@]}" g++-mingw-w64-x86-64-posix wine64 pkg-config googletest
+windows_packages=("${build_packages[@]}" g++-mingw-w64-x86-64-posix clang-14 wine64 pkg-config googletest
     nlohmann-json3-dev libvalijson-dev gettext dpkg-dev make xz-utils xvfb)
 
 # prepare_windows PRESET [benchmark]: what a build with PRESET needs, and the environment of its programs under Wine.

@@ -5,6 +5,7 @@
 #include <new>
 
 #include "locks/milliseconds.h"
+#include "platform/compiler.h"
 #include "platform/condition.h"
 #include "platform/race_detector.h"
 
@@ -20,12 +21,12 @@ void HCondVar::Signal() const { SignalCondition(mpoCondition); }
 void HCondVar::Broadcast() const { BroadcastCondition(mpoCondition); }
 
 void HCondVar::Wait(const HMutex& mutex) const {
-    const CallerFrame caller(__builtin_return_address(0));
+    const CallerFrame caller(ZANBASE_RETURN_ADDRESS());
     // Without a timeout the result is always true.
     static_cast<void>(WaitOnCondition(mpoCondition, mutex.mpoCriticalSection, kForever));
 }
 
 bool HCondVar::TryWait(const HMutex& mutex, double seconds) const {
-    const CallerFrame caller(__builtin_return_address(0));
+    const CallerFrame caller(ZANBASE_RETURN_ADDRESS());
     return WaitOnCondition(mpoCondition, mutex.mpoCriticalSection, MillisecondsIn(seconds));
 }

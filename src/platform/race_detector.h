@@ -14,7 +14,7 @@ void NoteRelease(const void* object) noexcept;
 void NoteAcquire(const void* object) noexcept;
 
 // Shows for a scope which line called the function, so that reports name it: a public function that acquires a
-// lock or starts a thread passes __builtin_return_address(0). Not needed if the function ends in a jump to that
+// lock or starts a thread passes ZANBASE_RETURN_ADDRESS(). Not needed if the function ends in a jump to that
 // operation, as HMutex::Lock does.
 class CallerFrame {
 public:

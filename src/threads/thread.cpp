@@ -3,6 +3,7 @@
 
 #include <cstdio>
 
+#include "platform/compiler.h"
 #include "platform/race_detector.h"
 #include "platform/thread.h"
 #include "threads/reported_body.h"
@@ -30,7 +31,7 @@ HThread& HThread::operator=(const HThread&) { return *this; }
 
 bool HThread::Start(bool) {
     if (IsRunning()) return false;
-    const CallerFrame caller(__builtin_return_address(0));
+    const CallerFrame caller(ZANBASE_RETURN_ADDRESS());
     // Not _Run_, because the object may own another thread when this one ends. The platform layer empties
     // mpoThread if it still points to this thread: the last access to the object.
     const auto body = [](void* thread) {

@@ -20,6 +20,7 @@
 #include <cstddef>
 #include <memory>
 
+#include "platform/compiler.h"
 #include "zanbase/mutex.h"
 
 // Held while rows are added, and for nothing else.
@@ -49,7 +50,7 @@ public:
     Item& At(std::size_t index) {
         const Place place = PlaceOf(index);
         Line* lines = maSegments[place.segment].load(std::memory_order_acquire);
-        if (__builtin_expect(lines == nullptr, 0)) lines = MakeSegment(place.segment);
+        if (ZANBASE_UNLIKELY(lines == nullptr)) lines = MakeSegment(place.segment);
         return ItemOf(lines, place);
     }
 
@@ -82,7 +83,7 @@ private:
     // In units of kFirst items, segment k holds the units 2^k - 1 to 2^(k+1) - 2.
     static Place PlaceOf(std::size_t index) {
         const unsigned long long unit = index / kFirst + 1;
-        const auto segment = static_cast<std::size_t>(63 - __builtin_clzll(unit));
+        const auto segment = std::size_t{HighestBit(unit)};
         return {segment, index - kFirst * ((std::size_t{1} << segment) - 1)};
     }
 
@@ -91,7 +92,7 @@ private:
     }
 
     // Of two threads that make the same segment, one deletes its own.
-    __attribute__((noinline)) Line* MakeSegment(std::size_t segment) {
+    ZANBASE_NOT_INLINE Line* MakeSegment(std::size_t segment) {
         std::unique_ptr<Line[]> lines(new Line[(kFirst << segment) / kLineItems]);
         Line* other = nullptr;
         // Release: a thread that finds the segment finds its items made. Acquire for the other thread's.

@@ -3,6 +3,7 @@
 #ifndef ZANBASE_PLATFORM_WINDOWS_RUNTIME_STREAM_H
 #define ZANBASE_PLATFORM_WINDOWS_RUNTIME_STREAM_H
 
+#include <cstddef>
 #include <cstdio>
 
 #include "platform/windows/system.h"
@@ -30,10 +31,11 @@ extern "C" __declspec(dllimport) RuntimeDescriptor* __pioinfo[];
 #endif
 
 // False for the first 20 streams of msvcrt, the standard ones among them: their locks are in a table that it does not
-// export.
+// export. Streams of the UCRT have their locks, but those of Wine's are too small for that.
 inline bool HasOwnLock(std::FILE* stream) noexcept {
 #ifdef _UCRT
-    return stream != nullptr;
+    const auto bytes = reinterpret_cast<char*>(stdout) - reinterpret_cast<char*>(stdin);
+    return stream != nullptr && bytes >= static_cast<std::ptrdiff_t>(sizeof(RuntimeStream));
 #else
     constexpr int kStreamsInTable = 20;
     return stream < stdin || stream >= stdin + kStreamsInTable;
