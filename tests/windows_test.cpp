@@ -12,6 +12,7 @@
 #include "platform/stream.h"
 #include "platform/thread.h"
 #include "platform/windows/standard_stream.h"
+#include "support/faults.h"
 #include "support/run_in_child.h"
 #include "support/runner.h"
 #include "zanbase/semaphore.h"
@@ -64,6 +65,18 @@ TEST(WindowsGuard, EndsFloatingPointFaultsAndKeepsTheirSettings) {
         nullptr));
     EXPECT_EQ(_mm_getcsr(), (before & ~kDivZero & ~kFlags) | _MM_ROUND_UP);
     _mm_setcsr(before);
+}
+
+TEST(WindowsGuard, DropsTheExceptionsOfAFaultyBody) {
+    const auto in_handler = [](void*) {
+        try {
+            throw 7;
+        } catch (int) {
+            WriteToNull();
+        }
+    };
+    EXPECT_TRUE(RunGuarded(in_handler, nullptr));
+    EXPECT_EQ(std::current_exception(), nullptr);
 }
 
 // Wine leaves no room to unwind in a stack that is exhausted. So the fault is raised where there is some.

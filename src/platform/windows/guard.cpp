@@ -2,6 +2,7 @@
 // assembly routine that the runtime's own handler serves by a table of one row.
 #include "platform/guard.h"
 
+#include <cxxabi.h>
 #include <malloc.h>
 
 #include "platform/windows/system.h"
@@ -87,8 +88,24 @@ CallGuarded:
     .seh_endproc
 )");
 
+namespace {
+
+// A thread's exceptions, as the C++ ABI lays them out.
+struct ExceptionState {
+    void* mpoCaught;          // those whose handlers run, by a list
+    unsigned int mnUncaught;  // those that are being thrown
+
+    static ExceptionState& OfThread() noexcept {
+        return *reinterpret_cast<ExceptionState*>(abi::__cxa_get_globals());
+    }
+};
+
+}  // namespace
+
 bool RunGuarded(void (*body)(void*), void* argument) {
+    const ExceptionState exceptions = ExceptionState::OfThread();
     const DWORD fault = CallGuarded(body, argument);
+    if (fault != 0) ExceptionState::OfThread() = exceptions;
     if (fault == EXCEPTION_STACK_OVERFLOW) _resetstkoflw();  // the page that guards the stack's end
     return fault != 0;
 }

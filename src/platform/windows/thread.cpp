@@ -3,6 +3,7 @@
 
 #include <new>
 
+#include "platform/guard.h"
 #include "platform/windows/thread_block.h"
 
 namespace {
@@ -20,6 +21,8 @@ DWORD WINAPI Enter(void* argument) {
     const auto block = static_cast<HNativeThread*>(argument);
     ULONG bytes = kFaultStackBytes;
     SetThreadStackGuarantee(&bytes);
+    // The first frame allocates the thread's exception state, under locks that a kill would leave held.
+    static_cast<void>(RunGuarded([](void*) {}, nullptr));
     {
         const SpinLockHold hold(goBlockLock);  // waits until StartThread has filled the slot
         block->mnId = GetCurrentThreadId();
