@@ -36,8 +36,8 @@ void FillTracker() {
         return names;
     }();
     for (int row = 0; row < kRows; ++row) {
-        void* const block =
-            reinterpret_cast<void*>(std::uintptr_t{0x100000} + 64 * static_cast<unsigned>(row));
+        void* const block = reinterpret_cast<void*>(std::uintptr_t{0x100000} +
+                                                    std::uintptr_t{64} * static_cast<unsigned>(row));
         HMemory::Alloc(block, 48, files[static_cast<std::size_t>(row % 1000)].c_str(), row / 1000);
     }
 }

@@ -70,7 +70,7 @@ void Sort(std::size_t count) {
 
 TEST(Sort, MakesTheComparisonsAndThePermutationOfTheModel) {
     std::minstd_rand random;
-    for (size = 1; size <= 100; ++size)
+    for (size = 1; size <= 100; ++size) {
         for (std::size_t count = 1; count <= 200; count += count < 64 ? 1 : 136) {
             std::string unsorted(count * size, '\0');
             for (char& byte : unsorted) byte = static_cast<char>(random() % (count % 2 == 0 ? 256 : 7));
@@ -81,4 +81,5 @@ TEST(Sort, MakesTheComparisonsAndThePermutationOfTheModel) {
             ASSERT_EQ(std::pair(array, std::exchange(comparisons, {})), expected) << size << ' ' << count;
             ZAN_qsort(array.data(), count, size, AlwaysAbove);  // stays in the array
         }
+    }
 }

@@ -58,7 +58,7 @@ void CheckAgainstModel(std::uint64_t first, SiteId first_site) {
 TEST(RecordBlockTable, KeepsEveryBlockOfThreadsThatShareShards) {
     std::vector<std::thread> threads;
     for (unsigned int part = 0; part < 4; ++part)
-        threads.emplace_back(CheckAgainstModel, 0x7f0000000000 + part * 0x100000, 100 * part);
+        threads.emplace_back(CheckAgainstModel, 0x7f0000000000 + part * 0x100000L, 100 * part);
     for (std::thread& thread : threads) thread.join();
     EXPECT_EQ(recorder::TotalBytes(), 0U);
     EXPECT_GT(recorder::PeakBytes(), 0U);

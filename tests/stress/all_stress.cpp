@@ -111,7 +111,8 @@ void UseText(Random& random) {
     Require(MkName(number) == std::to_string(number), "names are exact");
     Require(MkTokenString("a", MkName(number), nullptr) == "a|" + std::to_string(number),
             "tokens are joined");
-    Require(_("text") == _("text"), "a message keeps its text");
+    const char* const text = _("text");
+    Require(_("text") == text, "a message keeps its text");
 }
 
 void UseSort(Random& random) {

@@ -50,9 +50,10 @@ bool Defines(const ElfFile& file, const char* function) {
 
 // The sign of a sanitizer in the program, or an empty text.
 std::string SanitizerOf(const ElfFile& file) {
-    for (const std::string& library : file.NeededLibraries())
+    for (const std::string& library : file.NeededLibraries()) {
         for (const char* name : {"libasan", "libtsan", "liblsan", "libhwasan", "libclang_rt"})
             if (library.compare(0, std::strlen(name), name) == 0) return library;
+    }
     for (const char* entry : {"__asan_init", "__tsan_init", "__msan_init", "__lsan_init", "__hwasan_init"})
         if (Defines(file, entry)) return entry;
     return {};
@@ -83,9 +84,10 @@ Recordable CheckProgram(const std::string& path) {
     if (GainsRights(program))
         return {program + " gains rights when it runs: the loader refuses the recorder", {}};
     const std::string sanitizer = SanitizerOf(file);
-    if (!sanitizer.empty())
+    if (!sanitizer.empty()) {
         return {program + " is a sanitizer build (" + sanitizer + "): its runtime replaces the allocators",
                 {}};
+    }
     if (Defines(file, "malloc")) return {{}, program + " has an allocator of its own (it defines malloc)"};
     return {};
 }

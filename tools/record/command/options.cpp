@@ -43,10 +43,11 @@ long long ReadAmount(const std::string& option, const std::string& text) {
     errno = 0;
     const long long amount = std::strtoll(text.c_str(), &rest, 10);
     const bool is_number = rest != text.c_str() && errno == 0 && amount >= 0;
-    for (const auto& [unit, shift] : kUnits)
+    for (const auto& [unit, shift] : kUnits) {
         if (is_number && std::strcmp(rest, unit) == 0 &&
             amount <= std::numeric_limits<long long>::max() >> shift)
             return amount << shift;
+    }
     throw UsageError(option + " takes a number, such as 4096 or 4K, not '" + text + "'");
 }
 

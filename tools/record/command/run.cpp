@@ -76,16 +76,18 @@ int Conclude(const std::string& path, int status, const std::string& result) {
     const bool reported = !result.empty();
     if (WIFSIGNALED(status)) {
         const int signal = WTERMSIG(status);
-        if (!reported)
+        if (!reported) {
             Say(path + " was ended by signal " + std::to_string(signal) + " (" + strsignal(signal) +
                 "): its accounts may be halfway through a change, so there is no report");
+        }
         return 128 + signal;
     }
     const int exit_status = WEXITSTATUS(status);
-    if (!reported && exit_status != kCannotRun)
+    if (!reported && exit_status != kCannotRun) {
         Say(path +
             " left no report: another program took its place, or it ended by a system call of its own "
             "or in a signal handler that interrupted an allocator");
+    }
     bool broke = false;
     std::istringstream lines(result);
     for (std::string line; std::getline(lines, line);) {
