@@ -111,6 +111,7 @@ int main(int argc, char** argv) {
                                       "--benchmark_enable_random_interleaving=true"};
     flags.insert(flags.end(), argv + 1, argv + argc);
     std::vector<char*> pointers;
+    pointers.reserve(flags.size());
     for (std::string& flag : flags) pointers.push_back(flag.data());
     int count = static_cast<int>(pointers.size());
     benchmark::Initialize(&count, pointers.data());

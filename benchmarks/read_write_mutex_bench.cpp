@@ -109,6 +109,7 @@ void LongestWait(benchmark::State& state) {
         Mutex mutex;
         const auto start = std::chrono::steady_clock::now();
         std::vector<std::thread> stream;
+        stream.reserve(2);
         for (int i = 0; i < 2; ++i) {
             stream.emplace_back([&] {
                 while (MsSince(start) < kStreamMs) visit(mutex, kReadersStream);
@@ -149,10 +150,10 @@ BENCHMARK_TEMPLATE(LongestWait, BoostShared, false)->Iterations(1)->UseRealTime(
 BENCHMARK_TEMPLATE(LongestWait, System, false)->Iterations(1)->UseRealTime();
 
 bool AddRows() {
-    const std::string both = "/real_time/threads:2";
     for (const std::string ours : {"<HReadPrefMutex>", "<HWritePrefMutex>"}) {
         AddRatio("NestedReadPair" + ours, "NestedReadPair<System>", 1.5);
-        AddRatio("SharedReadPair" + ours + both, "SharedReadPair<BoostShared>" + both, 1.0);
+        AddRatio(std::string("SharedReadPair").append(ours).append("/real_time/threads:2"),
+                 "SharedReadPair<BoostShared>/real_time/threads:2", 1.0);
         for (const std::string pair : {"ReadPair", "WritePair"}) {
             AddRatio(pair + ours, pair + "<BoostShared>", 0.95);
             AddRatio(pair + ours, pair + "<System>", 0);

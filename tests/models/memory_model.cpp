@@ -14,7 +14,7 @@ namespace {
 using Lock = FutexLock<RelacySystem>;
 using Semaphore = FutexSemaphore<RelacySystem>;
 
-unsigned long long Self() { return 2 * (rl::thread_index() + 1); }
+unsigned long long Self() { return 2ULL * (rl::thread_index() + 1); }
 
 // A level of a lock that the running thread acquires and releases.
 struct Mutex {
