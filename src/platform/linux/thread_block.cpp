@@ -82,11 +82,13 @@ void ReleaseUnawaited(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMut
 
 void ReleaseBlocksInChild() noexcept {
     toSelf.mnNumber = 0;
+    toSelf.mpfnDeferredKill = nullptr;
     gpoFree = gpoUnjoined = nullptr;
     for (HNativeThread* block = gpoNewest; block != nullptr; block = block->mpoOlder) {
         block->mnWaiters = 0;
         if (block == toSelf.mpoBlock) {
             block->mnNumber = CurrentThreadId();
+            block->mbKillRequested = false;  // the request was for the thread in the parent
         } else {
             EmptySlot(block);
             MarkEnded(block);
