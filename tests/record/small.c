@@ -6,6 +6,7 @@
 #include <stdlib.h>
 #include <string.h>
 #include <sys/resource.h>
+#include <sys/syscall.h>
 #include <sys/time.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -98,12 +99,22 @@ static void Children(char* program) {
     wait(NULL);
 }
 
+// Asks the recorder for a report and waits for it, then leaves less behind.
 static void Signal(void) {
     gSink = malloc(512);
-    raise(SIGUSR1);
-    free(malloc(1));
-    if (system("cp signalled.json kept.json") != 0) abort();
+    kill(getppid(), SIGUSR2);
+    if (system("until tail -n1 signalled.json 2>&1 | grep -q '^}$'; do :; done; cp signalled.json kept.json") != 0)
+        abort();
     free(gSink);
+}
+
+// Ends with one block of 512 bytes live.
+static void End(const char* how) {
+    gSink = malloc(512);
+    if (strcmp(how, "fault") == 0) raise(SIGSEGV);
+    if (strcmp(how, "kill") == 0) raise(SIGKILL);
+    if (strcmp(how, "raw") == 0) syscall(SYS_exit_group, 0);
+    if (strcmp(how, "replaced") == 0) execl("/bin/true", "true", NULL);
 }
 
 int main(int count, char** words) {
@@ -119,8 +130,7 @@ int main(int count, char** words) {
     if (strcmp(what, "alarm") == 0) Alarm();
     if (strcmp(what, "exhaust") == 0) Exhaust((size_t)number);
     if (strcmp(what, "signal") == 0) Signal();
-    if (strcmp(what, "fault") == 0) raise(SIGSEGV);
-    if (strcmp(what, "replaced") == 0) execl("/bin/true", "true", NULL);
+    if (strcmp(what, "end") == 0) End(words[2]);
     if (IsFromAllocator != NULL) puts("blocks from the allocator: yes");
     return 0;
 }

@@ -3,6 +3,7 @@
 #include "checks.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <cstdlib>
 #include <cstring>
 #include <fstream>
@@ -11,14 +12,18 @@
 #include <sys/xattr.h>
 #include <unistd.h>
 
-#include "common/elf_file.h"
+#include "elf_file.h"
 
 namespace recorder {
 namespace {
 
-bool IsProgram(const std::string& path) {
+// Why the file at `path` can't be run; empty if it can.
+std::string ReasonAgainst(const std::string& path) {
     struct stat status {};
-    return stat(path.c_str(), &status) == 0 && S_ISREG(status.st_mode) && access(path.c_str(), X_OK) == 0;
+    if (stat(path.c_str(), &status) != 0) return path + ": " + std::strerror(errno);
+    if (S_ISDIR(status.st_mode)) return path + " is a directory";
+    if (!S_ISREG(status.st_mode)) return path + " is not a regular file";
+    return access(path.c_str(), X_OK) == 0 ? "" : path + ": " + std::strerror(errno);
 }
 
 // The loader ignores preloaded libraries where the process gets more rights than its caller has.
@@ -61,17 +66,23 @@ std::string SanitizerOf(const ElfFile& file) {
 
 }  // namespace
 
-std::string FindProgram(const std::string& name) {
-    if (name.find('/') != std::string::npos) return IsProgram(name) ? name : std::string();
+FoundProgram FindProgram(const std::string& name) {
+    if (name.find('/') != std::string::npos) {
+        const std::string reason = ReasonAgainst(name);
+        return {reason.empty() ? name : "", reason, access(name.c_str(), F_OK) == 0};
+    }
     const char* const folders = std::getenv("PATH");
     std::string rest = folders != nullptr ? folders : "/usr/local/bin:/usr/bin:/bin";
+    FoundProgram found{{}, "no such program: " + name, false};
     while (!rest.empty()) {
         const std::size_t end = std::min(rest.find(':'), rest.size());
         const std::string path = (end != 0 ? rest.substr(0, end) : ".") + "/" + name;
-        if (IsProgram(path)) return path;
+        const std::string reason = ReasonAgainst(path);
+        if (reason.empty()) return {path, {}, true};
+        if (!found.exists && access(path.c_str(), F_OK) == 0) found = {{}, reason, true};
         rest.erase(0, end + 1);
     }
-    return {};
+    return found;
 }
 
 Recordable CheckProgram(const std::string& path) {

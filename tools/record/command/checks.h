@@ -6,8 +6,14 @@
 
 namespace recorder {
 
-// The file that a shell would run for `name`, or an empty text.
-std::string FindProgram(const std::string& name);
+struct FoundProgram {
+    std::string path;    // empty if there is none that can be run
+    std::string reason;  // why not
+    bool exists;         // a file of the name was found
+};
+
+// The file that a shell would run for `name`.
+FoundProgram FindProgram(const std::string& name);
 
 struct Recordable {
     std::string refusal;         // why nothing of the program can be recorded; empty if something can

@@ -17,9 +17,9 @@ int main(int argc, char** argv) {
         if (compares)
             return recorder::RunCompare(recorder::ReadCompareOptions({words.begin() + 1, words.end()}));
         const recorder::RunOptions options = recorder::ReadRunOptions(words);
-        if (!options.help) return recorder::RunRecorded(options);
-        std::fputs(recorder::kHelp, stdout);
-        return 0;
+        if (!options.help && !options.version) return recorder::RunRecorded(options);
+        const std::string text = options.help ? recorder::HelpText() : "zanbase-record " ZANBASE_VERSION "\n";
+        return std::fputs(text.c_str(), stdout) >= 0 && std::fflush(stdout) == 0 ? 0 : kBadCall;
     } catch (const std::exception& error) {
         std::fprintf(stderr, "zanbase-record: %s\n", error.what());
         return compares ? kCannotCompare : kBadCall;

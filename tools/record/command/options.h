@@ -6,8 +6,6 @@
 #include <string>
 #include <vector>
 
-#include "common/settings.h"
-
 namespace recorder {
 
 // What is wrong with a command line, in a line.
@@ -15,10 +13,36 @@ struct UsageError : std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
+enum class Format { kTables, kJson, kCsv, kFolded };
+
+// Limits of a run; a negative one is none.
+struct Budgets {
+    long long leaked_bytes = -1;
+    long long peak_bytes = -1;
+    long long allocations = -1;
+    long long read_bytes = -1;
+    long long opens = -1;
+
+    bool IsSet() const {
+        return leaked_bytes >= 0 || peak_bytes >= 0 || allocations >= 0 || read_bytes >= 0 || opens >= 0;
+    }
+};
+
 struct RunOptions {
-    Settings settings;
-    std::vector<std::string> program;  // with its arguments; empty only for help
+    std::vector<std::string> program;  // with its arguments; empty only for help and version
+    std::string output;                // absolute, with %p still in it; empty for standard error
+    Format format = Format::kTables;
+    bool memory = true;
+    bool disk = true;
+    bool follow = false;
+    bool debuginfod = false;
+    int callers = 0;                   // that are recorded behind each call site
+    int signal = 0;                    // at which a report is made; SIGUSR1 if it is 0
+    double every = 0;                  // seconds between reports; 0 for none
+    std::vector<std::string> skipped;  // functions that are credited to their callers
+    Budgets budgets;
     bool help = false;
+    bool version = false;
 };
 
 // Reads the words after the command's name. Throws UsageError.
@@ -34,7 +58,7 @@ struct CompareOptions {
 CompareOptions ReadCompareOptions(const std::vector<std::string>& words);
 
 // The text of --help.
-extern const char kHelp[];
+std::string HelpText();
 
 }  // namespace recorder
 

@@ -1,29 +1,26 @@
-// The shards: open hash tables with linear probing, which keep no marks of what was removed.
+// The shards: open hash tables with linear probing, which keep no marks of what was removed. The tables of
+// blocks are private to the process; what the command reads are the usage rows and the totals in the account.
 //
-// An entry has two words: the block's address and site packed into one, and the size. Zero is no entry.
-// Between two sections under a shard's lock, every entry can be reached from its home slot without crossing
-// an empty one.
+// An entry has two words: the block's address, and its size with the number of the stack. Between two
+// sections under a shard's lock, every entry can be reached from its home slot without crossing an empty one.
 #include "block_table.h"
 
-#include <array>
-#include <atomic>
-
-#include "pool.h"
+#include "shared_memory.h"
 #include "spin_lock.h"
 
 namespace recorder {
 namespace {
 
 constexpr unsigned int kShardBits = 6;
-constexpr unsigned int kRegionBits = 26;    // 64 MB, the size of a thread's heap in the C library
-constexpr unsigned int kAlignmentBits = 3;  // some allocators give small blocks at multiples of 8
+constexpr unsigned int kRegionBits = 26;  // 64 MB, the size of a thread's heap in the C library
 constexpr unsigned int kFirstTableBits = 9;
 constexpr std::uint64_t kGoldenRatio = 0x9e3779b97f4a7c15;
-constexpr SiteId kSitesOfPage = 512;
+constexpr std::uint64_t kLargestBlock = (std::uint64_t{1} << (64 - kNodeBits)) - 1;
+static_assert(kShards == std::size_t{1} << kShardBits);
 
 struct Entry {
-    std::uint64_t key_and_site;
-    std::uint64_t size;
+    std::uint64_t block;  // 0 is no entry
+    std::uint64_t size_and_node;
 };
 
 struct alignas(128) Shard {
@@ -31,34 +28,28 @@ struct alignas(128) Shard {
     unsigned int bits = 0;  // of the number of slots; this and all below are guarded by lock
     std::size_t count = 0;
     Entry* entries = nullptr;
-    std::array<SiteUsage*, kSites / kSitesOfPage> usage{};
+    TableRows<decltype(Account::usage)::value_type> usage;
 };
 
 // Constant-initialised: the program allocates before any constructor runs.
-std::array<Shard, 1U << kShardBits> gShards{};
-alignas(128) std::atomic<std::uint64_t> gTotal{0};
-std::atomic<std::uint64_t> gPeak{0};  // beside the total, which every change touches anyway
-alignas(128) std::atomic<std::uint64_t> gLost{0};
+std::array<Shard, kShards> gShards{};
 
-// User addresses have at most 48 bits, so 45 are left, and 19 for the site.
-std::uint64_t KeyOf(const void* block) {
-    return (reinterpret_cast<std::uint64_t>(block) >> kAlignmentBits) + 1;
+NodeId NodeOf(const Entry& entry) { return entry.size_and_node & ((1U << kNodeBits) - 1); }
+std::uint64_t SizeOf(const Entry& entry) { return entry.size_and_node >> kNodeBits; }
+std::uint64_t KeyOf(const void* block) { return reinterpret_cast<std::uint64_t>(block); }
+
+std::size_t IndexOf(const void* block) {
+    return (KeyOf(block) >> kRegionBits) * kGoldenRatio >> (64 - kShardBits);
 }
-std::uint64_t KeyOf(const Entry& entry) { return entry.key_and_site >> kSiteBits; }
-SiteId SiteOf(const Entry& entry) { return static_cast<SiteId>(entry.key_and_site & (kSites - 1)); }
-
-Shard& ShardOf(const void* block) {
-    const std::uint64_t region = reinterpret_cast<std::uint64_t>(block) >> kRegionBits;
-    return gShards[region * kGoldenRatio >> (64 - kShardBits)];
+std::size_t HomeOf(const Shard& shard, std::uint64_t block) {
+    return (block >> 3) * kGoldenRatio >> (64 - shard.bits);  // some allocators give blocks at multiples of 8
 }
-
-std::size_t HomeOf(const Shard& shard, std::uint64_t key) { return key * kGoldenRatio >> (64 - shard.bits); }
 std::size_t MaskOf(const Shard& shard) { return (std::size_t{1} << shard.bits) - 1; }
 
-// The slot of `key`, or the empty one where it belongs.
-Entry& SlotOf(const Shard& shard, std::uint64_t key) {
-    std::size_t slot = HomeOf(shard, key);
-    while (shard.entries[slot].key_and_site != 0 && KeyOf(shard.entries[slot]) != key)
+// The slot of `block`, or the empty one where it belongs.
+Entry& SlotOf(const Shard& shard, std::uint64_t block) {
+    std::size_t slot = HomeOf(shard, block);
+    while (shard.entries[slot].block != 0 && shard.entries[slot].block != block)
         slot = (slot + 1) & MaskOf(shard);
     return shard.entries[slot];
 }
@@ -72,7 +63,7 @@ bool Grow(Shard& shard) {
     shard.entries = entries;
     shard.bits = bits;
     for (std::size_t slot = 0; slot < old_slots; ++slot)
-        if (old[slot].key_and_site != 0) SlotOf(shard, KeyOf(old[slot])) = old[slot];
+        if (old[slot].block != 0) SlotOf(shard, old[slot].block) = old[slot];
     if (old != nullptr) UnmapPages(old, old_slots * sizeof(Entry));
     return true;
 }
@@ -82,29 +73,12 @@ bool HasRoom(Shard& shard) {
     return Grow(shard) || (shard.entries != nullptr && shard.count < MaskOf(shard));
 }
 
-// Null if memory ran out.
-SiteUsage* UsageIn(Shard& shard, SiteId site) {
-    SiteUsage*& page = shard.usage[site / kSitesOfPage];
-    if (page == nullptr) page = static_cast<SiteUsage*>(TakeFromPool(kSitesOfPage * sizeof(SiteUsage)));
-    return page == nullptr ? nullptr : &page[site % kSitesOfPage];
-}
-
-void AddToTotal(std::uint64_t size) {
-    const std::uint64_t total = AddTo(gTotal, size);
-    std::uint64_t peak = gPeak.load(std::memory_order_relaxed);
-    while (total > peak && !gPeak.compare_exchange_weak(peak, total, std::memory_order_relaxed)) {
-    }
-}
-
-void TakeFromTotal(std::uint64_t size) { AddTo(gTotal, std::uint64_t{0} - size); }
-
 // Entries behind a removed one move up as far as their home slots allow.
 void Remove(Shard& shard, Entry& entry) {
     const std::size_t mask = MaskOf(shard);
     auto hole = static_cast<std::size_t>(&entry - shard.entries);
-    for (std::size_t slot = (hole + 1) & mask; shard.entries[slot].key_and_site != 0;
-         slot = (slot + 1) & mask) {
-        const std::size_t home = HomeOf(shard, KeyOf(shard.entries[slot]));
+    for (std::size_t slot = (hole + 1) & mask; shard.entries[slot].block != 0; slot = (slot + 1) & mask) {
+        const std::size_t home = HomeOf(shard, shard.entries[slot].block);
         if (((slot - home) & mask) < ((slot - hole) & mask)) continue;
         shard.entries[hole] = shard.entries[slot];
         hole = slot;
@@ -113,106 +87,123 @@ void Remove(Shard& shard, Entry& entry) {
     --shard.count;
 }
 
-void CountFree(Shard& shard, const Entry& entry) {
-    SiteUsage* const usage = UsageIn(shard, SiteOf(entry));
-    if (usage == nullptr) return;
-    ++usage->frees;
-    usage->freed_bytes += entry.size;
+// For the one writer of a counter; the command may read it meanwhile.
+void Increase(Counter& counter, std::uint64_t amount) {
+    counter.store(counter.load(std::memory_order_relaxed) + amount, std::memory_order_relaxed);
 }
 
-// The size of the unseen free, if there was one, goes to `replaced`.
-bool Insert(Shard& shard, const void* block, std::size_t size, SiteId site, std::uint64_t& replaced) {
-    const SpinLockScope lock(shard.lock);
-    SiteUsage* const usage = UsageIn(shard, site);
-    if (usage == nullptr || !HasRoom(shard)) return false;
+// Before live bytes change for the first time since the peak, they are those at the peak.
+void KeepForPeak(const Account& account, UsageCounters& usage) {
+    const std::uint64_t stamp = account.stamp.load(std::memory_order_relaxed);
+    if (usage.stamp.load(std::memory_order_relaxed) == stamp) return;
+    usage.at_peak.store(
+        usage.allocated.load(std::memory_order_relaxed) - usage.freed.load(std::memory_order_relaxed),
+        std::memory_order_relaxed);
+    usage.stamp.store(stamp, std::memory_order_release);  // pairs with the command's load
+}
+
+void CountFree(Account& account, Shard& shard, const Entry& entry, bool temporary) {
+    UsageCounters* const usage = shard.usage.Find(NodeOf(entry));
+    if (usage == nullptr) return;
+    KeepForPeak(account, *usage);
+    Increase(usage->frees, 1);
+    Increase(usage->freed, SizeOf(entry));
+    if (temporary) Increase(usage->temporary, 1);
+}
+
+void AddToTotal(Account& account, std::uint64_t size) {
+    const std::uint64_t total = AddTo(account.total, size);
+    std::uint64_t peak = account.peak.load(std::memory_order_relaxed);
+    if (total <= peak) return;
+    while (total > peak && !account.peak.compare_exchange_weak(peak, total, std::memory_order_relaxed)) {
+    }
+    AddTo(account.stamp, std::uint64_t{1});
+}
+
+void TakeFromTotal(Account& account, std::uint64_t size) { AddTo(account.total, std::uint64_t{0} - size); }
+
+// The entry for `block`, with room behind it, or null if memory ran out. What was recorded there counts as
+// freed, and its size goes to `replaced`.
+Entry* Place(Account& account, Shard& shard, const void* block, std::uint64_t& replaced) {
+    if (!HasRoom(shard)) return nullptr;
     Entry& entry = SlotOf(shard, KeyOf(block));
-    if (entry.key_and_site != 0) {
-        CountFree(shard, entry);
-        replaced = entry.size;
+    if (entry.block != 0) {
+        CountFree(account, shard, entry, false);
+        replaced = SizeOf(entry);
     } else {
         ++shard.count;
     }
-    entry = {KeyOf(block) << kSiteBits | site, size};
-    ++usage->allocations;
-    usage->allocated_bytes += size;
+    return &entry;
+}
+
+bool Insert(Account& account, const void* block, std::size_t size, NodeId node, std::uint64_t& replaced) {
+    const std::size_t index = IndexOf(block);
+    Shard& shard = gShards[index];
+    const SpinLockScope lock(shard.lock);
+    UsageCounters* usage = shard.usage.Find(node);
+    if (usage == nullptr) usage = shard.usage.Make(account.usage[index], node);
+    Entry* const entry = usage == nullptr ? nullptr : Place(account, shard, block, replaced);
+    if (entry == nullptr) return false;
+    *entry = {KeyOf(block), std::uint64_t{size} << kNodeBits | node};
+    KeepForPeak(account, *usage);
+    Increase(usage->allocated, size);
+    Increase(usage->allocations, 1);
     return true;
 }
 
 }  // namespace
 
-void AddBlock(const void* block, std::size_t size, SiteId site) {
+void AddBlock(Account& account, const void* block, std::size_t size, NodeId node) {
     std::uint64_t replaced = 0;
-    if (!Insert(ShardOf(block), block, size, site, replaced)) {
-        AddLostBlock();
+    if (size > kLargestBlock || !Insert(account, block, size, node, replaced)) {
+        AddTo(account.lost_blocks, std::uint64_t{1});
         return;
     }
-    if (replaced != 0) TakeFromTotal(replaced);
-    AddToTotal(size);
+    if (replaced != 0) TakeFromTotal(account, replaced);
+    AddToTotal(account, size);
 }
 
-DroppedBlock DropBlock(const void* block) {
+DroppedBlock DropBlock(Account& account, const void* block, bool temporary) {
     // The allocator's words before the block are needed next; they arrive while the table is read.
     __builtin_prefetch(static_cast<const char*>(block) - sizeof(std::size_t));
-    Shard& shard = ShardOf(block);
+    Shard& shard = gShards[IndexOf(block)];
     DroppedBlock dropped{};
     {
         const SpinLockScope lock(shard.lock);
         if (shard.entries == nullptr) return dropped;
         Entry& entry = SlotOf(shard, KeyOf(block));
-        if (entry.key_and_site == 0) return dropped;
-        dropped = {true, SiteOf(entry), entry.size};
-        CountFree(shard, entry);
+        if (entry.block == 0) return dropped;
+        dropped = {true, NodeOf(entry), SizeOf(entry)};
+        CountFree(account, shard, entry, temporary);
         Remove(shard, entry);
     }
-    TakeFromTotal(dropped.size);
+    TakeFromTotal(account, dropped.size);
     return dropped;
 }
 
-void RestoreBlock(const void* block, const DroppedBlock& dropped) {
-    AddBlock(block, dropped.size, dropped.site);
-    Shard& shard = ShardOf(block);
-    const SpinLockScope lock(shard.lock);
-    SiteUsage* const usage = UsageIn(shard, dropped.site);
-    if (usage == nullptr) return;
-    --usage->allocations;
-    --usage->frees;
-    usage->allocated_bytes -= dropped.size;
-    usage->freed_bytes -= dropped.size;
-}
-
-SiteUsage UsageOfSite(SiteId site) {
-    SiteUsage sum{};
-    for (Shard& shard : gShards) {
+void RestoreBlock(Account& account, const void* block, const DroppedBlock& dropped) {
+    std::uint64_t replaced = 0;
+    Shard& shard = gShards[IndexOf(block)];
+    {
         const SpinLockScope lock(shard.lock);
-        const SiteUsage* const page = shard.usage[site / kSitesOfPage];
-        if (page == nullptr) continue;
-        const SiteUsage& usage = page[site % kSitesOfPage];
-        sum.allocated_bytes += usage.allocated_bytes;
-        sum.freed_bytes += usage.freed_bytes;
-        sum.allocations += usage.allocations;
-        sum.frees += usage.frees;
+        Entry* const entry = Place(account, shard, block, replaced);
+        UsageCounters* const usage = shard.usage.Find(dropped.node);
+        if (entry == nullptr || usage == nullptr) return;
+        *entry = {KeyOf(block), std::uint64_t{dropped.size} << kNodeBits | dropped.node};
+        Increase(usage->frees, ~std::uint64_t{0});
+        Increase(usage->freed, std::uint64_t{0} - dropped.size);
     }
-    return sum;
+    AddTo(account.total, dropped.size);
 }
 
-std::uint64_t TotalBytes() { return gTotal.load(std::memory_order_relaxed); }
-std::uint64_t PeakBytes() { return gPeak.load(std::memory_order_relaxed); }
-std::uint64_t LostBlocks() { return gLost.load(std::memory_order_relaxed); }
-
-void AddLostBlock() { gLost.fetch_add(1, std::memory_order_relaxed); }
-
-// The tables may be halfway through a change of another thread's, so nothing in them is read.
-void ResetBlocksInChild() {
+// The tables were not copied to the child, and locks of them may be held by threads that it does not have.
+void ResetBlocks(std::uint64_t nodes) {
     for (Shard& shard : gShards) {
-        if (shard.entries != nullptr) UnmapPages(shard.entries, sizeof(Entry) << shard.bits);
         shard.entries = nullptr;
         shard.count = 0;
-        shard.usage.fill(nullptr);
+        shard.usage.Reset(nodes);
         shard.lock.Release();
     }
-    gTotal = 0;
-    gPeak = 0;
-    gLost = 0;
 }
 
 }  // namespace recorder

@@ -2,7 +2,6 @@
 #ifndef ZANBASE_RECORD_DISK_OPERATION_H
 #define ZANBASE_RECORD_DISK_OPERATION_H
 
-#include <array>
 #include <cstdint>
 
 #include "files.h"
@@ -14,7 +13,7 @@ namespace recorder {
 // `descriptor`, with that many bytes if `operation` moves bytes.
 template <class Call>
 auto Operate(DiskOperation operation, int descriptor, const Call& real) {
-    FileRecord* const file = Wants(kDisk) ? FileOf(descriptor) : nullptr;
+    FileRow* const file = Wants(kDisk) ? FileOf(descriptor) : nullptr;
     if (file == nullptr) return real();
     const std::uint64_t start = Now();
     const auto result = real();
@@ -39,14 +38,11 @@ auto Open(const char* path, const Call& real, const Descriptor& descriptorOf) {
     return result;
 }
 
-// Descriptors that the recorder itself needs until the end: a program that closes all it finds must not close
-// them. Ascending; those that are not in use are above any descriptor.
-const std::array<unsigned int, 2>& OwnDescriptors();
+inline bool IsOwnDescriptor(int descriptor) { return descriptor >= 0 && descriptor == gOwnDescriptor; }
 
-inline bool IsOwnDescriptor(int descriptor) {
-    const auto number = static_cast<unsigned int>(descriptor);
-    return number == OwnDescriptors()[0] || number == OwnDescriptors()[1];
-}
+// Counts what the C library's streams do from now on; further calls do nothing. False if its tables are not
+// as expected: then only opens of streams are counted.
+bool HookStreams();
 
 }  // namespace recorder
 

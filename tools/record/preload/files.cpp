@@ -1,8 +1,7 @@
-// The disk account. Records are found by device, inode and the spelling of the name, which costs one fstat; a
-// record gets its name from the kernel when it is made. Rows of one name are added up in the report.
+// The disk account. Rows are found by device, inode and the name that was opened, which costs one fstat; a
+// row gets its name from the kernel when it is made. Rows of one name are added up in the report.
 #include "files.h"
 
-#include <atomic>
 #include <climits>
 #include <cstdio>
 #include <cstring>
@@ -13,24 +12,37 @@
 #include <sys/syscall.h>
 #include <unistd.h>
 
-#include "pool.h"
 #include "recording.h"
+#include "shared_memory.h"
 #include "spin_lock.h"
-#include "thread_state.h"
 
 namespace recorder {
 namespace {
 
 constexpr std::size_t kMarksOfPage = 1024;
 constexpr std::size_t kMarkPages = 1024;
-constexpr std::size_t kChains = 4096;
+constexpr unsigned int kFirstBits = 9;
 
-using Mark = std::atomic<FileRecord*>;  // null: not looked at yet
-FileRecord gNoFile{};                   // the mark of what is no regular file
+using Mark = std::atomic<std::uint32_t>;  // a row's number and 2, or one of these
+constexpr std::uint32_t kUnknown = 0;
+constexpr std::uint32_t kNoFile = 1;
+constexpr std::uint32_t kFirstMark = 2;
 std::array<std::atomic<Mark*>, kMarkPages> gMarks;
 
-SpinLock gLock;  // guards the chains; records never leave them
-std::array<FileRecord*, kChains> gChains;
+struct Key {
+    std::uint64_t device;
+    std::uint64_t inode;
+    std::uint64_t name;  // a hash of what was opened
+    std::uint64_t mark;  // 0 in an empty slot
+};
+
+// Open hashing with linear probing; guarded by gLock, as is the adding of rows.
+SpinLock gLock;
+Key* gKeys = nullptr;
+unsigned int gKeyBits = 0;
+using Rows = TableRows<decltype(Account::files)>;
+std::array<Rows, 2> gTables;
+Rows* gRows = gTables.data();  // a forked child takes the other one, which is empty
 
 // Null if the number is out of range or memory ran out.
 Mark* MarkOf(int descriptor) {
@@ -39,16 +51,15 @@ Mark* MarkOf(int descriptor) {
     std::atomic<Mark*>& page = gMarks[number / kMarksOfPage];
     Mark* marks = page.load(std::memory_order_acquire);
     if (marks == nullptr) {
-        const InsideScope scope;
-        auto* const fresh = static_cast<Mark*>(TakeFromPool(kMarksOfPage * sizeof(Mark)));
+        const RecursionGuard guard;
+        auto* const fresh = static_cast<Mark*>(MapPages(kMarksOfPage * sizeof(Mark), true));
         if (fresh == nullptr) return nullptr;
         if (page.compare_exchange_strong(marks, fresh, std::memory_order_acq_rel)) marks = fresh;
     }
     return &marks[number % kMarksOfPage];
 }
 
-// The C library's fstat looks up an empty path, which takes twice as long.
-bool ReadStatus(int descriptor, struct stat& status) { return syscall(SYS_fstat, descriptor, &status) == 0; }
+FileRow* RowOf(std::uint32_t mark) { return mark < kFirstMark ? nullptr : gRows->Find(mark - kFirstMark); }
 
 std::uint64_t HashText(const char* text) {
     std::uint64_t hash = 14695981039346656037U;
@@ -57,72 +68,119 @@ std::uint64_t HashText(const char* text) {
     return hash;
 }
 
-// The name that the kernel has for `descriptor`, in `name`; empty if it has none.
-void ReadName(int descriptor, std::array<char, PATH_MAX>& name) {
-    std::array<char, 40> link{};
-    std::snprintf(link.data(), link.size(), "/proc/self/fd/%d", descriptor);
-    const long length = syscall(SYS_readlinkat, AT_FDCWD, link.data(), name.data(), name.size() - 1);
-    name[length < 0 ? 0 : static_cast<std::size_t>(length)] = 0;
+Key& SlotOf(const Key& key) {
+    const std::size_t mask = (std::size_t{1} << gKeyBits) - 1;
+    const std::uint64_t hash = (key.inode * 31 + key.device) ^ key.name;
+    for (std::size_t slot = hash * 0x9e3779b97f4a7c15 >> (64 - gKeyBits);; slot = (slot + 1) & mask) {
+        const Key& found = gKeys[slot];
+        if (found.mark == 0 ||
+            (found.inode == key.inode && found.device == key.device && found.name == key.name))
+            return gKeys[slot];
+    }
 }
 
-FileRecord* MakeRecord(int descriptor, const char* path) {
+bool HasRoom(std::uint64_t rows) {
+    if (gKeys != nullptr && rows < (std::uint64_t{1} << gKeyBits) / 2) return true;
+    const Key* const old = gKeys;
+    const std::size_t old_slots = old == nullptr ? 0 : std::size_t{1} << gKeyBits;
+    const unsigned int bits = old == nullptr ? kFirstBits : gKeyBits + 1;
+    auto* const keys = static_cast<Key*>(MapPages(sizeof(Key) << bits));
+    if (keys == nullptr) return gKeys != nullptr && rows + 1 < old_slots;
+    gKeys = keys;
+    gKeyBits = bits;
+    for (std::size_t slot = 0; slot < old_slots; ++slot)
+        if (old[slot].mark != 0) SlotOf(old[slot]) = old[slot];
+    if (old != nullptr) UnmapPages(const_cast<Key*>(old), old_slots * sizeof(Key));
+    return true;
+}
+
+// The name that the kernel has for `descriptor`, or else the one that it was opened by. Empty if there is no
+// disk behind it.
+TextPlace KeepName(int descriptor, const char* path) {
     std::array<char, PATH_MAX> name{};
-    ReadName(descriptor, name);
-    if (std::strncmp(name.data(), "/memfd:", 7) == 0) return nullptr;  // no disk behind it
-    const char* const text = name[0] != 0 || path == nullptr ? name.data() : path;
-    const std::size_t bytes = std::strlen(text) + 1;
-    auto* const record = static_cast<FileRecord*>(TakeFromPool(sizeof(FileRecord)));
-    auto* const kept = static_cast<char*>(TakeFromPool(bytes));
-    if (record == nullptr || kept == nullptr) return nullptr;
-    std::memcpy(kept, text, bytes);
-    record->name = kept;
-    return record;
+    std::array<char, 40> link{};
+    long length = 0;
+    if (!gIsConfined) {
+        std::snprintf(link.data(), link.size(), "/proc/self/fd/%d", descriptor);
+        length = syscall(SYS_readlinkat, AT_FDCWD, link.data(), name.data(), name.size());
+    }
+    if (length > 0 && std::strncmp(name.data(), "/memfd:", 7) == 0) return {};
+    if (length > 0) return KeepText(name.data(), static_cast<std::size_t>(length));
+    return path == nullptr ? TextPlace{} : KeepText(path, std::strlen(path));
 }
 
-// The record of the regular file that is open as `descriptor`, or null.
-FileRecord* FindRecord(int descriptor, const char* path) {
+// Adds a row; the mark that leads to it, or kNoFile. Requires: the lock.
+std::uint32_t AddRow(const TextPlace& name) {
+    Account& account = *gAccount;
+    const std::uint64_t number = account.files.count.load(std::memory_order_relaxed);
+    FileRow* const row = gRows->Make(account.files, number);
+    if (row == nullptr) {
+        AddTo(account.lost_files, std::uint64_t{1});
+        return kNoFile;
+    }
+    row->name = name;
+    account.files.count.store(number + 1, std::memory_order_release);
+    return static_cast<std::uint32_t>(number) + kFirstMark;
+}
+
+// The C library's fstat takes twice as long, because it looks up an empty path; but its system call is the
+// one that programs with a filter allow.
+bool ReadStatus(int descriptor, struct stat& status) {
+    return (gIsConfined ? fstat(descriptor, &status) : syscall(SYS_fstat, descriptor, &status)) == 0;
+}
+
+// The mark of the file with that very name in this account, whose row is added if need be.
+std::uint32_t MarkFor(const TextPlace& name) {
+    const std::uint64_t count = gAccount->files.count;
+    for (std::uint64_t row = 0; row < count; ++row) {
+        const FileRow* const file = gRows->Find(row);
+        if (file != nullptr && file->name.position == name.position)
+            return static_cast<std::uint32_t>(row) + kFirstMark;
+    }
+    return AddRow(name);
+}
+
+// The mark for what is open as `descriptor`.
+std::uint32_t FindMark(int descriptor, const char* path) {
     struct stat status {};
-    if (!ReadStatus(descriptor, status) || !S_ISREG(status.st_mode)) return nullptr;
-    const std::uint64_t spelling = HashText(path);
-    FileRecord*& chain = gChains[(status.st_ino * 31 + spelling) % kChains];
+    if (!ReadStatus(descriptor, status) || !S_ISREG(status.st_mode)) return kNoFile;
+    Key key{status.st_dev, status.st_ino, HashText(path), 0};
     const SpinLockScope lock(gLock);
-    for (FileRecord* file = chain; file != nullptr; file = file->next)
-        if (file->inode == status.st_ino && file->device == status.st_dev && file->spelling == spelling)
-            return file;
-    FileRecord* const file = MakeRecord(descriptor, path);
-    if (file == nullptr) return nullptr;
-    file->device = status.st_dev;
-    file->inode = status.st_ino;
-    file->spelling = spelling;
-    file->next = chain;
-    chain = file;
-    return file;
+    if (!HasRoom(gAccount->files.count.load(std::memory_order_relaxed))) {
+        AddTo(gAccount->lost_files, std::uint64_t{1});
+        return kNoFile;
+    }
+    Key& slot = SlotOf(key);
+    if (slot.mark != 0) return static_cast<std::uint32_t>(slot.mark);
+    const TextPlace name = KeepName(descriptor, path);
+    if (name.bytes == 0) return kNoFile;
+    key.mark = AddRow(name);
+    if (key.mark != kNoFile) slot = key;
+    return static_cast<std::uint32_t>(key.mark);
 }
 
-FileRecord* LookAt(int descriptor, Mark& mark, const char* path) {
-    const InsideScope scope;
-    FileRecord* const file = FindRecord(descriptor, path);
-    if (!IsVforkChild()) mark.store(file != nullptr ? file : &gNoFile, std::memory_order_release);
-    return file;
+FileRow* LookAt(int descriptor, Mark& mark, const char* path) {
+    const RecursionGuard guard;
+    const std::uint32_t found = FindMark(descriptor, path);
+    if (!gThread.in_vfork) mark.store(found, std::memory_order_release);
+    return RowOf(found);
 }
 
 }  // namespace
 
-FileRecord* FileOf(int descriptor) {
+FileRow* FileOf(int descriptor) {
     Mark* const mark = MarkOf(descriptor);
     if (mark == nullptr) return nullptr;
-    FileRecord* file = mark->load(std::memory_order_acquire);
-    if (file == nullptr) {
-        file = LookAt(descriptor, *mark, nullptr);
-        // An open that is under way counts itself.
-        const bool counts = !gThread.opening && !IsVforkChild();
-        if (file != nullptr && counts) CountOperation(*file, DiskOperation::kOpen, 0, 0);
-    }
-    return file == &gNoFile ? nullptr : file;
+    const std::uint32_t known = mark->load(std::memory_order_acquire);
+    if (known != kUnknown) return RowOf(known);
+    FileRow* const file = LookAt(descriptor, *mark, nullptr);
+    // An open that is under way counts itself.
+    if (file != nullptr && !gThread.opening && !gThread.in_vfork)
+        CountOperation(*file, DiskOperation::kOpen, 0, 0);
+    return file;
 }
 
-void CountOperation(FileRecord& file, DiskOperation operation, std::uint64_t bytes,
-                    std::uint64_t nanoseconds) {
+void CountOperation(FileRow& file, DiskOperation operation, std::uint64_t bytes, std::uint64_t nanoseconds) {
     OperationCounters& counters = file.counters[static_cast<std::size_t>(operation)];
     counters.count.fetch_add(1, std::memory_order_relaxed);
     counters.nanoseconds.fetch_add(nanoseconds, std::memory_order_relaxed);
@@ -132,23 +190,23 @@ void CountOperation(FileRecord& file, DiskOperation operation, std::uint64_t byt
 void CountOpen(int descriptor, const char* path, std::uint64_t nanoseconds) {
     Mark* const mark = MarkOf(descriptor);
     if (mark == nullptr) return;
-    FileRecord* const file = LookAt(descriptor, *mark, path);
+    FileRow* const file = LookAt(descriptor, *mark, path);
     if (file != nullptr) CountOperation(*file, DiskOperation::kOpen, 0, nanoseconds);
 }
 
-FileRecord* ForgetDescriptor(int descriptor) {
+FileRow* ForgetDescriptor(int descriptor) {
     Mark* const mark = MarkOf(descriptor);
-    if (mark == nullptr || mark->load(std::memory_order_acquire) == nullptr) return nullptr;
-    if (IsVforkChild()) return nullptr;
-    FileRecord* const file = mark->exchange(nullptr, std::memory_order_acq_rel);
-    return file == &gNoFile ? nullptr : file;
+    if (mark == nullptr || gThread.in_vfork || mark->load(std::memory_order_acquire) == kUnknown)
+        return nullptr;
+    return RowOf(mark->exchange(kUnknown, std::memory_order_acq_rel));
 }
 
 void CopyDescriptor(int descriptor, int copy) {
-    FileRecord* const file = FileOf(descriptor);
-    Mark* const mark = MarkOf(copy);
-    if (mark == nullptr || IsVforkChild()) return;
-    mark->store(file != nullptr ? file : &gNoFile, std::memory_order_release);
+    FileOf(descriptor);
+    const Mark* const from = MarkOf(descriptor);
+    Mark* const to = MarkOf(copy);
+    if (from == nullptr || to == nullptr || gThread.in_vfork) return;
+    to->store(from->load(std::memory_order_relaxed), std::memory_order_release);
 }
 
 // The first numbers cover what programs are started with in practice; a look costs less than reading the
@@ -158,43 +216,33 @@ void MarkInheritedDescriptors() {
     for (int descriptor = 0; descriptor < kLooked; ++descriptor) {
         Mark* const mark = MarkOf(descriptor);
         struct stat status {};
-        if (mark == nullptr || mark->load() != nullptr || !ReadStatus(descriptor, status)) continue;
-        LookAt(descriptor, *mark, nullptr);
+        if (mark != nullptr && mark->load() == kUnknown && ReadStatus(descriptor, status))
+            LookAt(descriptor, *mark, nullptr);
     }
 }
 
 std::uint64_t Now() {
+    if (gHasNoClock) return 0;
     timespec now{};
     clock_gettime(CLOCK_MONOTONIC, &now);
     return static_cast<std::uint64_t>(now.tv_sec) * 1000000000U + static_cast<std::uint64_t>(now.tv_nsec);
 }
 
-std::vector<NamedSums> ListFiles() {
-    std::vector<NamedSums> files;
-    const SpinLockScope lock(gLock);
-    for (FileRecord* const chain : gChains) {
-        for (FileRecord* file = chain; file != nullptr; file = file->next) {
-            files.push_back({file->name, {}});
-            for (std::size_t i = 0; i < kDiskOperations; ++i) {
-                const OperationCounters& counters = file->counters[i];
-                files.back().sums[i] = {counters.count, counters.nanoseconds, counters.bytes};
-            }
-        }
-    }
-    return files;
-}
-
-void ResetFilesInChild() {
+// The child has its own descriptors, and rows for those only; the table of names was not copied to it.
+void ResetFiles(const Account& parent) {
+    Rows& old = *gRows;
+    gRows = &gTables[gRows == gTables.data() ? 1 : 0];
+    gKeys = nullptr;
     gLock.Release();
-    for (FileRecord* const chain : gChains) {
-        for (FileRecord* file = chain; file != nullptr; file = file->next) {
-            for (OperationCounters& counters : file->counters) {
-                counters.count = 0;
-                counters.nanoseconds = 0;
-                counters.bytes = 0;
-            }
+    for (std::atomic<Mark*>& page : gMarks) {
+        Mark* const marks = page.load(std::memory_order_relaxed);
+        for (std::size_t i = 0; marks != nullptr && i < kMarksOfPage; ++i) {
+            const std::uint32_t mark = marks[i].load(std::memory_order_relaxed);
+            const FileRow* const file = mark < kFirstMark ? nullptr : old.Find(mark - kFirstMark);
+            if (file != nullptr) marks[i] = MarkFor(file->name);
         }
     }
+    old.Reset(parent.files.count);
 }
 
 }  // namespace recorder

@@ -14,21 +14,34 @@ struct FrameRule {
     bool known;
     bool from_frame_pointer;  // otherwise from the stack pointer
     bool saves_frame_pointer;
-    std::int32_t cfa_offset;
-    std::int32_t frame_pointer_offset;  // from the CFA
+    std::int64_t cfa_offset;
+    std::int64_t frame_pointer_offset;  // from the CFA
 };
 
+// The packed rule: bit 0 is set if the caller can be found, bit 1 tells the register and bit 3 whether the
+// frame pointer was saved; bit 2 is kStop. The offsets follow.
+using PackedRule = std::uint64_t;
+constexpr PackedRule kLeadsOn = 1;
+
+inline PackedRule PackRule(const FrameRule& rule) {
+    constexpr std::int64_t kLimit = 1 << 28;
+    if (!rule.known || rule.cfa_offset < 0 || rule.cfa_offset >= kLimit || rule.frame_pointer_offset > 0 ||
+        rule.frame_pointer_offset <= -kLimit)
+        return 0;
+    return kLeadsOn | (rule.from_frame_pointer ? 2U : 0U) | (rule.saves_frame_pointer ? 8U : 0U) |
+           static_cast<PackedRule>(rule.cfa_offset) << 4 |
+           static_cast<PackedRule>(-rule.frame_pointer_offset) << 36;
+}
+
 // The caller's frame, or one whose `pc` is 0 if the stack makes no sense.
-inline Frame CallerOf(const Frame& frame, const FrameRule& rule) {
+inline Frame CallerOf(const Frame& frame, PackedRule rule) {
     constexpr std::uintptr_t kLargestFrame = std::uintptr_t{1} << 26;
-    const std::uintptr_t base = rule.from_frame_pointer ? frame.fp : frame.sp;
-    const std::uintptr_t cfa = base + static_cast<std::uintptr_t>(std::int64_t{rule.cfa_offset});
+    const std::uintptr_t cfa = ((rule & 2) != 0 ? frame.fp : frame.sp) + (rule >> 4 & 0xfffffff);
     if (cfa <= frame.sp || cfa - frame.sp > kLargestFrame || cfa % sizeof(cfa) != 0) return {};
-    const auto word = [cfa](std::int64_t offset) {
-        return *reinterpret_cast<const std::uintptr_t*>(cfa + static_cast<std::uintptr_t>(offset));
+    const auto word = [cfa](std::uintptr_t below) {
+        return *reinterpret_cast<const std::uintptr_t*>(cfa - below);
     };
-    constexpr std::int64_t kReturnAddress = -8;
-    return {word(kReturnAddress), cfa, rule.saves_frame_pointer ? word(rule.frame_pointer_offset) : frame.fp};
+    return {word(sizeof(cfa)), cfa, (rule & 8) != 0 ? word(rule >> 36) : frame.fp};
 }
 
 }  // namespace recorder

@@ -3,7 +3,6 @@
 // new by itself never gets there, and the block is recorded after it was taken. No hook needs a cleanup when
 // the program's operator throws.
 #include <cstddef>
-#include <cstdlib>
 #include <new>
 
 #include "next_function.h"
@@ -12,21 +11,12 @@
 namespace recorder {
 namespace {
 
-// The recorder's own memory. Without it no report is possible; what the recorder does ends where this throws.
-void* TakeForRecorder(std::size_t size) {
-    void* const block = std::malloc(size != 0 ? size : 1);
-    if (block == nullptr) throw std::bad_alloc();
-    return block;
-}
-
 template <class Function, class... Arguments>
 [[gnu::always_inline]] inline void* New(NextFunction<Function>& next, std::size_t size,
                                         Arguments... arguments) {
     // The runtime's form for arrays jumps to the plain one, whose caller is this library then.
-    if (gThread.has_request && !gThread.inside) return next(size, arguments...);
+    if (gThread.has_request || !Wants(kMemory)) return next(size, arguments...);
     const Frame caller = CallerOfHook();
-    if (IsOwnCode(caller.pc) || next.Get() == nullptr) return TakeForRecorder(size);
-    if (!Wants(kMemory)) return next(size, arguments...);
     gThread.request = caller;
     gThread.has_request = true;
     void* const block = next(size, arguments...);
@@ -37,16 +27,12 @@ template <class Function, class... Arguments>
 
 template <class Function, class... Arguments>
 [[gnu::always_inline]] inline void Delete(NextFunction<Function>& next, void* block, Arguments... arguments) {
-    if (IsOwnCode(CallerOfHook().pc) || next.Get() == nullptr) {
-        std::free(block);
-        return;
-    }
     if (block == nullptr || !Wants(kMemory)) {
         next(block, arguments...);
         return;
     }
-    const InsideScope scope;
-    DropBlock(block);
+    ForgetBlock(block);
+    const RecursionGuard guard;
     next(block, arguments...);
 }
 
@@ -54,65 +40,47 @@ using Size = std::size_t;
 using Align = std::align_val_t;
 using Nothrow = const std::nothrow_t&;
 
-NextFunction<void*(Size)> gNew{"_Znwm"};
-NextFunction<void*(Size)> gNewArray{"_Znam"};
-NextFunction<void*(Size, Nothrow)> gNewNothrow{"_ZnwmRKSt9nothrow_t"};
-NextFunction<void*(Size, Nothrow)> gNewArrayNothrow{"_ZnamRKSt9nothrow_t"};
-NextFunction<void*(Size, Align)> gNewAligned{"_ZnwmSt11align_val_t"};
-NextFunction<void*(Size, Align)> gNewArrayAligned{"_ZnamSt11align_val_t"};
-NextFunction<void*(Size, Align, Nothrow)> gNewAlignedNothrow{"_ZnwmSt11align_val_tRKSt9nothrow_t"};
-NextFunction<void*(Size, Align, Nothrow)> gNewArrayAlignedNothrow{"_ZnamSt11align_val_tRKSt9nothrow_t"};
-
-NextFunction<void(void*)> gDelete{"_ZdlPv"};
-NextFunction<void(void*)> gDeleteArray{"_ZdaPv"};
-NextFunction<void(void*, Size)> gDeleteSized{"_ZdlPvm"};
-NextFunction<void(void*, Size)> gDeleteArraySized{"_ZdaPvm"};
-NextFunction<void(void*, Nothrow)> gDeleteNothrow{"_ZdlPvRKSt9nothrow_t"};
-NextFunction<void(void*, Nothrow)> gDeleteArrayNothrow{"_ZdaPvRKSt9nothrow_t"};
-NextFunction<void(void*, Align)> gDeleteAligned{"_ZdlPvSt11align_val_t"};
-NextFunction<void(void*, Align)> gDeleteArrayAligned{"_ZdaPvSt11align_val_t"};
-NextFunction<void(void*, Size, Align)> gDeleteSizedAligned{"_ZdlPvmSt11align_val_t"};
-NextFunction<void(void*, Size, Align)> gDeleteArraySizedAligned{"_ZdaPvmSt11align_val_t"};
-NextFunction<void(void*, Align, Nothrow)> gDeleteAlignedNothrow{"_ZdlPvSt11align_val_tRKSt9nothrow_t"};
-NextFunction<void(void*, Align, Nothrow)> gDeleteArrayAlignedNothrow{"_ZdaPvSt11align_val_tRKSt9nothrow_t"};
-
 }  // namespace
 }  // namespace recorder
 
 using namespace recorder;  // NOLINT(google-build-using-namespace): the operators have no namespace
 
-void* operator new(Size size) { return New(gNew, size); }
-void* operator new[](Size size) { return New(gNewArray, size); }
-void* operator new(Size size, Nothrow tag) noexcept { return New(gNewNothrow, size, tag); }
-void* operator new[](Size size, Nothrow tag) noexcept { return New(gNewArrayNothrow, size, tag); }
-void* operator new(Size size, Align alignment) { return New(gNewAligned, size, alignment); }
-void* operator new[](Size size, Align alignment) { return New(gNewArrayAligned, size, alignment); }
-void* operator new(Size size, Align alignment, Nothrow tag) noexcept {
-    return New(gNewAlignedNothrow, size, alignment, tag);
-}
-void* operator new[](Size size, Align alignment, Nothrow tag) noexcept {
-    return New(gNewArrayAlignedNothrow, size, alignment, tag);
-}
+// An operator, with its name for the linker. The first time that it is needed may be when a C++ library is
+// loaded, so they are looked up then.
+// NOLINTBEGIN(bugprone-macro-parentheses): these are definitions
+#define ZANBASE_NEW(form, symbol, parameters, exceptions, ...) \
+    namespace recorder::next {                                 \
+    static NextFunction<void * parameters> symbol{#symbol};    \
+    }                                                          \
+    void* operator form parameters exceptions { return New(next::symbol, __VA_ARGS__); }
+#define ZANBASE_DELETE(form, symbol, parameters, ...)     \
+    namespace recorder::next {                            \
+    static NextFunction<void parameters> symbol{#symbol}; \
+    }                                                     \
+    void operator form parameters noexcept { Delete(next::symbol, __VA_ARGS__); }
+// NOLINTEND(bugprone-macro-parentheses)
 
-void operator delete(void* block) noexcept { Delete(gDelete, block); }
-void operator delete[](void* block) noexcept { Delete(gDeleteArray, block); }
-void operator delete(void* block, Size size) noexcept { Delete(gDeleteSized, block, size); }
-void operator delete[](void* block, Size size) noexcept { Delete(gDeleteArraySized, block, size); }
-void operator delete(void* block, Nothrow tag) noexcept { Delete(gDeleteNothrow, block, tag); }
-void operator delete[](void* block, Nothrow tag) noexcept { Delete(gDeleteArrayNothrow, block, tag); }
-void operator delete(void* block, Align alignment) noexcept { Delete(gDeleteAligned, block, alignment); }
-void operator delete[](void* block, Align alignment) noexcept {
-    Delete(gDeleteArrayAligned, block, alignment);
-}
-void operator delete(void* block, Size size, Align alignment) noexcept {
-    Delete(gDeleteSizedAligned, block, size, alignment);
-}
-void operator delete[](void* block, Size size, Align alignment) noexcept {
-    Delete(gDeleteArraySizedAligned, block, size, alignment);
-}
-void operator delete(void* block, Align alignment, Nothrow tag) noexcept {
-    Delete(gDeleteAlignedNothrow, block, alignment, tag);
-}
-void operator delete[](void* block, Align alignment, Nothrow tag) noexcept {
-    Delete(gDeleteArrayAlignedNothrow, block, alignment, tag);
-}
+ZANBASE_NEW(new, _Znwm, (Size size), , size)
+ZANBASE_NEW(new, _ZnwmRKSt9nothrow_t, (Size size, Nothrow tag), noexcept, size, tag)
+ZANBASE_NEW(new, _ZnwmSt11align_val_t, (Size size, Align align), , size, align)
+ZANBASE_NEW(new, _ZnwmSt11align_val_tRKSt9nothrow_t, (Size size, Align align, Nothrow tag), noexcept, size,
+            align, tag)
+ZANBASE_NEW(new[], _Znam, (Size size), , size)
+ZANBASE_NEW(new[], _ZnamRKSt9nothrow_t, (Size size, Nothrow tag), noexcept, size, tag)
+ZANBASE_NEW(new[], _ZnamSt11align_val_t, (Size size, Align align), , size, align)
+ZANBASE_NEW(new[], _ZnamSt11align_val_tRKSt9nothrow_t, (Size size, Align align, Nothrow tag), noexcept, size,
+            align, tag)
+ZANBASE_DELETE(delete, _ZdlPv, (void* block), block)
+ZANBASE_DELETE(delete, _ZdlPvm, (void* block, Size size), block, size)
+ZANBASE_DELETE(delete, _ZdlPvRKSt9nothrow_t, (void* block, Nothrow tag), block, tag)
+ZANBASE_DELETE(delete, _ZdlPvSt11align_val_t, (void* block, Align align), block, align)
+ZANBASE_DELETE(delete, _ZdlPvmSt11align_val_t, (void* block, Size size, Align align), block, size, align)
+ZANBASE_DELETE(delete, _ZdlPvSt11align_val_tRKSt9nothrow_t, (void* block, Align align, Nothrow tag), block,
+               align, tag)
+ZANBASE_DELETE(delete[], _ZdaPv, (void* block), block)
+ZANBASE_DELETE(delete[], _ZdaPvm, (void* block, Size size), block, size)
+ZANBASE_DELETE(delete[], _ZdaPvRKSt9nothrow_t, (void* block, Nothrow tag), block, tag)
+ZANBASE_DELETE(delete[], _ZdaPvSt11align_val_t, (void* block, Align align), block, align)
+ZANBASE_DELETE(delete[], _ZdaPvmSt11align_val_t, (void* block, Size size, Align align), block, size, align)
+ZANBASE_DELETE(delete[], _ZdaPvSt11align_val_tRKSt9nothrow_t, (void* block, Align align, Nothrow tag), block,
+               align, tag)

@@ -7,43 +7,58 @@
 
 namespace recorder {
 
-// Looks `name` up behind this library, also among libraries that were loaded for one other library only. Null
-// if there is none. What the loader allocates meanwhile does not reach a hook that needs the same look-up.
-void* FindNext(const char* name);
-
-// True while this thread is in FindNext.
-bool IsLookingUp();
-
 // One function, looked up at its first call. Constant-initialised, so it can be used before any constructor
 // ran.
-template <class Function>
-class NextFunction {
+class NextSymbol {
 public:
-    constexpr explicit NextFunction(const char* name) : mpcName(name) {}
+    constexpr explicit NextSymbol(const char* name) : mpcName(name) {}
+
+    // Looks the name up behind this library, also among libraries that were loaded for one other library
+    // only. Null if there is none. What the loader allocates meanwhile does not reach a hook that needs the
+    // same look-up.
+    void* Find();
+    // The function if it has been looked up.
+    void* Known() const { return mpoFunction.load(std::memory_order_relaxed); }
+
+private:
+    const char* const mpcName;
+    std::atomic<void*> mpoFunction{nullptr};
+};
+
+// True while this thread looks a function up.
+bool IsLookingUp();
+
+template <class Function>
+class NextFunction : public NextSymbol {
+public:
+    using NextSymbol::NextSymbol;
 
     // Null if there is no such function.
     Function* Get() {
-        Function* function = mpoFunction.load(std::memory_order_relaxed);
-        if (function == nullptr) {
-            function = reinterpret_cast<Function*>(FindNext(mpcName));
-            mpoFunction.store(function, std::memory_order_relaxed);
-        }
-        return function;
+        void* const known = Known();
+        return reinterpret_cast<Function*>(known != nullptr ? known : Find());
     }
-
-    // The function if it has been looked up.
-    Function* Known() const { return mpoFunction.load(std::memory_order_relaxed); }
-
     template <class... Arguments>
     auto operator()(Arguments... arguments) {
         return Get()(arguments...);
     }
-
-private:
-    const char* const mpcName;
-    std::atomic<Function*> mpoFunction{nullptr};
 };
 
 }  // namespace recorder
+
+// Declares the function behind the hook `name` as recorder::next::name. All that are declared so are looked
+// up before the program runs: a look-up takes a lock of the loader, which must not happen in a signal handler
+// of the program.
+#define ZANBASE_NEXT(name, ...)                                                                  \
+    namespace recorder::next {                                                                   \
+    static NextFunction<__VA_ARGS__> name{#name};                                                \
+    [[gnu::used, gnu::section("zanbase_hooks")]] static NextSymbol* const symbol_##name = &name; \
+    }
+
+// Begins the definition of a hook, whose body follows. The linker's list of what the library exports is made
+// from the uses of this macro.
+#define ZANBASE_HOOK(result, name, parameters, exceptions) \
+    ZANBASE_NEXT(name, decltype(::name))                   \
+    extern "C" result name parameters exceptions
 
 #endif

@@ -11,17 +11,10 @@
 
 #include "disk_operation.h"
 #include "next_function.h"
-#include "stdio_tables.h"
 
 namespace recorder {
 namespace {
 
-NextFunction<std::FILE*(const char*, const char*)> gFopen{"fopen"};
-NextFunction<std::FILE*(const char*, const char*)> gFopen64{"fopen64"};
-NextFunction<std::FILE*(const char*, const char*, std::FILE*)> gFreopen{"freopen"};
-NextFunction<std::FILE*(const char*, const char*, std::FILE*)> gFreopen64{"freopen64"};
-NextFunction<std::FILE*()> gTmpfile{"tmpfile"};
-NextFunction<std::FILE*()> gTmpfile64{"tmpfile64"};
 NextFunction<ssize_t(std::FILE*, void*, ssize_t)> gFileRead{"_IO_file_read"};
 NextFunction<ssize_t(std::FILE*, const void*, ssize_t)> gFileWrite{"_IO_file_write"};
 NextFunction<off64_t(std::FILE*, off64_t, int)> gFileSeek{"_IO_file_seek"};
@@ -40,7 +33,7 @@ off64_t SeekStream(std::FILE* stream, off64_t place, int from) {
 }
 
 int CloseStream(std::FILE* stream) {
-    FileRecord* const file = Wants(kDisk) ? ForgetDescriptor(stream->_fileno) : nullptr;
+    FileRow* const file = Wants(kDisk) ? ForgetDescriptor(stream->_fileno) : nullptr;
     if (file == nullptr) return gFileClose(stream);
     const std::uint64_t start = Now();
     const int result = gFileClose(stream);
@@ -68,7 +61,7 @@ Entry AsEntry(Function* function) {
 }
 
 bool ReplaceEntries(const char* table_name) {
-    const InsideScope scope;
+    const RecursionGuard guard;
     auto* const table = static_cast<Entry*>(dlsym(RTLD_NEXT, table_name));
     if (table == nullptr) return false;
     const Entry expected[kSlots] = {AsEntry(gFileRead.Get()), AsEntry(gFileWrite.Get()),
@@ -98,22 +91,12 @@ bool HookStreams() {
 
 using namespace recorder;  // NOLINT(google-build-using-namespace): the hooks themselves have no namespace
 
-extern "C" {
+#define ZANBASE_STREAM(name, path, parameters, ...) \
+    ZANBASE_HOOK(std::FILE*, name, parameters, ) { return OpenStream(next::name, path, __VA_ARGS__); }
 
-std::FILE* fopen(const char* path, const char* mode) { return OpenStream(gFopen, path, path, mode); }
-
-std::FILE* fopen64(const char* path, const char* mode) { return OpenStream(gFopen64, path, path, mode); }
-
-std::FILE* freopen(const char* path, const char* mode, std::FILE* stream) {
-    return OpenStream(gFreopen, path, path, mode, stream);
-}
-
-std::FILE* freopen64(const char* path, const char* mode, std::FILE* stream) {
-    return OpenStream(gFreopen64, path, path, mode, stream);
-}
-
-std::FILE* tmpfile() { return OpenStream(gTmpfile, nullptr); }
-
-std::FILE* tmpfile64() { return OpenStream(gTmpfile64, nullptr); }
-
-}  // extern "C"
+ZANBASE_STREAM(fopen, path, (const char* path, const char* mode), path, mode)
+ZANBASE_STREAM(fopen64, path, (const char* path, const char* mode), path, mode)
+ZANBASE_STREAM(freopen, path, (const char* path, const char* mode, std::FILE* stream), path, mode, stream)
+ZANBASE_STREAM(freopen64, path, (const char* path, const char* mode, std::FILE* stream), path, mode, stream)
+ZANBASE_HOOK(std::FILE*, tmpfile, (), ) { return OpenStream(next::tmpfile, nullptr); }
+ZANBASE_HOOK(std::FILE*, tmpfile64, (), ) { return OpenStream(next::tmpfile64, nullptr); }

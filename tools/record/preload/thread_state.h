@@ -16,47 +16,33 @@ struct Frame {
 };
 
 struct ThreadState {
-    bool inside;       // the recorder itself is at work: what it allocates, reads and writes is not recorded
+    bool inside;       // the recorder itself is at work: what it does is not recorded
     bool opening;      // inside a call that opens a file and will count that
     bool has_request;  // `request` is the caller of an operator new that has not reached an allocator yet
+    bool in_vfork;     // in a child of vfork, whose descriptors are its own but whose memory is its parent's
     Frame request;
-    bool allocating;  // inside the real allocator
+    const void* newest;  // the block that was allocated last
 };
 
 // Initial-exec: no access may call the loader, which allocates.
 extern __thread ThreadState gThread __attribute__((tls_model("initial-exec")));
 
-// Marks the thread as inside the recorder, and keeps `errno`.
-class InsideScope {
+// Marks the thread as inside the recorder, and keeps `errno`. A signal handler that runs meanwhile is not
+// recorded, since it could need a lock that this thread holds.
+class RecursionGuard {
 public:
-    InsideScope() : mbWasInside(gThread.inside), mnErrno(errno) { gThread.inside = true; }
-    ~InsideScope() {
+    RecursionGuard() : mbWasInside(gThread.inside), mnErrno(errno) { gThread.inside = true; }
+    ~RecursionGuard() {
         gThread.inside = mbWasInside;
         errno = mnErrno;
     }
-    InsideScope(const InsideScope&) = delete;
-    InsideScope& operator=(const InsideScope&) = delete;
+    RecursionGuard(const RecursionGuard&) = delete;
+    RecursionGuard& operator=(const RecursionGuard&) = delete;
 
 private:
     const bool mbWasInside;
     const int mnErrno;
 };
-
-// Marks the thread as inside the real allocator.
-class AllocatorScope {
-public:
-    AllocatorScope() : mbWasAllocating(gThread.allocating) { gThread.allocating = true; }
-    ~AllocatorScope() { gThread.allocating = mbWasAllocating; }
-    AllocatorScope(const AllocatorScope&) = delete;
-    AllocatorScope& operator=(const AllocatorScope&) = delete;
-
-private:
-    const bool mbWasAllocating;
-};
-
-// False in a signal handler that interrupted the recorder or the allocator: either may hold locks that a
-// report needs.
-inline bool MayReport() { return !gThread.inside && !gThread.allocating; }
 
 // The caller of the function that this is inlined into, which must have been compiled with a frame pointer.
 [[gnu::always_inline]] inline Frame CallerOfHook() {

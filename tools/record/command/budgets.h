@@ -4,7 +4,7 @@
 
 #include <string>
 
-#include "common/settings.h"
+#include "options.h"
 #include "zanbase/snapshot.h"
 
 namespace recorder {

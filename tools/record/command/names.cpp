@@ -33,11 +33,4 @@ std::string ReadableName(const char* linkerName) {
     return name;
 }
 
-std::string ShortName(const char* linkerName) {
-    constexpr std::size_t kLongest = 80;
-    std::string name = ReadableName(linkerName);
-    if (name.size() > kLongest) name = name.substr(0, kLongest - 3) + "...";
-    return name;
-}
-
 }  // namespace recorder

@@ -9,9 +9,6 @@ namespace recorder {
 // The demangled name without its parameters, or the name itself if it is no C++ name.
 std::string ReadableName(const char* linkerName);
 
-// The same, cut to what fits a line of a report.
-std::string ShortName(const char* linkerName);
-
 }  // namespace recorder
 
 #endif

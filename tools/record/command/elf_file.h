@@ -1,5 +1,5 @@
 // An ELF file of this machine's class, mapped and read with every offset checked: what the command looks at
-// before a run, and where the preload library finds the names of functions.
+// before a run.
 #ifndef ZANBASE_RECORD_ELF_FILE_H
 #define ZANBASE_RECORD_ELF_FILE_H
 
@@ -23,12 +23,7 @@ public:
 
     bool ok() const { return mpoHeader != nullptr; }
 
-    // The file in memory; private to this process, so a reader may write to it.
-    char* Image() const { return mpcImage; }
-    std::size_t ImageBytes() const { return mnImageBytes; }
-
     bool HasInterpreter() const;
-    bool HasSection(const char* name) const;
 
     // The names of the libraries that the file is linked against.
     std::vector<std::string> NeededLibraries() const;
@@ -37,9 +32,6 @@ public:
     // leaves out those that the loader doesn't see.
     void ForEachFunction(bool dynamicOnly,
                          const std::function<void(const char*, std::uint64_t, std::uint64_t)>& use) const;
-
-    // What to add to an address of the file, if its byte `offset` was mapped at `start`.
-    std::uint64_t Bias(std::uint64_t start, std::uint64_t offset) const;
 
 private:
     // `count` objects at `offset`, or null if they are not all in the file or not aligned.

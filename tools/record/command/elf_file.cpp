@@ -6,25 +6,23 @@
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
-#include <sys/syscall.h>
 #include <unistd.h>
 
 namespace recorder {
 
-// By system calls of its own: the preload library must not record them.
 ElfFile::ElfFile(const char* path) {
-    const auto file = static_cast<int>(syscall(SYS_openat, AT_FDCWD, path, O_RDONLY | O_CLOEXEC));
+    const int file = open(path, O_RDONLY | O_CLOEXEC);
     if (file < 0) return;
     struct stat status {};
     if (fstat(file, &status) == 0 && S_ISREG(status.st_mode) && status.st_size > 0) {
         const auto size = static_cast<std::size_t>(status.st_size);
-        void* const image = mmap(nullptr, size, PROT_READ | PROT_WRITE, MAP_PRIVATE, file, 0);
+        void* const image = mmap(nullptr, size, PROT_READ, MAP_PRIVATE, file, 0);
         if (image != MAP_FAILED) {
             mpcImage = static_cast<char*>(image);
             mnImageBytes = size;
         }
     }
-    syscall(SYS_close, file);
+    close(file);
     const auto* const header = At<Elf64_Ehdr>(0);
     if (header == nullptr || std::memcmp(header->e_ident, ELFMAG, SELFMAG) != 0 ||
         header->e_ident[EI_CLASS] != ELFCLASS64 || header->e_shentsize != sizeof(Elf64_Shdr))
@@ -69,14 +67,6 @@ bool ElfFile::HasInterpreter() const {
     return false;
 }
 
-bool ElfFile::HasSection(const char* name) const {
-    const Elf64_Shdr* const sections = Sections();
-    if (sections == nullptr || mpoHeader->e_shstrndx >= mpoHeader->e_shnum) return false;
-    for (unsigned int i = 0; i < mpoHeader->e_shnum; ++i)
-        if (std::strcmp(TextAt(sections[mpoHeader->e_shstrndx], sections[i].sh_name), name) == 0) return true;
-    return false;
-}
-
 std::vector<std::string> ElfFile::NeededLibraries() const {
     std::vector<std::string> libraries;
     const Elf64_Shdr* const dynamic = FindSection(SHT_DYNAMIC);
@@ -101,18 +91,6 @@ void ElfFile::ForEachFunction(
         if (all[i].st_shndx != SHN_UNDEF && (type == STT_FUNC || type == STT_GNU_IFUNC))
             use(TextAt(Sections()[symbols->sh_link], all[i].st_name), all[i].st_value, all[i].st_size);
     }
-}
-
-std::uint64_t ElfFile::Bias(std::uint64_t start, std::uint64_t offset) const {
-    const Elf64_Phdr* const segments = Segments();
-    constexpr std::uint64_t kPageMask = 4095;
-    for (unsigned int i = 0; segments != nullptr && i < mpoHeader->e_phnum; ++i) {
-        const Elf64_Phdr& segment = segments[i];
-        if (segment.p_type == PT_LOAD && offset + kPageMask >= segment.p_offset &&
-            offset < segment.p_offset + segment.p_filesz && (segment.p_flags & PF_X) != 0)
-            return start - (segment.p_vaddr - segment.p_offset + offset);
-    }
-    return start - offset;
 }
 
 }  // namespace recorder
