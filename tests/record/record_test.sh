@@ -64,6 +64,10 @@ options) # comparison, budgets, a report on a signal, children, an allocator beh
         ./small leak 10
     expect 3 "$record" --output report --max-leaked 159 ./small leak 10
     says 'bytes leaked: 160 exceed the budget of 159; most: .*/small\.c:[0-9]* (160)'
+    # What the C library keeps for a stream is no leak, nor is what the user has named.
+    expect 0 "$record" --output report --max-leaked 0 ./small print
+    echo 'leak:mai*' >suppressed
+    expect 0 "$record" --output report --suppress suppressed --max-leaked 0 ./small leak 10
     expect 7 "$record" --output report --max-calls 0 ./small status 7
 
     # The program waits until the report that it asks for is there, while it makes no call that is recorded.

@@ -122,6 +122,7 @@ int main(int count, char** words) {
     const int number = count > 2 ? atoi(words[2]) : 0;
     if (strcmp(what, "leak") == 0)
         for (int i = 0; i < number; ++i) gSink = malloc(16);
+    if (strcmp(what, "print") == 0) puts("printed");
     if (strcmp(what, "one") == 0) gSink = malloc(1000);
     if (strcmp(what, "status") == 0) return gSink = malloc(1), number;
     if (strcmp(what, "threads") == 0) Threads(number);

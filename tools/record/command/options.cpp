@@ -7,6 +7,7 @@
 #include <csignal>
 #include <cstdlib>
 #include <cstring>
+#include <fstream>
 #include <limits>
 #include <utility>
 
@@ -65,6 +66,20 @@ std::string AbsolutePath(const std::string& path) {
     return absolute;
 }
 
+// Lines "leak:PATTERN", as the leak sanitizer reads them; "#" begins a comment.
+void ReadSuppressions(const std::string& path, std::vector<std::string>& patterns) {
+    constexpr char kStart[] = "leak:";
+    std::ifstream file(path);
+    if (!file) throw UsageError("cannot read " + path);
+    for (std::string line; std::getline(file, line);) {
+        line.erase(line.find_last_not_of(" \t\r") + 1);
+        if (line.empty() || line[0] == '#') continue;
+        if (line.compare(0, 5, kStart) != 0 || line.size() == 5)
+            throw UsageError(path + " has a line that does not begin with leak: and a name: " + line);
+        patterns.push_back(line.substr(5));
+    }
+}
+
 void SetFormat(RunOptions& options, Format format) {
     if (options.format != Format::kTables && options.format != format)
         throw UsageError("a report has one form: --json, --csv or --folded");
@@ -110,6 +125,9 @@ const std::array kOptions{
            [](RunOptions& o, Value value) { o.skipped.push_back(value); }},
     Option{"debuginfod", 0, nullptr, "get missing debug information from the servers of DEBUGINFOD_URLS",
            [](RunOptions& o, Value) { o.debuginfod = true; }},
+    Option{"suppress", 0, "FILE",
+           "leave out leaks of the functions, files and modules in FILE (lines leak:NAME)",
+           [](RunOptions& o, Value value) { ReadSuppressions(value, o.suppressed); }},
     Option{"max-leaked", 0, "BYTES", "budget for bytes that are not freed, with K, M and G as units",
            [](RunOptions& o, Value value) { o.budgets.leaked_bytes = ReadAmount("max-leaked", value); }},
     Option{"max-peak", 0, "BYTES", "budget for bytes that are live at once",
@@ -172,7 +190,9 @@ RunOptions ReadRunOptions(const std::vector<std::string>& words) {
         options.memory = true;
         options.disk = true;
     }
-    if (options.format == Format::kFolded && options.callers == 0) options.callers = kLargestStack;
+    // A suppressed name may be that of any caller.
+    if (options.callers == 0 && (options.format == Format::kFolded || !options.suppressed.empty()))
+        options.callers = kLargestStack;
     if (options.program.empty() && !options.help && !options.version)
         throw UsageError("no program to run; try --help");
     return options;

@@ -36,10 +36,11 @@ struct RunOptions {
     bool disk = true;
     bool follow = false;
     bool debuginfod = false;
-    int callers = 0;                   // that are recorded behind each call site
-    int signal = 0;                    // at which a report is made; SIGUSR1 if it is 0
-    double every = 0;                  // seconds between reports; 0 for none
-    std::vector<std::string> skipped;  // functions that are credited to their callers
+    int callers = 0;                      // that are recorded behind each call site
+    int signal = 0;                       // at which a report is made; SIGUSR1 if it is 0
+    double every = 0;                     // seconds between reports; 0 for none
+    std::vector<std::string> skipped;     // functions that are credited to their callers
+    std::vector<std::string> suppressed;  // functions, files or modules whose leaks are meant
     Budgets budgets;
     bool help = false;
     bool version = false;

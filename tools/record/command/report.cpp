@@ -84,6 +84,7 @@ std::vector<std::string> FramesOf(const RecordedProcess& process, NodeId node, c
 void TakeMemory(const RunOptions& options, Symbolizer& symbolizer, Report& report) {
     std::map<std::pair<std::string, int>, std::pair<HMemorySnapshot::Row, StackFigures>> rows;
     std::map<std::vector<std::string>, StackFigures> stacks;
+    std::map<std::pair<std::string, int>, long long> kept;
     for (const RecordedProcess* const process : report.processes) {
         for (const StackUsage& usage : process->account.usage) {
             Site site = process->stacks.SiteOf(usage.node, process->account, symbolizer);
@@ -92,6 +93,10 @@ void TakeMemory(const RunOptions& options, Symbolizer& symbolizer, Report& repor
             row.moFile = std::move(site.file);
             Add(row, usage);
             figures.Add(usage);
+            const long long live = Signed(usage.allocated - usage.freed);
+            if (live > 0 &&
+                process->stacks.IsKept(usage.node, process->account, symbolizer, options.suppressed))
+                kept[{row.moFile, row.mnLine}] += live;
             if (options.callers > 0) stacks[FramesOf(*process, usage.node, options, symbolizer)].Add(usage);
         }
         report.memory.mnTotal += Signed(process->account.total);
@@ -100,6 +105,12 @@ void TakeMemory(const RunOptions& options, Symbolizer& symbolizer, Report& repor
     for (auto& [key, row] : rows) {
         report.memory.maRows.push_back(std::move(row.first));
         report.sites.push_back(row.second);
+    }
+    report.leaks = report.memory;
+    for (HMemorySnapshot::Row& row : report.leaks.maRows) {
+        const long long bytes = kept[{row.moFile, row.mnLine}];
+        row.mnLiveBytes -= bytes;
+        report.leaks.mnTotal -= bytes;
     }
     for (auto& [frames, figures] : stacks) report.stacks.push_back({frames, figures});
     std::stable_sort(report.stacks.begin(), report.stacks.end(), [](const auto& one, const auto& other) {
@@ -363,6 +374,9 @@ std::vector<std::string> NotesOf(const Report& report, const Symbolizer& symboli
     if (files != 0) notes.push_back("memory ran out; opens that were not recorded: " + std::to_string(files));
     if (streams_unseen && options.disk)
         notes.emplace_back("this C library's streams can't be recorded; of those, opens are counted only");
+    if (options.memory && report.leaks.mnTotal != report.memory.mnTotal)
+        notes.push_back("live bytes that the runtimes keep or that are suppressed: " +
+                        std::to_string(report.memory.mnTotal - report.leaks.mnTotal));
     if (options.memory && !symbolizer.ModulesWithoutLines().empty()) {
         std::string note = "no debug information for:";
         for (const std::string& name : symbolizer.ModulesWithoutLines()) note += " " + name;

@@ -45,6 +45,7 @@ struct Report {
     HDiskIOSnapshot disk;
     std::vector<StackFigures> sites;  // beside the rows of `memory`
     std::vector<ReportedStack> stacks;
+    HMemorySnapshot leaks;  // `memory` without what stays allocated on purpose
     std::vector<std::string> notes;
 };
 

@@ -152,7 +152,7 @@ bool Session::MakeReports() {
         for (const RecordedProcess* const process : processes)
             reports.push_back(MakeReport({process}, moOptions, moSymbolizer));
     reports.push_back(MakeReport(processes, moOptions, moSymbolizer));
-    if (mbEnded) moBroken = BrokenBudgets(moOptions.budgets, reports.back().memory, reports.back().disk);
+    if (mbEnded) moBroken = BrokenBudgets(moOptions.budgets, reports.back().leaks, reports.back().disk);
     return WriteReports(reports);
 }
 

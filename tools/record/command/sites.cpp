@@ -28,6 +28,19 @@ std::string HexText(std::uint64_t number) {
     return text.data();
 }
 
+// The loader and the functions of the C library that allocate for as long as the process lives.
+bool IsRuntimeOwner(const AddressInfo& info) {
+    for (const char* name : {"libc.so.6!_IO_file_doallocate", "libc.so.6!_IO_wfile_doallocate"})
+        if (info.name == name) return true;
+    return info.name.compare(0, 8, "ld-linux") == 0;
+}
+
+bool Matches(const std::vector<std::string>& patterns, const std::string& name) {
+    return !name.empty() && std::any_of(patterns.begin(), patterns.end(), [&](const std::string& pattern) {
+        return fnmatch(("*" + pattern + "*").c_str(), name.c_str(), 0) == 0;
+    });
+}
+
 }  // namespace
 
 // The file of a module, opened when something of it is to be named.
@@ -133,6 +146,20 @@ Site StackSites::SiteOf(NodeId node, const ProcessAccount& account, Symbolizer& 
     const AddressInfo& info = symbolizer.InfoOf(account, account.nodes[site].address);
     if (!is_credited || info.places[info.credited].file.empty()) return {info.name, 0};
     return {info.places[info.credited].file, static_cast<int>(info.places[info.credited].line)};
+}
+
+bool StackSites::IsKept(NodeId node, const ProcessAccount& account, Symbolizer& symbolizer,
+                        const std::vector<std::string>& suppressed) const {
+    const NodeId credited = CreditedNode(node);
+    if (credited == 0) return true;
+    for (NodeId at = node; at != 0; at = account.nodes[at].parent) {
+        const AddressInfo& info = symbolizer.InfoOf(account, account.nodes[at].address);
+        if (at < credited && IsRuntimeOwner(info)) return true;
+        if (Matches(suppressed, info.name)) return true;
+        for (const SourcePlace& place : info.places)
+            if (Matches(suppressed, place.function) || Matches(suppressed, place.file)) return true;
+    }
+    return false;
 }
 
 }  // namespace recorder

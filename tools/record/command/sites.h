@@ -67,6 +67,11 @@ public:
     // The site of a stack: that of its first frame if none is credited.
     Site SiteOf(NodeId node, const ProcessAccount& account, Symbolizer& symbolizer) const;
 
+    // True if the block of such a stack stays allocated on purpose: it is the runtimes' own (buffers of streams, the
+    // loader's lists, the pool for exceptions), or a frame has a name that `suppressed` holds.
+    bool IsKept(NodeId node, const ProcessAccount& account, Symbolizer& symbolizer,
+                const std::vector<std::string>& suppressed) const;
+
     // The node of the stack whose last frame is credited; 0 if there is none.
     NodeId CreditedNode(NodeId node) const { return node < maCredited.size() ? maCredited[node] : 0; }
 
