@@ -57,6 +57,12 @@ options) # comparison, budgets, a report on a signal, children, an allocator beh
     expect 1 "$record" compare a.json b.json
     says '^grew  *+320  *+320  *+20  .*/small\.c:[0-9]*$' out
     expect 0 "$record" compare --tolerance 1000 a.json b.json
+    # A line above changes nothing.
+    (echo && cat "$here/small.c") >moved.c
+    "$@" -x c - -o moved < <(echo "#line 1 \"$here/small.c\"" && cat moved.c)
+    expect 0 "$record" --json --output moved.json ./moved leak 10
+    expect 0 "$record" compare a.json moved.json
+    grep -q '^new' out && fail "a comment makes a row new"
     expect 2 "$record" compare a.json missing.json
     says missing.json
 

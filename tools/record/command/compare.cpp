@@ -6,6 +6,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <map>
+#include <set>
 #include <vector>
 
 namespace recorder {
@@ -16,10 +17,37 @@ constexpr std::size_t kFigures = 3;
 using Figures = std::array<long long, kFigures>;
 using Rows = std::map<std::string, Figures>;
 
-Rows MemoryRows(const HMemorySnapshot& memory) {
+// Names of rows by place, and the names themselves, as the later report has them.
+struct LaterNames {
+    std::map<std::string, std::string> by_place;
+    std::set<std::string> all;
+};
+
+std::string NameOf(const HMemorySnapshot::Row& row) {
+    return row.mnLine != 0 ? row.moFile + ":" + std::to_string(row.mnLine) : row.moFile;
+}
+
+LaterNames NamesOf(const Accounts& later) {
+    LaterNames names;
+    for (std::size_t i = 0; i < later.memory.maRows.size(); ++i) {
+        names.by_place[later.places[i]] = NameOf(later.memory.maRows[i]);
+        names.all.insert(NameOf(later.memory.maRows[i]));
+    }
+    names.by_place.erase("");
+    return names;
+}
+
+// Lines above a function may have come or gone, so rows of one place in one function belong together.
+Rows MemoryRows(const Accounts& accounts, const LaterNames& names) {
     Rows rows;
-    for (const HMemorySnapshot::Row& row : memory.maRows) {
-        Figures& figures = rows[row.mnLine != 0 ? row.moFile + ":" + std::to_string(row.mnLine) : row.moFile];
+    for (std::size_t i = 0; i < accounts.memory.maRows.size(); ++i) {
+        const HMemorySnapshot::Row& row = accounts.memory.maRows[i];
+        const auto later = names.by_place.find(accounts.places[i]);
+        std::string name = later != names.by_place.end() ? later->second : NameOf(row);
+        // Another function has that line now.
+        if (later == names.by_place.end() && !accounts.places[i].empty() && names.all.count(name) != 0)
+            name += " (earlier)";
+        Figures& figures = rows[name];
         figures[0] += row.mnLiveBytes;
         figures[1] += row.mnAllocated;
         figures[2] += row.mnAllocCount;
@@ -103,8 +131,11 @@ void CompareRows(const char* heading, const Rows& earlier, const Rows& later, do
 
 Comparison Compare(const Accounts& earlier, const Accounts& later, double tolerance) {
     Comparison comparison{};
-    CompareRows("memory       live bytes      allocated       calls\n", MemoryRows(earlier.memory),
-                MemoryRows(later.memory), tolerance, comparison);
+    const LaterNames names = NamesOf(later);
+    if (!earlier.run.empty() || !later.run.empty())
+        comparison.text = "earlier: " + earlier.run + "\nlater:   " + later.run + "\n\n";
+    CompareRows("memory       live bytes      allocated       calls\n", MemoryRows(earlier, names),
+                MemoryRows(later, names), tolerance, comparison);
     const long long before = earlier.memory.mnPeak;
     const long long after = later.memory.mnPeak;
     comparison.text += "peak    " + std::to_string(before) + " before, " + std::to_string(after) + " after\n";

@@ -3,6 +3,7 @@
 #define ZANBASE_RECORD_COMPARE_H
 
 #include <string>
+#include <vector>
 
 #include "options.h"
 #include "zanbase/snapshot.h"
@@ -12,7 +13,9 @@ namespace recorder {
 // Both accounts of one report.
 struct Accounts {
     HMemorySnapshot memory;
+    std::vector<std::string> places;  // of memory's rows: file, function and line in it; empty if not known
     HDiskIOSnapshot disk;
+    std::string run;  // what the report says of the program; may be empty
 };
 
 // Reads a report. Throws std::runtime_error, whose text names the file.

@@ -82,17 +82,18 @@ std::vector<std::string> FramesOf(const RecordedProcess& process, NodeId node, c
 
 // Many stacks can stand for one line.
 void TakeMemory(const RunOptions& options, Symbolizer& symbolizer, Report& report) {
-    std::map<std::pair<std::string, int>, std::pair<HMemorySnapshot::Row, StackFigures>> rows;
+    std::map<std::pair<std::string, int>, std::pair<HMemorySnapshot::Row, RowDetails>> rows;
     std::map<std::vector<std::string>, StackFigures> stacks;
     std::map<std::pair<std::string, int>, long long> kept;
     for (const RecordedProcess* const process : report.processes) {
         for (const StackUsage& usage : process->account.usage) {
             Site site = process->stacks.SiteOf(usage.node, process->account, symbolizer);
-            auto& [row, figures] = rows[{site.file, site.line}];
+            auto& [row, details] = rows[{site.file, site.line}];
             row.mnLine = site.line;
-            row.moFile = std::move(site.file);
+            row.moFile = site.file;
             Add(row, usage);
-            figures.Add(usage);
+            details.figures.Add(usage);
+            details.site = std::move(site);
             const long long live = Signed(usage.allocated - usage.freed);
             if (live > 0 &&
                 process->stacks.IsKept(usage.node, process->account, symbolizer, options.suppressed))
@@ -104,7 +105,7 @@ void TakeMemory(const RunOptions& options, Symbolizer& symbolizer, Report& repor
     }
     for (auto& [key, row] : rows) {
         report.memory.maRows.push_back(std::move(row.first));
-        report.sites.push_back(row.second);
+        report.sites.push_back(std::move(row.second));
     }
     report.leaks = report.memory;
     for (HMemorySnapshot::Row& row : report.leaks.maRows) {
@@ -209,10 +210,10 @@ double ShareOf(long long part, long long whole) {
 std::string PeakTable(const Report& report) {
     std::vector<std::size_t> order;
     for (std::size_t i = 0; i < report.sites.size(); ++i)
-        if (report.sites[i].at_peak > 0 || report.sites[i].temporary > 0) order.push_back(i);
+        if (report.sites[i].figures.at_peak > 0 || report.sites[i].figures.temporary > 0) order.push_back(i);
     std::stable_sort(order.begin(), order.end(), [&](std::size_t one, std::size_t other) {
-        const StackFigures& left = report.sites[one];
-        const StackFigures& right = report.sites[other];
+        const StackFigures& left = report.sites[one].figures;
+        const StackFigures& right = report.sites[other].figures;
         return std::pair(left.at_peak, left.temporary) > std::pair(right.at_peak, right.temporary);
     });
     if (order.empty()) return {};
@@ -220,7 +221,7 @@ std::string PeakTable(const Report& report) {
         "\nLive at the peak, and blocks that were freed before the next allocation:\n"
         "         bytes   share     blocks   share  call site\n";
     for (std::size_t i = 0; i < std::min(kListed, order.size()); ++i) {
-        const StackFigures& figures = report.sites[order[i]];
+        const StackFigures& figures = report.sites[order[i]].figures;
         text += FormatText("  %12lld %6.1f%% %10lld %6.1f%%  ", figures.at_peak,
                            ShareOf(figures.at_peak, report.memory.mnPeak), figures.temporary,
                            ShareOf(figures.temporary, figures.calls)) +
@@ -321,8 +322,12 @@ Json ReportJson(const Report& report, const RunOptions& options) {
     if (!options.memory) return json;
     Json& rows = json["memory"]["rows"];
     for (std::size_t i = 0; i < rows.size(); ++i) {
-        rows[i]["at_peak"] = report.sites[i].at_peak;
-        rows[i]["temporary"] = report.sites[i].temporary;
+        const auto& [site, figures] = report.sites[i];
+        rows[i]["at_peak"] = figures.at_peak;
+        rows[i]["temporary"] = figures.temporary;
+        if (site.function.empty()) continue;
+        rows[i]["function"] = site.function;
+        rows[i]["function_line"] = site.function_line;
     }
     for (const ReportedStack& stack : report.stacks) {
         Json entry = FiguresJson(stack.figures);

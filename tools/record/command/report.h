@@ -33,6 +33,12 @@ struct StackFigures {
     void Add(const StackUsage& usage);
 };
 
+// What a row has beside what the library's snapshot of it has.
+struct RowDetails {
+    Site site;
+    StackFigures figures;
+};
+
 // The frames of a stack from the one that is credited on, its callers after it.
 struct ReportedStack {
     std::vector<std::string> frames;
@@ -43,7 +49,7 @@ struct Report {
     std::vector<const RecordedProcess*> processes;  // more than one for a sum
     HMemorySnapshot memory;
     HDiskIOSnapshot disk;
-    std::vector<StackFigures> sites;  // beside the rows of `memory`
+    std::vector<RowDetails> sites;  // beside the rows of `memory`
     std::vector<ReportedStack> stacks;
     HMemorySnapshot leaks;  // `memory` without what stays allocated on purpose
     std::vector<std::string> notes;

@@ -140,12 +140,13 @@ std::vector<NodeId> StackSites::Update(const ProcessAccount& account, Symbolizer
 }
 
 Site StackSites::SiteOf(NodeId node, const ProcessAccount& account, Symbolizer& symbolizer) const {
-    if (node == 0 || node >= maCredited.size()) return {"(memory ran out)", 0};
+    if (node == 0 || node >= maCredited.size()) return {"(memory ran out)", 0, {}, 0};
     const bool is_credited = maCredited[node] != 0;
     const NodeId site = is_credited ? maCredited[node] : maFirst[node];
     const AddressInfo& info = symbolizer.InfoOf(account, account.nodes[site].address);
-    if (!is_credited || info.places[info.credited].file.empty()) return {info.name, 0};
-    return {info.places[info.credited].file, static_cast<int>(info.places[info.credited].line)};
+    if (!is_credited || info.places[info.credited].file.empty()) return {info.name, 0, {}, 0};
+    const SourcePlace& place = info.places[info.credited];
+    return {place.file, static_cast<int>(place.line), place.function, place.function_line};
 }
 
 bool StackSites::IsKept(NodeId node, const ProcessAccount& account, Symbolizer& symbolizer,

@@ -25,6 +25,8 @@ struct AddressInfo {
 struct Site {
     std::string file;
     int line;
+    std::string function;   // that has the line; empty if it is not known
+    int function_line = 0;  // where that is declared
 };
 
 // Symbolizes addresses, each once, whichever processes have it.

@@ -214,6 +214,7 @@ std::vector<SourcePlace> SourceLines::PlacesAt(std::uint64_t address, const Skip
         places.back().line = static_cast<unsigned int>(number);
         for (Dwarf_Die& function : FunctionsAt(&unit, place)) {
             NamePlace(places.back(), NameOf(&function), skips);
+            dwarf_decl_line(&function, &places.back().function_line);
             if (dwarf_tag(&function) == DW_TAG_subprogram) break;
             places.push_back(CallOf(&unit, &function));
         }

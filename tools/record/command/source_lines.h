@@ -16,6 +16,7 @@ struct SourcePlace {
     std::string function;  // as people read it; empty if it is not known
     std::string file;      // absolute if the debug information knows the folder; empty if it is not known
     unsigned int line = 0;
+    int function_line = 0;    // where the function is declared; 0 if that is not known
     bool is_skipped = false;  // what the function allocates is credited to its caller
 };
 
