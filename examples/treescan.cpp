@@ -17,6 +17,7 @@
 #include <filesystem>
 #include <map>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include <unistd.h>
@@ -54,9 +55,9 @@ struct Counts {
 
 std::atomic<unsigned long long> unreadable{0};
 
-void TellUnreadable(const std::string& path) {
+void TellUnreadable(std::string_view path) {
     ++unreadable;
-    std::fprintf(stderr, "treescan: cannot read %s\n", path.c_str());
+    std::fprintf(stderr, "treescan: cannot read %.*s\n", static_cast<int>(path.size()), path.data());
 }
 
 // Collects the regular files below `dir` into `files`; symbolic links are not followed.
@@ -86,13 +87,13 @@ unsigned long long CountLines(const char* text, std::size_t size) {
     return lines;
 }
 
-using Block = std::array<char, 256 * 1024>;
+using Block = std::array<char, std::size_t{256} * 1024>;
 
 // Reads one file to its end through `block` and fills in what was found.
 void Read(File& file, Block& block) {
     std::error_code error;
     HRecordedFile stream = HRecordedFile::Open(file.path.c_str(), "rb", error);
-    if (error) return TellUnreadable(file.path.c_str());
+    if (error) return TellUnreadable(file.path);
     std::setvbuf(stream.GetNative(), nullptr, _IONBF, 0);
     std::size_t size = block.size();
     while (size == block.size()) {
@@ -100,7 +101,7 @@ void Read(File& file, Block& block) {
         file.bytes += size;
         file.lines += CountLines(block.data(), size);
     }
-    if (error) TellUnreadable(file.path.c_str());
+    if (error) TellUnreadable(file.path);
 }
 
 void ShowProgress(std::size_t done, std::size_t all) {
@@ -215,7 +216,8 @@ int main(int, char** argv) {
                  stopwatch.GetTimeAsString().c_str(), unreadable.load());
 
     HDiskIOSummaryReport(stdout);
-    for (std::size_t i = largest; i < files.size(); ++i) HDiskIOReportFile(stdout, files[i]->path.c_str());
+    for (std::size_t i = largest; i < files.size(); ++i)
+        HDiskIOReportFile(stdout, std::string(std::string_view(files[i]->path)));
     for (std::size_t i = largest; options.leak && i < files.size(); ++i)
         static_cast<void>(files[i].release());
     files.clear();

@@ -43,13 +43,14 @@ def read(path, pages={}):
     return pages[path]
 
 
-# Doxygen links the list of a class's nested classes also where all of them are private, and makes none then.
-IGNORED = "#nested-classes"
+# Doxygen links these lists also where it shows none of their entries, and makes none then: nested classes that are private,
+# macros without a comment.
+IGNORED = "#nested-classes", "#define-members"
 
 
 def dead_links(path):
     for link in read(path)[0]:
-        if link == IGNORED and path.suffix == ".html":
+        if link in IGNORED and path.suffix == ".html":
             continue
         parts = urllib.parse.urlsplit(link)
         if parts.scheme or parts.netloc:

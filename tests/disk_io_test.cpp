@@ -15,7 +15,7 @@
 namespace {
 
 char handles[128];
-void* At(char handle) { return &handles[static_cast<int>(handle)]; }
+void* At(char handle) { return &handles[static_cast<unsigned char>(handle)]; }
 
 // "o1a" opens handle 1 of file a, "m1a" maps it; r, w, s and c with a handle read 3 bytes, write 5, seek and
 // close; { and } push and pop, ! resets, ? asks for a name.

@@ -38,8 +38,8 @@ public:
         for (const auto& [address, block] : *mpoMemoryMap) {
             HMemorySiteData& row = RowOf({block.mpcFile, block.mnLine});
             ++row.mnLiveBlocks;
-            row.mnLiveBytes =
-                static_cast<long long>(static_cast<std::size_t>(row.mnLiveBytes) + block.mnSize);
+            const std::size_t live_bytes = static_cast<std::size_t>(row.mnLiveBytes) + block.mnSize;
+            row.mnLiveBytes = static_cast<long long>(live_bytes);
         }
         for (HMemorySiteData& row : moTaken.maRows) {
             const auto [text, is_new] = moTexts.try_emplace(row.moFile.mpcBytes, moTaken.maTexts.size());
@@ -101,9 +101,10 @@ private:
         std::sort(order.begin(), order.end(),
                   [&](std::uint32_t left, std::uint32_t right) { return texts[left] < texts[right]; });
         std::vector<std::uint32_t> ranks(texts.size());
-        for (std::size_t place = 1; place < order.size(); ++place)
+        for (std::size_t place = 1; place < order.size(); ++place) {
             ranks[order[place]] =
                 ranks[order[place - 1]] + (texts[order[place - 1]] != texts[order[place]] ? 1U : 0U);
+        }
         return ranks;
     }
 

@@ -111,8 +111,10 @@ public:
     /// Room for `count` objects.
     [[nodiscard]] T* allocate(size_type count) {
         // Where the product would overflow, the upstream throws.
+        const std::size_t bytes =
+            count * sizeof(T);  // NOLINT(bugprone-sizeof-expression): T may be a pointer
         return HTrackedAllocation(
-            count * sizeof(T), moSite, [&] { return Traits::allocate(moUpstream, count); },
+            bytes, moSite, [&] { return Traits::allocate(moUpstream, count); },
             [&](T* block) { Traits::deallocate(moUpstream, block, count); });
     }
     /// Gives the room back.
