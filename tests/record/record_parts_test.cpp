@@ -125,6 +125,7 @@ TEST(RecordBlockTable, KnowsWhatWasLiveAtThePeakByStack) {
 TEST(RecordAccountFile, IsReadWhateverIsWrongInIt) {
     Fixture& fixture = Fixture::Get();
     recorder::AddBlock(*fixture.account, BlockAt(64), 10, 1);
+    ASSERT_EQ(fixture.file.Accounts().size(), 1U);  // maps all of the file
     const std::size_t bytes = fixture.file.control().end;
     struct Release {
         void operator()(char* image) const { ::operator delete(image, std::align_val_t(4096)); }
