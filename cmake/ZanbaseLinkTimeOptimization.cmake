@@ -4,10 +4,10 @@
 
 include(CheckIPOSupported)
 
-# Optimises `library`, which is made of the objects of `objects`, as a whole. Other users of the objects link
-# `others`: they take the machine code where the compiler writes both forms, because to optimise each test takes longer
+# Optimises `library`, which is made of the objects of the targets that follow, as a whole. Other users of the objects
+# link `others`: they take the machine code where the compiler writes both forms, because to optimise each test takes longer
 # than to build it.
-function(zanbase_optimise_at_link library objects others)
+function(zanbase_optimise_at_link library others)
     if(DEFINED CMAKE_INTERPROCEDURAL_OPTIMIZATION OR CMAKE_CXX_FLAGS MATCHES "-fsanitize|--coverage")
         return()
     endif()
@@ -16,12 +16,14 @@ function(zanbase_optimise_at_link library objects others)
         return()
     endif()
     foreach(configuration IN ITEMS RELEASE RELWITHDEBINFO MINSIZEREL)
-        set_property(TARGET ${objects} ${library} PROPERTY INTERPROCEDURAL_OPTIMIZATION_${configuration} ON)
+        set_property(TARGET ${ARGN} ${library} PROPERTY INTERPROCEDURAL_OPTIMIZATION_${configuration} ON)
     endforeach()
     set(optimised $<CONFIG:Release,RelWithDebInfo,MinSizeRel>)
     if(CMAKE_CXX_COMPILER_ID STREQUAL GNU)
         set(whole $<BOOL:$<TARGET_PROPERTY:INTERPROCEDURAL_OPTIMIZATION_RELEASE>>)
-        target_compile_options(${objects} PRIVATE $<${optimised}:-ffat-lto-objects>)
+        foreach(objects IN LISTS ARGN)
+            target_compile_options(${objects} PRIVATE $<${optimised}:-ffat-lto-objects>)
+        endforeach()
         # In one piece: it is small, routines in assembly may not be apart from their users, and g++ 12 for Windows
         # fails on several.
         target_link_options(${library} PRIVATE $<${optimised}:-flto-partition=one>)
