@@ -20,21 +20,29 @@ struct TrackerAccess : HMemory {
     using HMemory::moMutex;
 };
 
-// Constructs the object in static storage, which outlives every static object.
-template <class T, int number = 0>
-T& BuildForever() {
-    alignas(T) static unsigned char storage[sizeof(T)];
-    return *new (storage) T;
-}
+// Has no destructor, so the object in it works until the process has ended.
+template <class T>
+class NoDestructor {
+public:
+    NoDestructor() { new (maStorage) T; }
+    T& Get() { return *std::launder(reinterpret_cast<T*>(maStorage)); }
+
+private:
+    alignas(T) unsigned char maStorage[sizeof(T)];
+};
+
+NoDestructor<HMutex> goDiskIOMutex, goGrowthMutex;
+NoDestructor<MessageCatalogue> goCatalogue;
+NoDestructor<NameRing> goRing;
 
 }  // namespace
 
 const HMutex* const gpoLastingMutex = &TrackerAccess::moMutex;
 HMutex HMemory::moMutex;
-const HMutex* const mpoDiskIOMutex = &BuildForever<HMutex, 0>();
-HMutex& goTimerGrowthMutex = BuildForever<HMutex, 1>();
-MessageCatalogue& goMessageCatalogue = BuildForever<MessageCatalogue>();
-NameRing& goNameRing = BuildForever<NameRing>();
+const HMutex* const mpoDiskIOMutex = &goDiskIOMutex.Get();
+HMutex& goTimerGrowthMutex = goGrowthMutex.Get();
+MessageCatalogue& goMessageCatalogue = goCatalogue.Get();
+NameRing& goNameRing = goRing.Get();
 
 namespace {
 
