@@ -25,7 +25,7 @@
 
 #include "platform/linux/futex.h"
 #include "platform/thread.h"
-#include "platform/thread_annotations.h"
+#include "zanbase/thread_annotations.h"
 
 // The lock for all blocks and lists. It is held for a few instructions and only while kills are deferred, so
 // no thread is killed while it holds the lock or waits for it.
