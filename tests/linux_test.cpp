@@ -169,13 +169,7 @@ TEST(LinuxGuard, KeepsTheRoundingAndForgetsTheExceptionsOfTheBody) {
 
 TEST(LinuxGuard, ForwardsTheWakeUpsOfAnAbandonedBody) {
     static FutexWord word{0};
-    std::atomic<unsigned int> number{0};
-    std::thread sleeper([&] {
-        number = CurrentThreadId();
-        SleepWhile(word, 0, nullptr);
-    });
-    while (number == 0) YieldThread();
-    AwaitSleepOf(number);
+    std::thread sleeper = SleepIn([] { SleepWhile(word, 0, nullptr); });
     const auto body = [](void*) {
         const PendingWakeup pending(word);
         word = 1;

@@ -121,13 +121,7 @@ TEST(HThread, IsKilledWhenItsSignalComesThrough) {
         Runner runner(run);
         runner.Start(true);
         entered.Lock();
-        std::atomic<unsigned long long> number{0};
-        std::thread killer([&] {
-            number = HThread::GetCurrentThreadId();
-            runner.Kill();
-        });
-        while (number == 0) std::this_thread::yield();
-        AwaitSleepOf(number);
+        std::thread killer = SleepIn([&] { runner.Kill(); });
         EXPECT_TRUE(runner.IsRunning());
         leave.Unlock();
         killer.join();
@@ -161,7 +155,7 @@ TEST(HThread, TakesItsPriorityWheneverItIsSet) {
         number = static_cast<id_t>(HThread::GetCurrentThreadId());
         leave.Lock();
     });
-    for (unsigned int value = 0; value < std::size(nices); ++value) {  // the last two are no priorities
+    for (unsigned int value = 0; value < std::size(nices); ++value) {  // the last two are not priorities
         const auto priority = static_cast<HThreadPriority>(value);
         const int due = may_raise ? nices[value] : std::clamp(own + nices[value], own, 19);
         for (const bool is_set_before : {true, false}) {

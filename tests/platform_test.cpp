@@ -28,19 +28,6 @@ extern "C" const char* __lsan_default_suppressions() { return "leak:__cxa_thread
 
 namespace {
 
-// Runs `body` on another thread and returns once that thread sleeps in it.
-template <class Body>
-std::thread SleepIn(Body body) {
-    std::atomic<unsigned int> id{0};
-    std::thread thread([&id, body] {
-        id = CurrentThreadId();
-        body();
-    });
-    while (id == 0) std::this_thread::yield();
-    AwaitSleepOf(id);
-    return thread;
-}
-
 bool IsFreeForOthers(HNativeLock& lock) {
     bool is_free = false;
     std::thread([&] {

@@ -110,14 +110,10 @@ TEST(HThread, IsAwaitedWithItsTlsDestructorsAndRunsNoneWhenKilled) {
         const int due = !kills ? 2 : kKillRunsTlsDestructors ? 1 : 0;
         std::vector<std::thread> waiters;
         for (int i = 0; i < 3; ++i) {
-            std::atomic<unsigned long long> number{0};
-            waiters.emplace_back([&] {
-                number = HThread::GetCurrentThreadId();
+            waiters.push_back(SleepIn([&] {
                 runner.Wait();
                 EXPECT_EQ(gone, due);
-            });
-            while (number == 0) std::this_thread::yield();
-            AwaitSleepOf(number);
+            }));
         }
         kills ? runner.Kill() : leave.Unlock();
         for (std::thread& waiter : waiters) waiter.join();

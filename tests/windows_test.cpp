@@ -12,14 +12,12 @@
 #include "platform/stream.h"
 #include "platform/thread.h"
 #include "platform/windows/standard_stream.h"
+#include "platform/windows/system.h"
 #include "support/faults.h"
 #include "support/run_in_child.h"
 #include "support/runner.h"
 #include "zanbase/semaphore.h"
 #include "zanbase/terminal.h"
-
-#define WIN32_LEAN_AND_MEAN
-#include <windows.h>
 
 namespace {
 
@@ -46,7 +44,7 @@ TEST(WindowsThread, TakesItsPriorityWheneverItIsSet) {
     }
 }
 
-TEST(WindowsThread, TellsErrorsAsTheSystemDoes) {
+TEST(WindowsThread, ReportsErrorsAsTheSystemDoes) {
     const std::string text = SystemErrorText(ERROR_ACCESS_DENIED);
     EXPECT_GT(text.size(), 2U);
     EXPECT_EQ(text.substr(text.size() - 2), "\r\n");

@@ -11,6 +11,7 @@
 #include <thread>
 #include <vector>
 
+#include "support/require.h"
 #include "support/runner.h"
 #include "zanbase/snapshot.h"
 #include "zanbase/zanbase.h"
@@ -23,14 +24,8 @@ namespace {
 
 using Random = std::mt19937;
 
-void Require(bool holds, const char* what) {
-    if (holds) return;
-    std::fprintf(stderr, "broken: %s\n", what);
-    std::abort();
-}
-
 // A stack of at most four items behind all locks: the read-write lock guards it, the semaphore counts its room, and
-// the condition tells of new items.
+// the condition announces new items.
 const HWritePrefMutex table;
 const HMutex mutex;
 const HCondVar filled;

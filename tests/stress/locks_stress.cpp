@@ -1,21 +1,17 @@
 // All locks under many threads, with their contracts checked all the time: for a second, or as many times
 // longer as the argument says. A broken contract ends it with a message, a lost unit or wake-up with a hang.
-#include <cstdio>
 #include <cstdlib>
 #include <random>
 #include <thread>
 #include <vector>
 
+#include "support/require.h"
 #include "zanbase/condition_variable.h"
 #include "zanbase/read_write_mutex.h"
 
 namespace {
 
 int rounds = 60000;
-
-void Require(bool holds, const char* what) {
-    if (!holds) std::fprintf(stderr, "broken: %s\n", what), std::abort();
-}
 
 // Calls body(random number, number of the thread) many times on each of eight threads.
 template <class Body>

@@ -14,6 +14,7 @@
 #include <thread>
 #include <vector>
 
+#include "support/require.h"
 #include "support/runner.h"
 
 // A killed thread frees nothing and joins no thread.
@@ -27,12 +28,6 @@ constexpr int kRounds = 20;
 int rounds = kRounds;
 int pipe_ends[2];  // full after the first writes
 std::FILE* const waste = std::fopen("/dev/null", "w");
-
-void Require(bool holds, const char* what) {
-    if (holds) return;
-    std::fprintf(stderr, "broken: %s\n", what);
-    std::abort();
-}
 
 void Allocate() {
     std::vector<std::string> texts;

@@ -8,12 +8,10 @@
 #include <cstdlib>
 #include <thread>
 
+#include "platform/windows/system.h"
 #include "support/blocked_thread.h"
 #include "support/environment.h"
 #include "support/run_in_child.h"
-
-#define WIN32_LEAN_AND_MEAN
-#include <windows.h>
 
 namespace {
 
