@@ -79,7 +79,8 @@ struct GlobalTimer::Impl {
     Impl& operator=(const Impl&) = delete;
 
     // Publishes the timer once its slots are made. Of threads that register at once, the later ones take the next
-    // number, or of a shared timer the number that it has got meanwhile.
+    // number, or of a shared timer the number that it has got meanwhile. The exchange pairs with every load of mpoNewest:
+    // whoever finds a timer finds it and its slots complete.
     unsigned long long Register(std::string name, bool is_shared) {
         auto timer = std::make_unique<Timer>();
         timer->moName = std::move(name);
@@ -157,8 +158,7 @@ struct GlobalTimer::Impl {
     }
 
     RowTable<TimerSlot> moRows;  // row t belongs to OpenMP thread number t; slot i of each to timer i
-    std::atomic<const Timer*> mpoNewest{
-        nullptr};  // null: no timer. Release when a timer is added, acquire to read
+    std::atomic<const Timer*> mpoNewest{nullptr};  // null: no timer
 };
 
 GlobalTimer& GlobalTimer::GetInstance() {

@@ -49,6 +49,7 @@ public:
     // Makes the item if it is missing. Thread-safe. std::bad_alloc leaves the array as it was.
     Item& At(std::size_t index) {
         const Place place = PlaceOf(index);
+        // Pairs with the exchange in MakeSegment.
         Line* lines = maSegments[place.segment].load(std::memory_order_acquire);
         if (ZANBASE_UNLIKELY(lines == nullptr)) lines = MakeSegment(place.segment);
         return ItemOf(lines, place);
@@ -95,7 +96,8 @@ private:
     ZANBASE_NOT_INLINE Line* MakeSegment(std::size_t segment) {
         std::unique_ptr<Line[]> lines(new Line[(kFirst << segment) / kLineItems]);
         Line* other = nullptr;
-        // Release: a thread that finds the segment finds its items made. Acquire for the other thread's.
+        // Release, for the loads in Find and At: a thread that finds the segment finds its items made. Acquire, for
+        // another thread's exchange.
         if (!maSegments[segment].compare_exchange_strong(other, lines.get(), std::memory_order_acq_rel))
             return other;
         return lines.release();
@@ -130,6 +132,7 @@ public:
             auto& new_row = moRows.At(row);
             for (std::size_t slot = 0; slot < slots; slot += kFirstSlots) new_row.At(slot);
         }
+        // Pairs with the load in RowCount.
         if (rows > RowCount()) mnRows.store(rows, std::memory_order_release);
     }
 

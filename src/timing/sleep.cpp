@@ -20,7 +20,7 @@ void SleepByTicks(int microseconds) {
     } while (ReadTicks() - start < ticks_to_wait);
 }
 
-// Never null. Release and acquire, so that what a caller prepared for its routine is there when it runs.
+// Never null. The release of InstallUSleepHook pairs with the acquire of USleep, so that what a caller prepared for its routine is there when it runs.
 std::atomic<void (*)(int)> mpfnUSleepHook{SleepByTicks};
 
 }  // namespace

@@ -37,7 +37,7 @@ public:
         if (mnDepth++ != 0) return;
         const long long closed = mnClosed.load(std::memory_order_relaxed);
         mnThread.store(thread, std::memory_order_relaxed);
-        mnState.store(2 * (closed - now) + 1, std::memory_order_release);
+        mnState.store(2 * (closed - now) + 1, std::memory_order_release);  // pairs with Read
     }
 
     // By the owner. After a reset there is no open interval.
@@ -52,7 +52,7 @@ public:
 
     // By any thread. If the owner finishes the interval meanwhile, it is in either figure, and once.
     [[nodiscard]] Reading Read() const noexcept {
-        const long long state = mnState.load(std::memory_order_acquire);
+        const long long state = mnState.load(std::memory_order_acquire);  // pairs with every store
         const int thread = mnThread.load(std::memory_order_relaxed);
         if (!IsOpen(state)) return {Sum(state), 0, thread};
         const long long closed = mnClosed.load(std::memory_order_relaxed);
@@ -63,7 +63,7 @@ public:
     // Requires: the owner neither enters nor leaves meanwhile.
     void Reset() noexcept {
         mnClosed.store(0, std::memory_order_relaxed);
-        mnState.store(0, std::memory_order_release);
+        mnState.store(0, std::memory_order_release);  // pairs with Read
     }
 
     [[nodiscard]] bool IsEntered() const noexcept { return mnDepth != 0; }
@@ -86,7 +86,8 @@ struct alignas(128) RegionRow {
     RegionRow* mpoOlder = nullptr;  // constant once the row is in the list
 };
 
-std::atomic<RegionRow*> gpoNewestRow{nullptr};  // release when a row is added, acquire to read
+// The exchange in FindRow pairs with every load: whoever finds a row finds it complete.
+std::atomic<RegionRow*> gpoNewestRow{nullptr};
 std::atomic<bool> gbExitReport{true};
 
 // The row that the thread owns or has owned last. Nothing is to be done when the thread ends.
@@ -96,7 +97,7 @@ struct ThreadRow {
 };
 thread_local ThreadRow moThreadRow{nullptr, false};
 
-// Acquire: what the last owner wrote to the slots.
+// Acquire: what the last owner wrote to the slots. Pairs with DisownRow.
 bool TryOwn(RegionRow& row) noexcept {
     return !row.mbOwned.load(std::memory_order_relaxed) &&
            !row.mbOwned.exchange(true, std::memory_order_acquire);

@@ -113,7 +113,7 @@ FaultFrame::FaultFrame() noexcept : mpoOuter(toSelf.mpoFrame), moExceptions(Exce
 }
 
 void InstallFaultHandlers() noexcept {
-    if (gbInstalled.load(std::memory_order_acquire)) return;
+    if (gbInstalled.load(std::memory_order_acquire)) return;  // pairs with the store below
     const BlockLock lock;
     if (gbInstalled.load(std::memory_order_relaxed)) return;
     Action ours{};
@@ -123,7 +123,7 @@ void InstallFaultHandlers() noexcept {
         sigaction(fault.number, nullptr, &fault.previous);  // first: a fault may come at once
         sigaction(fault.number, &ours, nullptr);
     }
-    gbInstalled.store(true, std::memory_order_release);
+    gbInstalled.store(true, std::memory_order_release);  // pairs with the load above: gaFaults is complete
 }
 
 bool RunGuarded(void (*body)(void*), void* argument) {

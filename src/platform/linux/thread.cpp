@@ -99,6 +99,7 @@ void JoinThread(ThreadSlot& slot) noexcept {
 
 void DetachThread(ThreadSlot& slot) noexcept {
     const BlockLock lock;
+    // Pairs with the load in HasThread.
     if (HNativeThread* const block = slot.exchange(nullptr, std::memory_order_acq_rel))
         block->mpoSlot = nullptr;
 }

@@ -45,7 +45,7 @@ HNativeThread* NewBlock() noexcept ZANBASE_REQUIRES(goBlockMutex) {
     return block;
 }
 
-// Release: a thread that finds the slot empty sees what the ended thread wrote.
+// Release, for the load in HasThread: a thread that finds the slot empty sees what the ended thread wrote.
 void EmptySlot(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
     if (block->mpoSlot == nullptr) return;
     NoteRelease(block->mpoSlot);
@@ -134,7 +134,7 @@ HNativeThread* OpenBlock(ThreadSlot& slot) noexcept {
     block->mnPriority = kNormalPriority;
     block->mbKillRequested = false;
     block->moLastPlace = {};
-    slot.store(block, std::memory_order_release);
+    slot.store(block, std::memory_order_release);  // pairs with the load in HasThread
     return block;
 }
 

@@ -130,6 +130,7 @@ bool IsHeld(std::FILE* stream) noexcept {
 void FindRuntimeCode() noexcept {
     // Without places, threads are killed wherever they are. Under the thread sanitizer too: it delivers signals
     // late, with a place that the thread may have left long ago.
+    // The load pairs with the store at the end, so that goRuntimeCode is complete.
     if (!kKnowsPlaces || IsThreadSanitizerOn() || gbSearched.load(std::memory_order_acquire)) return;
     Search search{
         {reinterpret_cast<std::uintptr_t>(&gnu_get_libc_version),
@@ -143,7 +144,7 @@ void FindRuntimeCode() noexcept {
     search.found.system_calls = CodeOf(reinterpret_cast<std::uintptr_t>(&syscall));
     const BlockLock lock;
     if (!gbSearched.load(std::memory_order_relaxed)) goRuntimeCode = search.found;
-    gbSearched.store(true, std::memory_order_release);
+    gbSearched.store(true, std::memory_order_release);  // pairs with the load above
 }
 
 bool StandardOutputIsHeld() noexcept {

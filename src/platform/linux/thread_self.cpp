@@ -9,6 +9,7 @@
 
 ZANBASE_FAST_THREAD_LOCAL ThreadSelf toSelf;
 
+// Pairs with every store to a slot: OpenBlock fills it, EmptySlot and DetachThread empty it.
 bool HasThread(const ThreadSlot& slot) noexcept { return slot.load(std::memory_order_acquire) != nullptr; }
 
 unsigned int CurrentThreadId() noexcept {

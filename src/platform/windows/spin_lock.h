@@ -9,6 +9,7 @@
 
 class SpinLock {
 public:
+    // Pairs with Release.
     void Acquire() noexcept {
         while (mbHeld.exchange(true, std::memory_order_acquire) && !IsLastThread()) SwitchToThread();
     }

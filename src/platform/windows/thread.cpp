@@ -71,7 +71,7 @@ int StartThread(ThreadSlot& slot, void (*body)(void*), void* argument) noexcept 
         delete block;
         return static_cast<int>(error);
     }
-    slot.store(block, std::memory_order_release);
+    slot.store(block, std::memory_order_release);  // pairs with the load in HasThread
     return 0;
 }
 

@@ -2,6 +2,7 @@
 #include "platform/windows/thread_block.h"
 
 void EmptySlot(HNativeThread* block) noexcept {
+    // Release, for the load in HasThread: a thread that finds the slot empty sees what the ended thread wrote.
     if (block->mpoSlot != nullptr) block->mpoSlot->store(nullptr, std::memory_order_release);
     block->mpoSlot = nullptr;
 }

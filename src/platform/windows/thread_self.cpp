@@ -5,6 +5,7 @@
 // This system ends a thread without an exception.
 void RethrowThreadExit() {}
 
+// The load pairs with every store to a slot: StartThread fills it, EmptySlot empties it.
 bool HasThread(const ThreadSlot& slot) noexcept {
     return slot.load(std::memory_order_acquire) != nullptr && !IsLastThread();
 }
