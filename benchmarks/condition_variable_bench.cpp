@@ -14,25 +14,25 @@
 namespace {
 
 struct Ours {
-    void Lock() { mMutex.Lock(); }
-    void Unlock() { mMutex.Unlock(); }
-    void Wait() { mChanged.Wait(mMutex); }
-    void Signal() { mChanged.Signal(); }
+    void Lock() { moMutex.Lock(); }
+    void Unlock() { moMutex.Unlock(); }
+    void Wait() { moChanged.Wait(moMutex); }
+    void Signal() { moChanged.Signal(); }
 
 private:
-    HMutex mMutex;
-    HCondVar mChanged;
+    HMutex moMutex;
+    HCondVar moChanged;
 };
 
 struct Standard {
-    void Lock() { mMutex.lock(); }
-    void Unlock() { mMutex.unlock(); }
-    void Wait() { mChanged.wait(mMutex); }
-    void Signal() { mChanged.notify_one(); }
+    void Lock() { moMutex.lock(); }
+    void Unlock() { moMutex.unlock(); }
+    void Wait() { moChanged.wait(moMutex); }
+    void Signal() { moChanged.notify_one(); }
 
 private:
-    std::recursive_mutex mMutex;
-    std::condition_variable_any mChanged;
+    std::recursive_mutex moMutex;
+    std::condition_variable_any moChanged;
 };
 
 enum Turn { kMain, kPeer, kEnd };

@@ -28,41 +28,41 @@ private:
 
 class OnCondition {
 public:
-    OnCondition() : mThread([this] { Run(); }) {}
+    OnCondition() : moThread([this] { Run(); }) {}
     ~OnCondition() {
-        mEnds = true;
+        mbEnds = true;
         while (!Signal()) std::this_thread::yield();
-        mThread.join();
+        moThread.join();
     }
 
     bool Signal() {
         {
-            const std::lock_guard<std::mutex> lock(mMutex);
-            if (!mSleeps) return false;
-            ++mUnits;
+            const std::lock_guard<std::mutex> lock(moMutex);
+            if (!mbSleeps) return false;
+            ++mnUnits;
         }
-        mWakeUp.notify_one();
+        moWakeUp.notify_one();
         return true;
     }
 
 private:
     void Run() {
-        while (!mEnds) {
+        while (!mbEnds) {
             answers.Unlock();
-            std::unique_lock<std::mutex> lock(mMutex);
-            mSleeps = true;
-            mWakeUp.wait(lock, [this] { return mUnits > 0; });
-            --mUnits;
-            mSleeps = false;
+            std::unique_lock<std::mutex> lock(moMutex);
+            mbSleeps = true;
+            moWakeUp.wait(lock, [this] { return mnUnits > 0; });
+            --mnUnits;
+            mbSleeps = false;
         }
     }
 
-    std::mutex mMutex;
-    std::condition_variable mWakeUp;
-    int mUnits = 1;        // guarded by mMutex
-    bool mSleeps = false;  // guarded by mMutex
-    std::atomic<bool> mEnds{false};
-    std::thread mThread;
+    std::mutex moMutex;
+    std::condition_variable moWakeUp;
+    int mnUnits = 1;        // guarded by moMutex
+    bool mbSleeps = false;  // guarded by moMutex
+    std::atomic<bool> mbEnds{false};
+    std::thread moThread;
 };
 
 template <class Worker>

@@ -9,10 +9,10 @@ class Placement {
 public:
     Placement(const Placement&) = delete;
     Placement& operator=(const Placement&) = delete;
-    ~Placement() { sched_setaffinity(0, sizeof mBefore, &mBefore); }
+    ~Placement() { sched_setaffinity(0, sizeof moBefore, &moBefore); }
 
 protected:
-    Placement() { sched_getaffinity(0, sizeof mBefore, &mBefore); }
+    Placement() { sched_getaffinity(0, sizeof moBefore, &moBefore); }
 
     static void Place(int processor) {
         cpu_set_t one;
@@ -21,7 +21,7 @@ protected:
         sched_setaffinity(0, sizeof one, &one);
     }
 
-    cpu_set_t mBefore;
+    cpu_set_t moBefore;
 };
 
 // The processor that the thread is on: for rows in which one thread wakes another.
@@ -34,9 +34,9 @@ public:
 class OwnProcessor : Placement {
 public:
     explicit OwnProcessor(int thread) {
-        int left = thread % CPU_COUNT(&mBefore);
+        int left = thread % CPU_COUNT(&moBefore);
         int processor = 0;
-        while (!CPU_ISSET(processor, &mBefore) || left-- != 0) ++processor;
+        while (!CPU_ISSET(processor, &moBefore) || left-- != 0) ++processor;
         Place(processor);
     }
 };

@@ -20,25 +20,25 @@ namespace {
 
 class BoostShared {
 public:
-    void ReadLock() { mMutex.lock_shared(); }
-    void ReadUnlock() { mMutex.unlock_shared(); }
-    void WriteLock() { mMutex.lock(); }
-    void WriteUnlock() { mMutex.unlock(); }
+    void ReadLock() { moMutex.lock_shared(); }
+    void ReadUnlock() { moMutex.unlock_shared(); }
+    void WriteLock() { moMutex.lock(); }
+    void WriteUnlock() { moMutex.unlock(); }
 
 private:
-    boost::shared_mutex mMutex;
+    boost::shared_mutex moMutex;
 };
 
 class System {
 public:
-    ~System() { pthread_rwlock_destroy(&mLock); }
-    void ReadLock() { pthread_rwlock_rdlock(&mLock); }
-    void ReadUnlock() { pthread_rwlock_unlock(&mLock); }
-    void WriteLock() { pthread_rwlock_wrlock(&mLock); }
-    void WriteUnlock() { pthread_rwlock_unlock(&mLock); }
+    ~System() { pthread_rwlock_destroy(&moLock); }
+    void ReadLock() { pthread_rwlock_rdlock(&moLock); }
+    void ReadUnlock() { pthread_rwlock_unlock(&moLock); }
+    void WriteLock() { pthread_rwlock_wrlock(&moLock); }
+    void WriteUnlock() { pthread_rwlock_unlock(&moLock); }
 
 private:
-    pthread_rwlock_t mLock = PTHREAD_RWLOCK_INITIALIZER;
+    pthread_rwlock_t moLock = PTHREAD_RWLOCK_INITIALIZER;
 };
 
 template <class Mutex>

@@ -13,13 +13,13 @@ namespace {
 
 class SystemSemaphore {
 public:
-    explicit SystemSemaphore(unsigned int count) { sem_init(&mUnits, 0, count); }
-    ~SystemSemaphore() { sem_destroy(&mUnits); }
-    void Lock() { sem_wait(&mUnits); }
-    void Unlock() { sem_post(&mUnits); }
+    explicit SystemSemaphore(unsigned int count) { sem_init(&moUnits, 0, count); }
+    ~SystemSemaphore() { sem_destroy(&moUnits); }
+    void Lock() { sem_wait(&moUnits); }
+    void Unlock() { sem_post(&moUnits); }
 
 private:
-    sem_t mUnits;
+    sem_t moUnits;
 };
 
 template <class Semaphore>

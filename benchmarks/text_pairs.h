@@ -43,24 +43,24 @@ class Ours {
 public:
     template <class Function>
     Ours(const std::string& name, std::vector<Value> values, Function function)
-        : mName(name), mValues(std::move(values)) {
-        Measure(mName, function);
+        : moName(name), moValues(std::move(values)) {
+        Measure(moName, function);
     }
 
     // Measures a peer, with a row for the ratio.
     template <class Function>
     const Ours& Beside(const std::string& peer, Function function, double goal,
                        const char* file = __builtin_FILE()) const {
-        const std::string name = peer + " for " + mName;
+        const std::string name = peer + " for " + moName;
         Measure(name, function);
-        AddRatio(mName, name, goal, file);
+        AddRatio(moName, name, goal, file);
         return *this;
     }
 
 private:
     template <class Function>
     void Measure(const std::string& name, Function function) const {
-        benchmark::RegisterBenchmark(name.c_str(), [values = mValues, function](benchmark::State& state) {
+        benchmark::RegisterBenchmark(name.c_str(), [values = moValues, function](benchmark::State& state) {
             std::size_t next = 0;
             for (auto _ : state) {
                 benchmark::DoNotOptimize(function(values[next]));
@@ -69,8 +69,8 @@ private:
         });
     }
 
-    std::string mName;
-    std::vector<Value> mValues;
+    std::string moName;
+    std::vector<Value> moValues;
 };
 
 #endif

@@ -38,8 +38,8 @@ constexpr char kRevision[] = "2016.0.1";
 int mnMajorRevSet = 0;  // 1 once mzMajorRev is complete
 char mzMajorRev[12];
 
-double maScreenSize[4];
-double* mpdScreenSize = nullptr;  // null until maScreenSize is stored
+double gaScreenSize[4];
+double* mpdScreenSize = nullptr;  // null until gaScreenSize is stored
 
 constexpr char UpperCase(char letter) {
     return letter >= 'a' && letter <= 'z' ? static_cast<char>(letter - 'a' + 'A') : letter;
@@ -94,8 +94,8 @@ int IsWin32s() { return 0; }
 int SetScreenSize(double first, double second, double third, double fourth) {
     if (mpdScreenSize != nullptr) return 0;
     const double measures[] = {first, second, third, fourth};
-    std::memcpy(maScreenSize, measures, sizeof(measures));
-    mpdScreenSize = maScreenSize;
+    std::memcpy(gaScreenSize, measures, sizeof(measures));
+    mpdScreenSize = gaScreenSize;
     return 1;
 }
 

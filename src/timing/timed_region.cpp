@@ -95,7 +95,7 @@ struct ThreadRow {
     RegionRow* mpoRow;
     bool mbOwned;
 };
-thread_local ThreadRow moThreadRow{nullptr, false};
+thread_local ThreadRow toThreadRow{nullptr, false};
 
 // Acquire: what the last owner wrote to the slots. Pairs with DisownRow.
 bool TryOwn(RegionRow& row) noexcept {
@@ -153,7 +153,7 @@ bool HTimerIdOf(const char* name, std::size_t length, unsigned long long* id) no
 }
 
 bool HEnterTimedRegion(unsigned long long id) noexcept {
-    ThreadRow& mine = moThreadRow;
+    ThreadRow& mine = toThreadRow;
     try {
         OwnRow(mine);
         RegionSlot& slot = SlotOf(*mine.mpoRow, id);
@@ -167,7 +167,7 @@ bool HEnterTimedRegion(unsigned long long id) noexcept {
 }
 
 void HLeaveTimedRegion(unsigned long long id) noexcept {
-    ThreadRow& mine = moThreadRow;
+    ThreadRow& mine = toThreadRow;
     RegionSlot* const slot = mine.mbOwned ? mine.mpoRow->moSlots.Find(id) : nullptr;
     if (slot == nullptr || !slot->IsEntered()) return;
     slot->Leave(static_cast<long long>(ReadTimerClock()));

@@ -109,7 +109,7 @@ void SetNativePriority(ThreadSlot& slot, int level) noexcept {
     HNativeThread* const block = slot.load(std::memory_order_relaxed);
     if (block == nullptr) return;
     block->mnPriority = level;
-    if (block->mState == ThreadState::Running) ApplyPriority(block);  // else its first step does
+    if (block->mnState == ThreadState::Running) ApplyPriority(block);  // else its first step does
 }
 
 // The exception of pthread_exit has no object; the undefined-behaviour sanitizer takes it for a null

@@ -62,7 +62,7 @@ void OnExitKey(void* block) {
 
 // Requires: the block has no waiter.
 void ReleaseUnawaited(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
-    switch (block->mState) {
+    switch (block->mnState) {
         case ThreadState::Leaving:
             pthread_detach(block->moThread);
             MarkEnded(block);
@@ -130,7 +130,7 @@ HNativeThread* OpenBlock(ThreadSlot& slot) noexcept {
     HNativeThread* const block = NewBlock();
     if (block == nullptr) return nullptr;
     block->mpoSlot = &slot;
-    block->mState = ThreadState::Starting;
+    block->mnState = ThreadState::Starting;
     block->mnPriority = kNormalPriority;
     block->mbKillRequested = false;
     block->moLastPlace = {};
@@ -151,7 +151,7 @@ void EnterBlock(HNativeThread* block) noexcept {
     toSelf.mpoBlock = block;
     block->moThread = pthread_self();
     block->mnNumber = CurrentThreadId();
-    block->mState = ThreadState::Running;
+    block->mnState = ThreadState::Running;
     pthread_setspecific(gnExitKey, block);  // if this fails, a pthread_exit past RunBody is not noticed
 }
 
@@ -169,14 +169,14 @@ void LeaveBlock(HNativeThread* block, ThreadState how) noexcept {
 
 void MarkLeft(HNativeThread* block, ThreadState how) noexcept {
     EmptySlot(block);  // no further waiter can come
-    block->mState = how;
+    block->mnState = how;
     block->mnGeneration.fetch_add(1, std::memory_order_relaxed);
     if (block->mnWaiters == 0) ReleaseUnawaited(block);
 }
 
 void MarkEnded(HNativeThread* block) noexcept {
     NoteRelease(block);
-    block->mState = ThreadState::Ended;
+    block->mnState = ThreadState::Ended;
     block->mnGeneration.fetch_add(1, std::memory_order_relaxed);
     if (block->mnWaiters == 0) ReleaseUnawaited(block);
 }

@@ -66,7 +66,7 @@ struct HNativeThread {
 
     HNativeThread* mpoNext ZANBASE_GUARDED_BY(goBlockMutex);  // on the list of free or of unjoined blocks
     ThreadSlot* mpoSlot ZANBASE_GUARDED_BY(goBlockMutex);     // the slot that points here, or null
-    ThreadState mState ZANBASE_GUARDED_BY(goBlockMutex);
+    ThreadState mnState ZANBASE_GUARDED_BY(goBlockMutex);
     unsigned int mnWaiters ZANBASE_GUARDED_BY(goBlockMutex);  // threads inside JoinThread or KillThread
     pthread_t moThread ZANBASE_GUARDED_BY(goBlockMutex);      // valid from Running on
     unsigned int mnNumber ZANBASE_GUARDED_BY(goBlockMutex);   // valid from Running on

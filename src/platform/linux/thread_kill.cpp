@@ -38,7 +38,7 @@ void BlockSignals() noexcept {
 }
 
 bool IsAlive(const HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
-    return block->mState == ThreadState::Starting || block->mState == ThreadState::Running;
+    return block->mnState == ThreadState::Starting || block->mnState == ThreadState::Running;
 }
 
 // What a request to exit has led to.
@@ -58,7 +58,7 @@ KillResult RequestKill(HNativeThread* block) noexcept {
         block->mbOutputIsHeld = output_is_held;
         block->mbKillRequested = true;
         // The thread can't end while this one holds the mutex, so no other thread has its number.
-        const int error = block->mState == ThreadState::Running ? SendKillSignal(block->mnNumber) : 0;
+        const int error = block->mnState == ThreadState::Running ? SendKillSignal(block->mnNumber) : 0;
         if (error == ESRCH) MarkLeft(block, ThreadState::Killed);  // it has called exit(2) by itself
         if (error != 0) return error == ESRCH ? KillResult::Gone : KillResult::NotSent;
     }

@@ -29,9 +29,9 @@ bool JoinWithinLimit(pthread_t thread) noexcept {
 // Requires: the calling thread defers kills beyond the block mutex: if it were killed while it joins, no other
 // thread could join. A kill of it waits for this call, therefore the limit.
 void Join(HNativeThread* block) noexcept ZANBASE_REQUIRES(goBlockMutex) {
-    const ThreadState state_before = block->mState;
+    const ThreadState state_before = block->mnState;
     const pthread_t thread = block->moThread;
-    block->mState = ThreadState::Joining;
+    block->mnState = ThreadState::Joining;
     goBlockMutex.Release();
     const bool has_ended = JoinWithinLimit(thread);
     goBlockMutex.Acquire();
@@ -50,10 +50,10 @@ ThreadState StepTowardsEnd(HNativeThread* block, unsigned int& seen) noexcept {
     bool has_joined = false;
     {
         const BlockLock lock;
-        has_joined = IsJoinable(block->mState);
+        has_joined = IsJoinable(block->mnState);
         if (has_joined) Join(block);
         seen = block->mnGeneration.load(std::memory_order_relaxed);
-        state = block->mState;
+        state = block->mnState;
         if (state == ThreadState::Ended) RemoveWaiter(block);
     }
     if (state == ThreadState::Ended) NoteAcquire(block);
