@@ -3,7 +3,7 @@
 find_program(ZANBASE_MSGFMT msgfmt)
 
 # Compiles `po` with `target` to locale/LANGUAGE/LC_MESSAGES/ZAN.mo in the target's build folder. Without msgfmt
-# there is no catalogue, and the target speaks English.
+# there is no catalogue, and the target's messages stay English.
 function(zanbase_catalogue target language po)
     if(NOT ZANBASE_MSGFMT)
         return()

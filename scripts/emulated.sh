@@ -29,7 +29,7 @@ always|[A-Za-z]*Model\..*|the steps explored are those of the release lane, and 
 
 # run_emulated_tests PROCESSOR BUILD: says at the end which tests were left out, and why.
 run_emulated_tests() {
-    local limits limit tests reason number without=() told=()
+    local limits limit tests reason number without=() reported=()
     "$1-linux-gnu-gcc" -O1 "$top/scripts/emulated_limits.c" -o "$2/limits"
     limits=$("qemu-${1/powerpc/ppc}" -L "/usr/$1-linux-gnu" "$2/limits")
     while IFS='|' read -r limit tests reason; do
@@ -37,11 +37,11 @@ run_emulated_tests() {
         number=$(ctest --test-dir "$2" -N -R "$tests" | sed -n 's/^Total Tests: //p')
         [ "$number" -gt 0 ] || fail "no test is called $tests; see scripts/emulated.sh"
         without+=("$tests")
-        told+=("left out: $number of $tests: $reason")
+        reported+=("left out: $number of $tests: $reason")
     done <<<"$emulated_skips"
     ctest --test-dir "$2" -j 2 --timeout 240 --output-on-failure --no-tests=error \
         -E "^($(IFS='|' && echo "${without[*]}"))\$"
-    printf '%s\n' "${told[@]}"
+    printf '%s\n' "${reported[@]}"
 }
 
 run_aarch64_lane() {

@@ -108,7 +108,7 @@ class Interface:
             slot = int(member.get("vtable-offset", NO_SLOT))
             name = member.find("function-decl").get("name")
             if slot < NO_SLOT and member.get("destructor") == "yes":
-                yield f"virtual {name}()"  # a pair of slots, of which not all compilers tell
+                yield f"virtual {name}()"  # a pair of slots, which not all compilers list
             elif slot < NO_SLOT:
                 yield f"slot {slot}: {name}{self.parameters(member.find('function-decl'))}"
 

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """scripts/thread_safety.py [FOLDER]
 
-Prints each free function and each class with functions whose comment does not tell its thread-safety. A class's comment
+Prints each free function and each class with functions whose comment does not state its thread-safety. A class's comment
 stands for its members. Reads what doxygen wrote as XML to FOLDER (build/docs-xml).
 """
 import pathlib
@@ -17,7 +17,7 @@ def place(node):
     return node.find("location").get("file") + ":" + node.find("location").get("line")
 
 
-def tells(node):
+def states(node):
     texts = ["".join(node.find(part).itertext()) for part in ("briefdescription", "detaileddescription")]
     return "thread-safe" in " ".join(texts).lower() or "thread safety" in " ".join(texts).lower()
 
@@ -30,8 +30,8 @@ for entry in xml.parse(folder / "index.xml").findall("compound"):  # doxygen kee
         if compound.get("prot") == "private":
             continue
         if compound.get("kind") in ("class", "struct"):
-            if functions and not tells(compound) and not all(tells(function) for function in functions):
+            if functions and not states(compound) and not all(states(function) for function in functions):
                 findings.add(f"{place(compound)}: {compound.findtext('compoundname')}")
         else:
-            findings |= {f"{place(f)}: {f.findtext('name')}" for f in functions if not tells(f)}
+            findings |= {f"{place(f)}: {f.findtext('name')}" for f in functions if not states(f)}
 print("\n".join(sorted(findings)), end="\n" if findings else "")

@@ -25,7 +25,7 @@ TEST(Clock, CountsFromTheEpochInEachUnit) {
     EXPECT_EQ(GetTimeInSeconds(), -1.75);
 }
 
-TEST(Timer, TellsTheTimeSinceItsStart) {
+TEST(Timer, ReportsTheTimeSinceItsStart) {
     now = {0, 0};
     CopyableTimer timer;
     now = {7200, 500};

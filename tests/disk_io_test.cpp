@@ -40,12 +40,13 @@ void Play(const std::string& script) {
 std::string State() {
     std::string text;
     for (const auto& [name, use] : *mpoDiskIOFileMap) {
-        DiskIOUsage told;
-        HDiskIOAccessFileData(name, &told.mdReadTime, &told.mnReadCount, &told.mnReadSize, &told.mdWriteTime,
-                              &told.mnWriteCount, &told.mnWriteSize);
-        text += name + MkString(":%u/%u/%u %u(%llu)%g %u(%llu)%g; ", use.mnOpenCount, use.mnCloseCount,
-                                use.mnSeekCount, told.mnReadCount, told.mnReadSize, told.mdReadTime,
-                                told.mnWriteCount, told.mnWriteSize, told.mdWriteTime);
+        DiskIOUsage reported;
+        HDiskIOAccessFileData(name, &reported.mdReadTime, &reported.mnReadCount, &reported.mnReadSize,
+                              &reported.mdWriteTime, &reported.mnWriteCount, &reported.mnWriteSize);
+        text +=
+            name + MkString(":%u/%u/%u %u(%llu)%g %u(%llu)%g; ", use.mnOpenCount, use.mnCloseCount,
+                            use.mnSeekCount, reported.mnReadCount, reported.mnReadSize, reported.mdReadTime,
+                            reported.mnWriteCount, reported.mnWriteSize, reported.mdWriteTime);
     }
     return text + "1=" + HDiskIOGetFilename(At('1'));
 }
@@ -80,7 +81,7 @@ TEST(DiskIO, CountsWhatManyThreadsRecord) {
     EXPECT_EQ(State(), "x:1500/0/0 1500(4500)750 1500(7500)375; 1=x");
 }
 
-TEST(DiskIO, RecordsAsTold) {
+TEST(DiskIO, RecordsWhatItIsGiven) {
     const char* const cases[][2] = {
         {"o1a s1 r1 r1 w1 c1 r1", "a:1/1/1 3(9)1.5 1(5)0.25; 1=a"},
         {"o1ab r1 o1a\xff r1 r1", "ab:1/0/0 1(3)0.5 0(0)0; a\xff:1/0/0 2(6)1 0(0)0; 1=a\xff"},

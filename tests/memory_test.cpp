@@ -68,7 +68,7 @@ TEST_F(Tracker, DoesNothingBeforeTheFirstAlloc) {
     EXPECT_EQ(Blocks(), "1 is 10 of table:1; ");
 }
 
-TEST_F(Tracker, TellsSitesApartByPointerAndLine) {
+TEST_F(Tracker, DistinguishesSitesByPointerAndLine) {
     Add(1, 10, kTable, 1);
     Add(2, 0, kTwin, 1);
     Add(3, 20, kTable, 2);

@@ -45,7 +45,7 @@ void ExpectHeldInChild() {
 TEST(HReadPrefMutex, IsHeldAcrossAFork) { ExpectHeldInChild<HReadPrefMutex>(); }
 TEST(HWritePrefMutex, IsHeldAcrossAFork) { ExpectHeldInChild<HWritePrefMutex>(); }
 
-// A thread that makes the calls it is told: r, R, w, W for ReadLock, ReadUnlock, WriteLock, WriteUnlock.
+// A thread that makes the calls of its letters: r, R, w, W for ReadLock, ReadUnlock, WriteLock, WriteUnlock.
 class Visitor {
 public:
     explicit Visitor(const HReadWriteMutex& mutex) : moThread([&] { Run(mutex); }) {}

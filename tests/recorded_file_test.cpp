@@ -78,7 +78,7 @@ TEST(RecordedFile, ReportsAFailureWithoutAReason) {
     EXPECT_EQ(FileNamed("failing").moClose.mnCount, 0);
 }
 
-TEST(RecordedFile, RefusesWhatIsNoNameOrMode) {
+TEST(RecordedFile, RefusesWhatIsNotANameOrMode) {
     std::error_code error;
     const struct {
         std::string_view name;

@@ -30,7 +30,7 @@ int FreeUnits(const HSemaphore& semaphore) {
     return units;
 }
 
-TEST(HSemaphore, HasOneUnitUnlessToldOtherwise) { EXPECT_EQ(FreeUnits(HSemaphore()), 1); }
+TEST(HSemaphore, HasOneUnitByDefault) { EXPECT_EQ(FreeUnits(HSemaphore()), 1); }
 
 TEST(HSemaphoreLock, ReleasesBeforeItAcquires) {
     HSemaphore first(2);

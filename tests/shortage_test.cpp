@@ -193,7 +193,7 @@ int FailEachAllocation(const Operation& operation) {
     }
 }
 
-TEST(Shortages, LeaveTheStateAsToldNoLockHeldAndNoLeak) {
+TEST(Shortages, LeaveTheDocumentedStateNoLockHeldAndNoLeak) {
     SetIntlTest(true);
     HMemory::Alloc(&blocks[0], 10, "old", 1);
     HDiskIOOpen(kName, &blocks[0], 1);

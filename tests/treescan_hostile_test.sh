@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# treescan_hostile_test.sh TREESCAN: a tree with names that are no text, loops of links, a pipe, 10^5 entries, a file
+# treescan_hostile_test.sh TREESCAN: a tree with names that are not text, loops of links, a pipe, 10^5 entries, a file
 # and a folder that can't be read, and files that vanish meanwhile.
 set -euo pipefail
 tree=$(mktemp -d)

@@ -63,7 +63,7 @@ private:
 };
 
 // Moves between two accounts; std::scoped_lock acquires both without a deadlock, whatever their order. The analysis does
-// not see that, so the assertions tell it, and check it when the program runs.
+// not see that, so the assertions state it, and check it when the program runs.
 struct Account {
     HLockable moMutex;
     int mnBalance ZANBASE_GUARDED_BY(moMutex) = 1000;

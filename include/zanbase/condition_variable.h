@@ -11,13 +11,13 @@
 
 struct HNativeCondition;
 
-/// A condition variable that is used with a `HMutex`.
+/// A condition variable that is used with an `HMutex`.
 ///
 ///     HMutexLock lock(&mutex);
 ///     while (jobs.empty()) condition.Wait(mutex);  // the other side: add a job, then Signal()
 ///
 /// Spurious wake-ups are possible, and another thread may consume the condition first: always wait in a loop
-/// that tests the condition under the mutex. A wake-up without a waiter is lost; use a `HSemaphore` where it
+/// that tests the condition under the mutex. A wake-up without a waiter is lost; use an `HSemaphore` where it
 /// has to be remembered.
 ///
 /// Thread-safe: any number of threads may call any operation at the same time. Which waiter `Signal` wakes is

@@ -42,7 +42,7 @@
 ///
 /// Not for short code: a pair of toggles costs about two clock readings.
 ///
-/// Thread-safety: `GetInstance`, `RegisterNewTimer` and `Toggle` are thread-safe, with the limits told there;
+/// Thread-safety: `GetInstance`, `RegisterNewTimer` and `Toggle` are thread-safe, with the limits stated there;
 /// `Report` and `ResetAll` are not.
 class ZANBASE_API GlobalTimer {
 public:

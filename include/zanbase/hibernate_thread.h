@@ -36,7 +36,7 @@
 /// | ended       | true           | false                | never; the object is destroyed |
 ///
 /// A signal is not queued: a signal during a pass is dropped, and the caller must handle that. Where every
-/// request counts, use a queue with a `HCondVar`.
+/// request counts, use a queue with an `HCondVar`.
 ///
 /// The worker runs until its object is destroyed; `Stop` does not stop it. `Kill` terminates it, with all
 /// effects that `HThread::Kill` documents. A killed worker leaves the object in the state it was killed in:

@@ -41,7 +41,7 @@ struct HNativeLock;
 /// there. Not async-signal-safe.
 class ZANBASE_API HMutex {
 public:
-    /// Makes a free mutex. Allocates its lock with `HMalloc`, which tells what happens if memory is exhausted.
+    /// Makes a free mutex. Allocates its lock with `HMalloc`, which states what happens if memory is exhausted.
     HMutex();
     /// Requires: no thread owns the mutex or waits for it. Not thread-safe.
     ~HMutex();
@@ -67,7 +67,7 @@ private:
     HNativeLock* mpoCriticalSection = nullptr;  // owned; set by the constructor and never changed
 };
 
-/// Holds one level of ownership of a `HMutex` for a scope, or nothing.
+/// Holds one level of ownership of an `HMutex` for a scope, or nothing.
 ///
 /// Not thread-safe: an object belongs to the thread that made it, and must be released on that thread. It
 /// can't be made with `new`. Copying or assigning from an object of another thread that holds a mutex blocks

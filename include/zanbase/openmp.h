@@ -122,7 +122,7 @@ ZANBASE_API void OMPSetMaxThreads(int limit);
 /// not use. Asks the system once. Thread-safe.
 [[nodiscard]] ZANBASE_API int GetLogicalProcessorCount();
 
-/// Returns the number of processor cores, or the OpenMP runtime's processor count if the system doesn't tell.
+/// Returns the number of processor cores, or the OpenMP runtime's processor count if the system doesn't report them.
 /// Asks the system once. Thread-safe.
 [[nodiscard]] ZANBASE_API int GetPhysicalProcessorCount();
 

@@ -42,7 +42,7 @@ constexpr std::size_t kReadWriteMemberBytes = 120;
 /// thread held; locks of other threads stay held for ever there. If another thread waited for the write lock or
 /// was inside an operation at the moment of the `fork`, the lock can't be used in the child either.
 ///
-/// When not to use it: acquiring a read lock costs a few times what a `HMutex` costs. It pays where readers
+/// When not to use it: acquiring a read lock costs a few times what an `HMutex` costs. It pays where readers
 /// stay inside for long.
 class ZANBASE_API HReadWriteMutex {
 public:
@@ -150,7 +150,7 @@ private:
     mutable std::atomic<unsigned long long> mnWriterThread{0xFFFFFFFFFFFFFFFF};
     HMutex moReaderMutex;
     HMutex moWriterMutex;
-    HSemaphore moGate;
+    HSemaphore moGate;  // first here, and second above: both layouts are part of the binary interface
     HSemaphore moResource;
     mutable ReadCounts::node_type moSpareCount;
 #else
@@ -163,7 +163,7 @@ public:
 #endif
 };
 
-/// Holds one read lock of a `HReadWriteMutex` for a scope, or nothing.
+/// Holds one read lock of an `HReadWriteMutex` for a scope, or nothing.
 ///
 /// Not thread-safe: an object belongs to the thread that made it, and must be released on that thread. It
 /// can't be made with `new`. A copy on the same thread is a nested read lock and never waits. There is no
@@ -196,7 +196,7 @@ private:
     const HReadWriteMutex* mpoMutex;  // not owned; null while nothing is held
 };
 
-/// Holds one write lock of a `HReadWriteMutex` for a scope, or nothing. Not thread-safe, as `HReaderLock`. A
+/// Holds one write lock of an `HReadWriteMutex` for a scope, or nothing. Not thread-safe, as `HReaderLock`. A
 /// copy on the same thread is a nested write lock. Requires: the thread holds no read lock of the mutex.
 class ZANBASE_API HWriterLock {
 public:

@@ -19,7 +19,7 @@ struct HNativeSemaphore;
 ///     done.Lock();                                  // returns when the job has released its unit
 ///
 /// A unit has no owner: any thread may release one, also a thread that acquired none; the count then rises.
-/// So a semaphore is not re-entrant. Prefer a `HMutex` for mutual exclusion.
+/// So a semaphore is not re-entrant. Prefer an `HMutex` for mutual exclusion.
 ///
 /// Thread-safe: any number of threads may call any operation at the same time. Releasing a unit
 /// happens-before its acquisition. Which waiter gets a unit is unspecified. A waiter killed by
@@ -51,7 +51,7 @@ private:
     HNativeSemaphore* mpoHandle = nullptr;  // owned; set by the constructor and never changed
 };
 
-/// Holds one unit of a `HSemaphore` for a scope, or nothing.
+/// Holds one unit of an `HSemaphore` for a scope, or nothing.
 ///
 /// Not thread-safe: an object belongs to one thread at a time; another thread may release it later. It can't
 /// be made with `new`. A copy acquires a unit of its own: if its source holds the last unit and no other

@@ -143,7 +143,7 @@ inline bool HWriteJson(std::ostream& stream, const GlobalTimerSnapshot& timers) 
 /// `…_site_allocated_bytes`, `…_site_allocations`; `zanbase_disk_io_operations`, `…_operation_seconds` and
 /// `…_moved_bytes` of each file and operation; `zanbase_timer_seconds` and `…_open_seconds`. Bytes that are not UTF-8
 /// become U+FFFD. Rows of one call site that follow each other are added up, as monitoring systems refuse the same
-/// series twice. Requires: the snapshots are of `Take` or `Merge`; a difference is no counter. Thread-safe for
+/// series twice. Requires: the snapshots are of `Take` or `Merge`; a difference is not a counter. Thread-safe for
 /// different streams.
 inline bool HWriteOpenMetrics(std::ostream& stream, const HMemorySnapshot* memory,
                               const HDiskIOSnapshot* diskIO, const GlobalTimerSnapshot* timers) {

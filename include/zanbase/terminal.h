@@ -54,7 +54,7 @@ ZANBASE_API const char* IMPGetMajorRev();
 ///
 /// On Linux the console is the controlling terminal of the process. Without one it is a window of the program
 /// `xterm` on the display that the environment variable `DISPLAY` names; the call waits for the window for
-/// at most half a minute. The window's process is no child of the program and sends it no signal. When the
+/// at most half a minute. The window's process is not a child of the program and sends it no signal. When the
 /// user closes the window, reading gives end-of-file and writing fails.
 ///
 /// On Windows the console is one of the system's, with a window. It can't be made where the process has one already,

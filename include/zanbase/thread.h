@@ -98,7 +98,7 @@ public:
 
     /// Terminates the thread asynchronously and returns when it is gone and the object is idle. Returns at
     /// once if there is no thread; does not return on the thread itself. No destructor, handler or exit
-    /// routine of the thread runs. What it holds stays held for ever, such as a `HMutex`, or the mutex inside
+    /// routine of the thread runs. What it holds stays held for ever, such as an `HMutex`, or the mutex inside
     /// `HMemory::Alloc` or `MkName`; what it was changing stays half changed. A later `fork` leaves out such a
     /// mutex of the library, the first one after a wait of five seconds, and its child must not use the table that
     /// the mutex guards. Use it only if nothing else is left.
@@ -133,9 +133,9 @@ public:
     /// On Windows it is `TerminateThread`, which takes effect at once:
     ///   - A thread inside the C runtime or the loader leaves their locks held: the next thread that allocates,
     ///     starts or ends may deadlock.
-    ///   - Never kill a thread that waits for a `HMutex` or on a `HCondVar`: the behaviour is undefined. The system
+    ///   - Never kill a thread that waits for an `HMutex` or on an `HCondVar`: the behaviour is undefined. The system
     ///     keeps the waiters in a list on their stacks, so the next wake-up may be lost or may access memory that is
-    ///     gone. A `HSemaphore` serves its other waiters.
+    ///     gone. An `HSemaphore` serves its other waiters.
     ///   - A thread that waits in `Wait` leaves a handle and a small block behind.
     void Kill();
 

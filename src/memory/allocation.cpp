@@ -1,4 +1,4 @@
-// The allocators that retry: one loop, four attempts.
+// The allocators that retry: one loop around the attempts of three of them, and that of HString, which differs.
 #include "zanbase/allocation.h"
 
 #include <atomic>

@@ -14,7 +14,7 @@ unsigned char ByteAt(std::string_view text, std::size_t index) {
 }
 
 // What a lead byte says: the length of its character and the range of the byte after it, which rules out long
-// forms, surrogates and what is above U+10FFFF. Length 0 is no lead byte.
+// forms, surrogates and what is above U+10FFFF. Length 0 marks a byte that is not a lead byte.
 struct LeadByte {
     std::size_t length;
     unsigned char low, high;

@@ -10,7 +10,7 @@ namespace {
 
 // Apart, because the tool knows the last four accesses of every eight bytes.
 alignas(8) int data = 0;
-alignas(8) std::atomic<int> steps{0};  // tells a thread when to continue; relaxed, so it orders nothing
+alignas(8) std::atomic<int> steps{0};  // the step at which a thread continues; relaxed, so it orders nothing
 
 void UseData() {
     ++data;

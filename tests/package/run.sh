@@ -29,7 +29,7 @@ export PKG_CONFIG_PATH LD_LIBRARY_PATH
 read -ra flags <<<"-std=c++17 -Wall -Wextra -Werror $(pkg-config --cflags zanbase)"
 flags+=(-DPACKAGE_VERSION="\"$(pkg-config --modversion zanbase)\"")
 read -ra libraries <<<"$(pkg-config --libs zanbase)"
-# No header of Boost may be needed: the preprocessor tells every file that a translation unit reads.
+# No header of Boost may be needed: the preprocessor names every file that a translation unit reads.
 if "$compiler" "${flags[@]}" -M "$consumer/main.cpp" | grep -F /boost/; then exit 1; fi
 "$compiler" "${flags[@]}" "$consumer/main.cpp" "${libraries[@]}" -o "$work/program"
 "$work/program"

@@ -10,7 +10,7 @@ ZANBASE_AS_WRITTEN WriteToNull() {
     *nowhere = 1;
 }
 
-// The processor must fault at these: 64-bit ARM divides by zero without one, and its trap is no fault.
+// The processor must fault at these: 64-bit ARM divides by zero without one, and its trap is not a fault.
 #if defined(__aarch64__)
 ZANBASE_AS_WRITTEN RunIllegalInstruction() { __asm__ volatile("udf #0"); }
 ZANBASE_AS_WRITTEN DivideByZero() { RunIllegalInstruction(); }

@@ -31,7 +31,7 @@ void SetEnvironment(const char* name, const char* value) {
     }
 }
 
-// Reads what the kernel tells of its threads.
+// Reads what the kernel reports of its threads.
 void AwaitSleepOf(unsigned long long thread) {
     for (std::string state; state != "S"; std::this_thread::yield()) {
         std::ifstream status("/proc/self/task/" + std::to_string(thread) + "/stat");

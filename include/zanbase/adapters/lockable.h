@@ -28,7 +28,7 @@
 /// `HCondVar` waits too, without an allocation: `condition.Wait(mutex.GetMutex())`.
 ///
 /// The program examples/adapters/lockable.cpp shows all of them. What a lock promises about fairness,
-/// re-entrance and killed threads is told at `HMutex` and `HReadWriteMutex`. Locks can't be copied or moved.
+/// re-entrance and killed threads is documented at `HMutex` and `HReadWriteMutex`. Locks can't be copied or moved.
 #ifndef ZANBASE_ADAPTERS_LOCKABLE_H
 #define ZANBASE_ADAPTERS_LOCKABLE_H
 
@@ -58,7 +58,7 @@ struct HLockOwner {
     ZANBASE_API static void Require(bool is_held);
 };
 
-/// A `HMutex` as a lockable of the standard. It is re-entrant for its owner; a wait on a condition variable
+/// An `HMutex` as a lockable of the standard. It is re-entrant for its owner; a wait on a condition variable
 /// releases one level only, so the waiting thread must own it exactly once. Thread-safe.
 class ZANBASE_CAPABILITY("mutex") HLockable {
 public:

@@ -11,7 +11,7 @@
 ///
 /// What is recorded: each call that reached the system's or the C library's function and succeeded, with its
 /// time. A failed call is not recorded. So the count of reads includes the last one, which moves 0 bytes. A flush
-/// of a `HRecordedFile` is recorded as a write of 0 bytes.
+/// of an `HRecordedFile` is recorded as a write of 0 bytes.
 ///
 /// Errors: an operation sets its `error` on failure and clears it on success. A failed `Open` gives an object
 /// that is not open; operations on it fail with `bad_file_descriptor`. A function below that fails without a reason
@@ -31,7 +31,7 @@
 /// `Flush` fail with it at once, and `Close` reports it, until `ClearError` has been called. `Seek` works, and shows how
 /// far the file was written.
 ///
-/// Between a read and a write of a `HRecordedFile`, in either order, a seek is required, as for every stream of C.
+/// Between a read and a write of an `HRecordedFile`, in either order, a seek is required, as for every stream of C.
 ///
 /// An object may be used by one thread at a time, different objects by different threads. Its handle in the
 /// ledger is a block of its own that is released after the close was recorded, so no other file can have

@@ -1,4 +1,4 @@
-// The lock inside a HNativeLock.
+// The lock inside an HNativeLock.
 #ifndef ZANBASE_PLATFORM_LINUX_SYSTEM_LOCK_H
 #define ZANBASE_PLATFORM_LINUX_SYSTEM_LOCK_H
 

@@ -22,7 +22,7 @@ set(ZANBASE_PLATFORM_SOURCES
 find_package(Intl REQUIRED)
 set_property(TARGET Intl::Intl PROPERTY IMPORTED_GLOBAL TRUE)  # for the tests too
 set(ZANBASE_PLATFORM_LIBRARIES Intl::Intl
-    ntdll         # tells whether the process is ending
+    ntdll         # reports whether the process is ending
     -l:libssp.a)  # the stack protector, in the file itself: its DLL would be one more to install
 
 set(CMAKE_SHARED_LIBRARY_PREFIX "")  # zanbase.dll
