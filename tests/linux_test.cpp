@@ -171,7 +171,7 @@ TEST(LinuxGuard, ForwardsTheWakeUpsOfAnAbandonedBody) {
     static FutexWord word{0};
     std::thread sleeper = SleepIn([] { SleepWhile(word, 0, nullptr); });
     const auto body = [](void*) {
-        const PendingWakeup pending(word);
+        const ForwardWakeupIfKilled pending(word);
         word = 1;
         WriteToNull();
     };

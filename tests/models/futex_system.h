@@ -69,8 +69,8 @@ struct ModelSystem {
     using Word = ModelWord<unsigned int>;
     using DoubleWord = ModelWord<unsigned long long>;
     using Deadline = const int*;
-    using PendingWakeup = Pending<kPendingWakeup, Fault::kForgetsWakeups>;
-    using PendingSignal = Pending<kPendingSignal, Fault::kForgetsSignals>;
+    using ForwardWakeupIfKilled = Pending<kPendingWakeup, Fault::kForgetsWakeups>;
+    using ForwardSignalIfKilled = Pending<kPendingSignal, Fault::kForgetsSignals>;
     static constexpr int kEverySleeper = kThreads;
 
     static bool IsAlone() { return false; }

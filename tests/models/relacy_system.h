@@ -117,14 +117,14 @@ struct RelacySystem {
     using Word = RelacyAtomic<unsigned int>;
     using DoubleWord = RelacyAtomic<unsigned long long>;
     using Deadline = const int*;
-    struct PendingWakeup {
+    struct ForwardWakeupIfKilled {
         template <class AnyWord>
-        explicit PendingWakeup(AnyWord&) {}
-        ~PendingWakeup() {}
+        explicit ForwardWakeupIfKilled(AnyWord&) {}
+        ~ForwardWakeupIfKilled() {}
     };
-    struct PendingSignal {
-        PendingSignal(Word&, unsigned int) {}
-        ~PendingSignal() {}
+    struct ForwardSignalIfKilled {
+        ForwardSignalIfKilled(Word&, unsigned int) {}
+        ~ForwardSignalIfKilled() {}
     };
     static constexpr int kEverySleeper = 3;
 

@@ -53,36 +53,37 @@ extern ZANBASE_FAST_THREAD_LOCAL PendingWakeups toPendingWakeups;
 // since. Async-signal-safe.
 void ForwardPendingWakeups() noexcept;
 
-// Notes a pending wake-up on a lock or semaphore word for a scope.
-class PendingWakeup {
+// Notes a pending wake-up on a lock or semaphore word for a scope: a kill in it forwards the wake-up.
+class ForwardWakeupIfKilled {
 public:
-    explicit PendingWakeup(FutexWord& word) noexcept {
+    explicit ForwardWakeupIfKilled(FutexWord& word) noexcept {
         toPendingWakeups.mpoWord = &word;
         std::atomic_signal_fence(std::memory_order_seq_cst);
     }
-    ~PendingWakeup() {
+    ~ForwardWakeupIfKilled() {
         std::atomic_signal_fence(std::memory_order_seq_cst);
         toPendingWakeups.mpoWord = nullptr;
     }
-    PendingWakeup(const PendingWakeup&) = delete;
-    PendingWakeup& operator=(const PendingWakeup&) = delete;
+    ForwardWakeupIfKilled(const ForwardWakeupIfKilled&) = delete;
+    ForwardWakeupIfKilled& operator=(const ForwardWakeupIfKilled&) = delete;
 };
 
-// Notes a pending wake-up on a condition for a scope; its word was `seen` at the start of the wait.
-class PendingSignal {
+// Notes a pending wake-up on a condition for a scope: a kill in it forwards the wake-up. The condition's word was
+// `seen` at the start of the wait.
+class ForwardSignalIfKilled {
 public:
-    PendingSignal(FutexWord& word, unsigned int seen) noexcept {
+    ForwardSignalIfKilled(FutexWord& word, unsigned int seen) noexcept {
         toPendingWakeups.mnSeen = seen;
         std::atomic_signal_fence(std::memory_order_seq_cst);
         toPendingWakeups.mpoCondition = &word;
         std::atomic_signal_fence(std::memory_order_seq_cst);
     }
-    ~PendingSignal() {
+    ~ForwardSignalIfKilled() {
         std::atomic_signal_fence(std::memory_order_seq_cst);
         toPendingWakeups.mpoCondition = nullptr;
     }
-    PendingSignal(const PendingSignal&) = delete;
-    PendingSignal& operator=(const PendingSignal&) = delete;
+    ForwardSignalIfKilled(const ForwardSignalIfKilled&) = delete;
+    ForwardSignalIfKilled& operator=(const ForwardSignalIfKilled&) = delete;
 };
 
 #endif

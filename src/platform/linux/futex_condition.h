@@ -33,7 +33,7 @@ public:
     bool Wait(const Lock& lock, typename System::Deadline deadline) {
         const unsigned int seen = mnSequence.fetch_or(kSleepers, std::memory_order_relaxed) | kSleepers;
         lock.Release();
-        const typename System::PendingSignal pending(mnSequence, seen);
+        const typename System::ForwardSignalIfKilled pending(mnSequence, seen);
         const bool woken = System::SleepWhile(mnSequence, seen, deadline);
         lock.Acquire();
         return woken;
@@ -41,14 +41,14 @@ public:
 
     void Signal() {
         if ((mnSequence.load(std::memory_order_relaxed) & kSleepers) == 0) return;
-        const typename System::PendingWakeup pending(mnSequence);
+        const typename System::ForwardWakeupIfKilled pending(mnSequence);
         mnSequence.fetch_add(2, std::memory_order_relaxed);
         if (System::WakeSleepers(mnSequence, 1) == 0) WakeAll();
     }
 
     void Broadcast() {
         if ((mnSequence.load(std::memory_order_relaxed) & kSleepers) == 0) return;
-        const typename System::PendingWakeup pending(mnSequence);
+        const typename System::ForwardWakeupIfKilled pending(mnSequence);
         WakeAll();
     }
 

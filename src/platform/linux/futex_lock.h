@@ -86,7 +86,7 @@ private:
     static constexpr Thread kSleepers = 1;
 
     __attribute__((noinline)) void AcquireContended(Thread self) {
-        const typename System::PendingWakeup pending(System::LowerHalf(mnState));
+        const typename System::ForwardWakeupIfKilled pending(System::LowerHalf(mnState));
         Thread seen = 0;  // a woken waiter expects a free lock; a compare-and-exchange that fails corrects it
         for (;;) {
             const Thread desired = (seen == 0 ? self : seen) | kSleepers;
@@ -101,7 +101,7 @@ private:
 
     // The sleepers' bit is set and stays so: only the owner changes the word from there.
     __attribute__((noinline)) void ReleaseAndWake() {
-        const typename System::PendingWakeup pending(System::LowerHalf(mnState));
+        const typename System::ForwardWakeupIfKilled pending(System::LowerHalf(mnState));
         mnState.store(0, std::memory_order_release);
         System::WakeSleepers(System::LowerHalf(mnState), 1);
     }

@@ -55,7 +55,7 @@ private:
     static constexpr unsigned int kSleepers = ~kMost;
 
     __attribute__((noinline)) bool AcquireContended(typename System::Deadline deadline) {
-        const typename System::PendingWakeup pending(mnUnits);
+        const typename System::ForwardWakeupIfKilled pending(mnUnits);
         unsigned int seen = mnUnits.load(std::memory_order_relaxed);
         for (;;) {
             if ((seen & kMost) != 0) {
@@ -70,7 +70,7 @@ private:
     }
 
     __attribute__((noinline)) void ReleaseAndWake() {
-        const typename System::PendingWakeup pending(mnUnits);
+        const typename System::ForwardWakeupIfKilled pending(mnUnits);
         unsigned int seen = mnUnits.load(std::memory_order_relaxed);
         do {
             if ((seen & kMost) == kMost) return;

@@ -11,8 +11,8 @@ struct FutexSystem {
     using Word = FutexWord;
     using DoubleWord = std::atomic<unsigned long long>;
     using Deadline = const timespec*;  // null: none
-    using PendingWakeup = ::PendingWakeup;
-    using PendingSignal = ::PendingSignal;
+    using ForwardWakeupIfKilled = ::ForwardWakeupIfKilled;
+    using ForwardSignalIfKilled = ::ForwardSignalIfKilled;
     static constexpr int kEverySleeper = ::kEverySleeper;
 
     // For the kernel, which takes 32 bits: what it compares, and the address that a sleeper is known by.

@@ -93,7 +93,7 @@ void AbandonWait() noexcept {
 }
 
 void WaitForNewGeneration(HNativeThread* block, unsigned int seen) noexcept {
-    const PendingWakeup pending(block->mnGeneration);
+    const ForwardWakeupIfKilled pending(block->mnGeneration);
     while (block->mnGeneration.load(std::memory_order_relaxed) == seen)
         SleepWhile(block->mnGeneration, seen, nullptr);
 }
