@@ -22,11 +22,11 @@ std::size_t FindParameters(const std::string& name) {
 
 }  // namespace
 
-std::string ReadableName(const char* linkerName) {
-    if (std::strncmp(linkerName, "_Z", 2) != 0) return linkerName;
+std::string ReadableName(const char* linker_name) {
+    if (std::strncmp(linker_name, "_Z", 2) != 0) return linker_name;
     int status = 0;
-    char* const text = abi::__cxa_demangle(linkerName, nullptr, nullptr, &status);
-    if (text == nullptr) return linkerName;
+    char* const text = abi::__cxa_demangle(linker_name, nullptr, nullptr, &status);
+    if (text == nullptr) return linker_name;
     std::string name = text;
     std::free(text);
     if (name.find("operator") == std::string::npos) name = name.substr(0, FindParameters(name));

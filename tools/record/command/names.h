@@ -7,7 +7,7 @@
 namespace recorder {
 
 // The demangled name without its parameters, or the name itself if it is no C++ name.
-std::string ReadableName(const char* linkerName);
+std::string ReadableName(const char* linker_name);
 
 }  // namespace recorder
 

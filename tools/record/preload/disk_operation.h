@@ -23,17 +23,17 @@ auto Operate(DiskOperation operation, int descriptor, const Call& real) {
     return result;
 }
 
-// Calls `real`, which opens `path`, and counts the open of the descriptor that `descriptorOf` finds in its
+// Calls `real`, which opens `path`, and counts the open of the descriptor that `descriptor_of` finds in its
 // result.
 template <class Call, class Descriptor>
-auto Open(const char* path, const Call& real, const Descriptor& descriptorOf) {
+auto Open(const char* path, const Call& real, const Descriptor& descriptor_of) {
     if (!Wants(kDisk)) return real();
     const std::uint64_t start = Now();
     gThread.opening = true;
     const auto result = real();
     gThread.opening = false;
     const std::uint64_t end = Now();
-    const int descriptor = descriptorOf(result);
+    const int descriptor = descriptor_of(result);
     if (descriptor >= 0) CountOpen(descriptor, path, end - start);
     return result;
 }
