@@ -21,15 +21,15 @@ expect() {
 says() { grep -q -- "$1" "${2:-err}" || { cat "${2:-err}" && fail "not said: $1"; }; }
 
 # The rows that the comments of a source foretell, and those of a report in CSV: line, calls, bytes, live blocks and bytes.
-foretold() { awk 'match($0, /\/\/ row .*/) {print FNR, substr($0, RSTART + 7)}' "$here/$1"; }
+expected() { awk 'match($0, /\/\/ row .*/) {print FNR, substr($0, RSTART + 7)}' "$here/$1"; }
 reported() { awk -F, -v file="/$1\"" 'index($1, file) {print $2, $7, $5, $3, $4}' report | sort -n; }
 same() { diff "$1" "$2" >&2 || fail "rows of $3: the left ones are expected"; }
 
 # Lines without a comment allocate what depends on the C library's version, such as a thread's block.
 check_rows() {
-    foretold "$1" >foretold
-    reported "$1" | awk 'NR == FNR {known[$1]; next} $1 in known' foretold - >reported
-    same foretold reported "$1"
+    expected "$1" >expected
+    reported "$1" | awk 'NR == FNR {known[$1]; next} $1 in known' expected - >reported
+    same expected reported "$1"
 }
 
 case $case in
@@ -70,7 +70,7 @@ options) # comparison, budgets, a report on a signal, children, an allocator beh
         ./small leak 10
     expect 3 "$record" --output report --max-leaked 159 ./small leak 10
     says 'bytes leaked: 160 exceed the budget of 159; most: .*/small\.c:[0-9]* (160)'
-    # What the C library keeps for a stream is no leak, nor is what the user has named.
+    # What the C library keeps for a stream is not a leak, nor is what the user has named.
     expect 0 "$record" --output report --max-leaked 0 ./small print
     echo 'leak:mai*' >suppressed
     expect 0 "$record" --output report --suppress suppressed --max-leaked 0 ./small leak 10

@@ -1,4 +1,4 @@
-// A C program with known rows: a comment "row" tells calls, bytes, live blocks and live bytes of its line.
+// A C program with known rows: a comment "row" states calls, bytes, live blocks and live bytes of its line.
 #define _GNU_SOURCE
 #include <fcntl.h>
 #include <malloc.h>
@@ -45,7 +45,7 @@ static void Disk(const char* path) {
     if (pread(copy, text, 7, 0) != 7) abort();
     close(file);
     close(copy);
-    // The number of the file is now a socket's, whose bytes are no file's.
+    // The number of the file is now a socket's, whose bytes are not a file's.
     int pair[2];
     if (socketpair(AF_UNIX, SOCK_STREAM, 0, pair) != 0 || write(pair[0], text, 50) != 50) abort();
     close(pair[0]);

@@ -1,4 +1,4 @@
-// A C++ program with known rows: a comment "row" tells calls, bytes, live blocks and live bytes of its line.
+// A C++ program with known rows: a comment "row" states calls, bytes, live blocks and live bytes of its line.
 // Its arguments are two plug-ins that are loaded one after the other, the first twice.
 #include <dlfcn.h>
 

@@ -22,7 +22,7 @@ std::string PlaceOf(const Json& row) {
     return file + " " + function + "+" + std::to_string(line - function_line);
 }
 
-// Names that are no text have their bytes in hexadecimal beside them; for a comparison the readable form will do.
+// Names that are not text have their bytes in hexadecimal beside them; for a comparison the readable form will do.
 void ReadMemory(const Json& json, Accounts& accounts) {
     HMemorySnapshot& memory = accounts.memory;
     memory.mnTotal = json.at("total");
@@ -73,7 +73,7 @@ Accounts ReadAccounts(const std::string& path) {
         if (json.contains("run")) accounts.run = ReadRun(json.at("run"));
         return accounts;
     } catch (const Json::exception& error) {
-        throw std::runtime_error(path + " is no report in JSON: " + error.what());
+        throw std::runtime_error(path + " is not a report in JSON: " + error.what());
     }
 }
 

@@ -1,4 +1,4 @@
-// What can be told of a program before it runs: whether the loader will load the recorder, and what
+// What can be known of a program before it runs: whether the loader will load the recorder, and what
 // allocates.
 #include "checks.h"
 
@@ -89,7 +89,7 @@ Recordable CheckProgram(const std::string& path) {
     const std::string interpreter = InterpreterOf(path);
     const std::string program = interpreter.empty() ? path : interpreter;
     const ElfFile file(program.c_str());
-    if (!file.ok()) return {program + " is no program of this machine's kind", {}};
+    if (!file.ok()) return {program + " is not a program of this machine's kind", {}};
     if (!file.HasInterpreter())
         return {program + " is linked statically: no library can be loaded into it", {}};
     if (GainsRights(program))

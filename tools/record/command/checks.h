@@ -1,4 +1,4 @@
-// What can be told of a program before it runs.
+// What can be known of a program before it runs.
 #ifndef ZANBASE_RECORD_CHECKS_H
 #define ZANBASE_RECORD_CHECKS_H
 

@@ -80,8 +80,8 @@ std::vector<std::string> ElfFile::NeededLibraries() const {
 }
 
 void ElfFile::ForEachFunction(
-    bool dynamicOnly, const std::function<void(const char*, std::uint64_t, std::uint64_t)>& use) const {
-    const Elf64_Shdr* symbols = dynamicOnly ? nullptr : FindSection(SHT_SYMTAB);
+    bool dynamic_only, const std::function<void(const char*, std::uint64_t, std::uint64_t)>& use) const {
+    const Elf64_Shdr* symbols = dynamic_only ? nullptr : FindSection(SHT_SYMTAB);
     if (symbols == nullptr) symbols = FindSection(SHT_DYNSYM);
     if (symbols == nullptr || symbols->sh_link >= mpoHeader->e_shnum) return;
     const std::uint64_t count = symbols->sh_size / sizeof(Elf64_Sym);

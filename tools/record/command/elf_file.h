@@ -15,7 +15,7 @@ namespace recorder {
 
 class ElfFile {
 public:
-    // `ok()` tells whether the file at `path` could be read as an ELF file of this machine's class.
+    // `ok()` states whether the file at `path` could be read as an ELF file of this machine's class.
     explicit ElfFile(const char* path);
     ~ElfFile();
     ElfFile(const ElfFile&) = delete;
@@ -28,9 +28,9 @@ public:
     // The names of the libraries that the file is linked against.
     std::vector<std::string> NeededLibraries() const;
 
-    // Calls `use` with the name, address and size of every function that the file defines; `dynamicOnly`
+    // Calls `use` with the name, address and size of every function that the file defines; `dynamic_only`
     // leaves out those that the loader doesn't see.
-    void ForEachFunction(bool dynamicOnly,
+    void ForEachFunction(bool dynamic_only,
                          const std::function<void(const char*, std::uint64_t, std::uint64_t)>& use) const;
 
 private:

@@ -36,7 +36,7 @@ void Fill(std::array<char, kSize>& place, const std::string& text) {
     std::memcpy(place.data(), text.c_str(), text.size() + 1);
 }
 
-// A number that programs leave alone, within what any process may use. It stays open in the program until the
+// A number that programs don't use, within what any process may use. It stays open in the program until the
 // library has the file, and for as long as processes are followed.
 int InheritedCopy(int file) {
     rlimit limit{};

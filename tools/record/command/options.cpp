@@ -42,7 +42,7 @@ double ReadPositive(const std::string& option, const std::string& text, bool may
     return number;
 }
 
-// The command itself waits for these, so those that report its own faults, stop it or end it are no choice.
+// The command itself waits for these, so those that report its own faults, stop it or end it can't be chosen.
 int ReadSignal(const std::string& text) {
     const std::string name = text.compare(0, 3, "SIG") == 0 ? text.substr(3) : text;
     for (int number = 1; number < SIGRTMIN; ++number) {

@@ -40,7 +40,7 @@ struct TextPlace {
     std::uint64_t bytes;
 };
 
-// What the command tells the library, and where the accounts are.
+// What the command passes to the library, and where the accounts are.
 struct Control {
     std::uint64_t magic;
     std::uint32_t wanted;            // bits, as above

@@ -19,7 +19,7 @@ constexpr std::uint64_t kLargestBlock = (std::uint64_t{1} << (64 - kNodeBits)) -
 static_assert(kShards == std::size_t{1} << kShardBits);
 
 struct Entry {
-    std::uint64_t block;  // 0 is no entry
+    std::uint64_t block;  // 0: the entry is empty
     std::uint64_t size_and_node;
 };
 

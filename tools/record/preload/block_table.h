@@ -1,5 +1,5 @@
 // The memory account: live blocks by address, usage by stack. It is split into shards by address, each with a
-// lock of its own, so that threads with heaps of their own seldom meet; the total and its peak are counters
+// lock of its own, so that threads with heaps of their own rarely contend; the total and its peak are counters
 // of the whole account.
 #ifndef ZANBASE_RECORD_BLOCK_TABLE_H
 #define ZANBASE_RECORD_BLOCK_TABLE_H

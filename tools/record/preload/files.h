@@ -10,7 +10,7 @@
 
 namespace recorder {
 
-// The row that `descriptor` stands for, or null if it is no regular file. A descriptor that was not looked at
+// The row that `descriptor` stands for, or null if it is not a regular file. A descriptor that was not looked at
 // yet was opened where no hook sees it, and that open is counted without time, unless a hook will count it. A
 // child of vfork makes no marks, so it counts no such open.
 FileRow* FileOf(int descriptor);

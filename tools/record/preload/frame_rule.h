@@ -18,7 +18,7 @@ struct FrameRule {
     std::int64_t frame_pointer_offset;  // from the CFA
 };
 
-// The packed rule: bit 0 is set if the caller can be found, bit 1 tells the register and bit 3 whether the
+// The packed rule: bit 0 is set if the caller can be found, bit 1 selects the register and bit 3 whether the
 // frame pointer was saved; bit 2 is kStop. The offsets follow.
 using PackedRule = std::uint64_t;
 constexpr PackedRule kLeadsOn = 1;

@@ -31,7 +31,7 @@ void* NextSymbol::Find() {
     const RecursionGuard guard;
     gLookingUp = true;
     void* found = dlsym(RTLD_NEXT, mpcName);
-    // A C program may load a C++ library as a private one, whose runtime is no part of the global scope then.
+    // A C program may load a C++ library as a private one, whose runtime is not part of the global scope then.
     const bool is_operator = mpcName[0] == '_' && mpcName[1] == 'Z';
     for (const char* runtime : {"libstdc++.so.6", "libc++.so.1"}) {
         if (found != nullptr || !is_operator) break;

@@ -85,7 +85,7 @@ std::uint32_t DecideAtStart(const char* value) {
     if (gControl == nullptr || gControl->magic != kMagic) return kDecided;
     if (is_followed) gOwnDescriptor = file;
     if (!is_followed && syscall(SYS_getpid) != gControl->process) return kDecided;
-    // Without this a child could not be told from its parent.
+    // Without this a child could not be distinguished from its parent.
     if (madvise(&gForkPage, sizeof gForkPage, MADV_WIPEONFORK) != 0) return kDecided;
     KeepProgramPath();
     return StateFor(AddAccount());

@@ -42,7 +42,7 @@ inline bool Wants(std::uint32_t kind) {
     return (state & kind) != 0;
 }
 
-// Records a block that `caller` got; null is no block. Requires: Wants(kMemory).
+// Records a block that `caller` got; null is not a block. Requires: Wants(kMemory).
 void RecordBlock(const void* block, std::size_t size, const Frame& caller);
 
 // Records that `block` is about to be freed. Requires: Wants(kMemory).

@@ -50,7 +50,7 @@ TableRows<decltype(Account::nodes)> gNodes;
 
 std::array<char, 4096> gProgramPath{};
 
-// Beside each module's row, what tells whether it is still loaded.
+// Beside each module's row, what shows whether it is still loaded.
 struct LoadedModule {
     const void* link_map;  // null if it is not
     std::uintptr_t start;
