@@ -16,6 +16,7 @@ namespace {
 std::uint64_t Value(const Counter& counter) { return counter.load(std::memory_order_relaxed); }
 
 // Rows that are valid, but no more than fit.
+// Pairs with the library's stores of counts, which follow those of the rows.
 template <class Table>
 std::uint64_t CountOf(const Table& table) {
     return std::min<std::uint64_t>(table.count.load(std::memory_order_acquire),
@@ -68,6 +69,7 @@ template <class Table>
 typename Table::Row* AccountFile::RowOf(const Table& table, std::uint64_t row) {
     using Row = typename Table::Row;
     if (row >= Table::kRows) return nullptr;
+    // Pairs with the library's Make.
     const Position chunk = table.chunks[row / Table::kChunkRows].load(std::memory_order_acquire);
     Row* const rows = At<Row>(chunk, Table::kChunkRows);
     return rows == nullptr ? nullptr : &rows[row % Table::kChunkRows];
@@ -83,6 +85,7 @@ std::vector<Position> AccountFile::Accounts() {
     std::unordered_set<Position> seen;
     Refresh();
     if (mnBytes < sizeof(Control)) return positions;
+    // Pairs with the library's AddAccount.
     Position position = control().newest.load(std::memory_order_acquire);
     for (const Account* account = nullptr;
          (account = At<Account>(position)) != nullptr && seen.insert(position).second;) {

@@ -49,7 +49,7 @@ Mark* MarkOf(int descriptor) {
     const auto number = static_cast<std::size_t>(descriptor);
     if (descriptor < 0 || number >= kMarksOfPage * kMarkPages) return nullptr;
     std::atomic<Mark*>& page = gMarks[number / kMarksOfPage];
-    Mark* marks = page.load(std::memory_order_acquire);
+    Mark* marks = page.load(std::memory_order_acquire);  // pairs with the exchange below
     if (marks == nullptr) {
         const RecursionGuard guard;
         auto* const fresh = static_cast<Mark*>(MapPages(kMarksOfPage * sizeof(Mark), true));
@@ -119,7 +119,7 @@ std::uint32_t AddRow(const TextPlace& name) {
         return kNoFile;
     }
     row->name = name;
-    account.files.count.store(number + 1, std::memory_order_release);
+    account.files.count.store(number + 1, std::memory_order_release);  // pairs with the command's CountOf
     return static_cast<std::uint32_t>(number) + kFirstMark;
 }
 
@@ -171,7 +171,7 @@ FileRow* LookAt(int descriptor, Mark& mark, const char* path) {
 FileRow* FileOf(int descriptor) {
     Mark* const mark = MarkOf(descriptor);
     if (mark == nullptr) return nullptr;
-    const std::uint32_t known = mark->load(std::memory_order_acquire);
+    const std::uint32_t known = mark->load(std::memory_order_acquire);  // pairs with every store to a mark
     if (known != kUnknown) return RowOf(known);
     FileRow* const file = LookAt(descriptor, *mark, nullptr);
     // An open that is under way counts itself.

@@ -68,6 +68,7 @@ bool AddAccount() {
     Position newest = gControl->newest.load(std::memory_order_relaxed);
     do {
         account->previous = newest;
+        // Pairs with the command's load of the newest account.
     } while (!gControl->newest.compare_exchange_weak(newest, position, std::memory_order_release));
     return true;
 }
@@ -97,6 +98,7 @@ std::uint32_t DecideAfterFork() {
     ResetSharedMemory();
     if (!AddAccount()) return kDecided;
     gAccount->arguments = parent.arguments;
+    // Pairs with the command's load.
     gAccount->argument_bytes.store(parent.argument_bytes, std::memory_order_release);
     ResetNodes(parent);
     ResetBlocks(parent.nodes.count);

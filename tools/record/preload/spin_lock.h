@@ -18,7 +18,9 @@ public:
             AcquireSlowly();
         }
     }
-    void Release() { mbHeld.store(false, std::memory_order_release); }
+    void Release() {
+        mbHeld.store(false, std::memory_order_release);
+    }  // pairs with the exchanges that acquire
 
 private:
     void AcquireSlowly();

@@ -65,6 +65,7 @@ std::size_t MaskOf(const StepTable& table) { return (std::size_t{1} << table.bit
 
 // What the step leads to; 0 if it was not made yet.
 std::uint32_t FindStep(std::uint32_t from, std::uintptr_t pc) {
+    // The loads pair with the stores of the table and, in Put, of a step's pc.
     const StepTable* const table = gSteps.load(std::memory_order_acquire);
     if (table == nullptr) return 0;
     for (std::size_t slot = HomeOf(*table, from, pc);; slot = (slot + 1) & MaskOf(*table)) {
@@ -79,7 +80,7 @@ void Put(StepTable& table, std::uintptr_t pc, std::uint64_t step) {
     std::size_t slot = HomeOf(table, static_cast<std::uint32_t>(step >> 32), pc);
     while (table.slots[slot].pc.load(std::memory_order_relaxed) != 0) slot = (slot + 1) & MaskOf(table);
     table.slots[slot].step.store(step, std::memory_order_relaxed);
-    table.slots[slot].pc.store(pc, std::memory_order_release);
+    table.slots[slot].pc.store(pc, std::memory_order_release);  // pairs with FindStep
     ++table.count;
 }
 
@@ -96,7 +97,7 @@ StepTable* TableWithRoom() {
         const std::uintptr_t pc = old->slots[slot].pc.load(std::memory_order_relaxed);
         if (pc > kRetired) Put(*table, pc, old->slots[slot].step.load(std::memory_order_relaxed));
     }
-    gSteps.store(table, std::memory_order_release);
+    gSteps.store(table, std::memory_order_release);  // pairs with FindStep
     return table;
 }
 
@@ -165,7 +166,7 @@ std::uint32_t ModuleOf(Account& account, const dl_find_object& found) {
     module->path = KeepPath(found.dlfo_link_map->l_name);
     ReadBuildId(start, module->bias, *module);
     gLoaded[number] = {found.dlfo_link_map, start, module->end};
-    account.modules.count.store(number + 1, std::memory_order_release);
+    account.modules.count.store(number + 1, std::memory_order_release);  // pairs with the command's CountOf
     return static_cast<std::uint32_t>(number);
 }
 
@@ -185,7 +186,7 @@ std::uint32_t AddressOf(Account& account, std::uintptr_t pc) {
         address->offset = pc - found.dlfo_link_map->l_addr;
         if (found.dlfo_eh_frame != nullptr) address->rule = PackRule(RuleAt(pc - 1, found.dlfo_eh_frame));
     }
-    account.addresses.count.store(number + 1, std::memory_order_release);
+    account.addresses.count.store(number + 1, std::memory_order_release);  // pairs with the command's CountOf
     return PutStep(kAddresses, pc, number);
 }
 
@@ -202,7 +203,7 @@ NodeId MakeNode(Account& account, NodeId parent, std::uintptr_t pc) {
     node->parent = parent;
     node->address = address;
     node->rule.store(row->rule, std::memory_order_relaxed);
-    account.nodes.count.store(number + 1, std::memory_order_release);
+    account.nodes.count.store(number + 1, std::memory_order_release);  // pairs with the command's CountOf
     return PutStep(parent, pc, number);
 }
 
