@@ -1,11 +1,10 @@
 // HThread on the threads of the platform layer, with its messages and priorities.
 #include "zanbase/thread.h"
 
-#include <cstdio>
-
 #include "platform/compiler.h"
 #include "platform/race_detector.h"
 #include "platform/thread.h"
+#include "threads/print_line.h"
 #include "threads/reported_body.h"
 
 static_assert(sizeof(ThreadSlot) == sizeof(void*));
@@ -39,8 +38,7 @@ bool HThread::Start(bool) {
         RunReported(kRunName, run, thread);
     };
     if (const int error = StartThread(mpoThread, body, this)) {
-        std::printf("HThread::Start(%p) Error: %s\n", static_cast<void*>(this),
-                    SystemErrorText(error).c_str());
+        PrintLine("HThread::Start(%p) Error: %s\n", static_cast<void*>(this), SystemErrorText(error).c_str());
         return false;
     }
     const HThreadPriority priority = mnPriority;
