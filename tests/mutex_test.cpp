@@ -1,4 +1,4 @@
-// HMutex and its holder; locks_stress.cpp runs them under many threads.
+// HMutex and its holder; stress/all_stress.cpp runs them under many threads.
 #include "zanbase/mutex.h"
 
 #include <gtest/gtest.h>

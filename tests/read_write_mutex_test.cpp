@@ -1,5 +1,5 @@
-// The read-write locks: which threads enter beside which, and the scoped holders. models/read_write_model.cpp
-// runs their steps in every order.
+// The read-write locks: which threads enter beside which, and the scoped holders. models/memory_model.cpp
+// runs their steps in many orders.
 #include "zanbase/read_write_mutex.h"
 
 #include <gtest/gtest.h>

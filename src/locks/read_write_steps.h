@@ -1,5 +1,5 @@
 // The steps of the two read-write locks, as templates over the lock, so that tests/models can run the shipped
-// code under every order of its steps. `Lock` has those members of HReadPrefMutex that are used here.
+// code under the memory model of C++. `Lock` has those members of HReadPrefMutex that are used here.
 //
 //   State                       mnReaders  mnWriters  moResource  moGate
 //   free                        0          0          free        free

@@ -82,7 +82,6 @@ public:
     }
     // In a step: the thread can't make it now.
     [[noreturn]] static void Block() { throw Pause{}; }
-    [[noreturn]] static void Fail(const char* what) { throw what; }
 
     State now;
     std::size_t self = 0;
@@ -103,8 +102,6 @@ private:
             mine.log.clear();
         } catch (const Pause&) {
             return mine.log.size() > state.threads[thread].log.size();
-        } catch (const char* what) {
-            mFound = what;
         }
         return true;
     }

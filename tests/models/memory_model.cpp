@@ -125,7 +125,9 @@ struct ReadWriteSuite : rl::test_suite<ReadWriteSuite<kDowngrade>, 3> {
     void thread(unsigned int thread) {
         if (thread != 2) {
             HReadWriteSteps::WriteLock(lock, Self());
+            HReadWriteSteps::WriteLock(lock, Self());  // nested
             ++guarded;
+            WriteUnlock();
             if (kCanDowngrade && thread == 0) {
                 ReadLock();
                 WriteUnlock();
@@ -134,6 +136,8 @@ struct ReadWriteSuite : rl::test_suite<ReadWriteSuite<kDowngrade>, 3> {
             WriteUnlock();
         }
         ReadLock();
+        ReadLock();  // nested, past a writer that waits
+        ReadUnlock();
         ReadUnlock();
     }
 };
