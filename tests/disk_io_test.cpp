@@ -3,10 +3,8 @@
 
 #include <gtest/gtest.h>
 
-#include <atomic>
 #include <cmath>
 #include <sstream>
-#include <thread>
 
 #include "diskio/disk_io_report_text.h"
 #include "support/run_in_child.h"
@@ -65,20 +63,6 @@ TEST(DiskIO, MakesTheLedgerAtTheFirstCallThatNeedsIt) {
         });
         EXPECT_EQ(child.exit_code, 0) << script << child.out;
     }
-}
-
-// Threads that make the first call at once share one ledger.
-TEST(DiskIO, CountsWhatManyThreadsRecord) {
-    std::atomic<int> missing{3};
-    const auto record = [&missing](const char* script) {
-        for (--missing; missing > 0;) std::this_thread::yield();
-        for (int round = 0; round < 500; ++round) Play(script);
-        EXPECT_NE(Reports(), "");
-    };
-    std::thread others[] = {std::thread(record, "o2x r2 w2"), std::thread(record, "o3x r3 w3")};
-    record("o1x r1 w1");
-    for (std::thread& other : others) other.join();
-    EXPECT_EQ(State(), "x:1500/0/0 1500(4500)750 1500(7500)375; 1=x");
 }
 
 TEST(DiskIO, RecordsWhatItIsGiven) {

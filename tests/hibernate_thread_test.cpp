@@ -48,16 +48,6 @@ TEST(HHibernateThread, AcceptsNoSignalDuringAPass) {
     worker.AwaitSleepAfter(2);
 }
 
-TEST(HHibernateThread, MakesOnePassForEachSignalThatItAccepts) {
-    Worker worker([](int) {});
-    worker.Start(true);
-    worker.AwaitSleepAfter(2);
-    HoldThread(worker.mnNumber);
-    for (int i = 0; i < 3; ++i) EXPECT_TRUE(worker.Signal());
-    ReleaseThread(worker.mnNumber);
-    worker.AwaitSleepAfter(5);
-}
-
 TEST(HHibernateThread, SurvivesExceptionsAndFaultsInAPass) {
     const ChildResult child = RunInChild([] {
         Worker worker([](int pass) {

@@ -6,7 +6,6 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <climits>
 #include <sstream>
 #include <thread>
 
@@ -14,8 +13,6 @@
 #include "support/run_in_child.h"
 #include "support/runner.h"
 #include "zanbase/semaphore.h"
-
-extern "C" __attribute__((weak)) void __tsan_init();  // defined under the thread sanitizer
 
 TEST(HThread, IsIdleInTheChildOfAFork) {
     const HSemaphore never(0);
@@ -73,29 +70,6 @@ TEST(HThread, StartsWithoutTheKeysOfAKilledThread) {
         entered.Lock();
         runner.Kill();
     }
-}
-
-TEST(HThread, IsAwaitedWithKeysThatAreSetAgain) {
-    if (__tsan_init != nullptr) GTEST_SKIP() << "the tool ends its own record of the thread in the last pass";
-    static pthread_key_t key;
-    static int passes = 0;
-    pthread_key_create(&key, [](void* value) {
-        ++passes;
-        pthread_setspecific(key, value);
-    });
-    const HSemaphore leave(0);
-    Runner runner([&] {
-        pthread_setspecific(key, &key);
-        leave.Lock();
-    });
-    runner.Start(true);
-    std::thread releaser([&, waiter = HThread::GetCurrentThreadId()] {
-        AwaitSleepOf(waiter);
-        leave.Unlock();
-    });
-    runner.Wait();
-    EXPECT_EQ(passes, PTHREAD_DESTRUCTOR_ITERATIONS);
-    releaser.join();
 }
 
 // Each operation is one in which a kill has to wait, and `end` lets it go on.
@@ -171,20 +145,4 @@ TEST(HThread, TakesItsPriorityWheneverItIsSet) {
             runner.Wait();
         }
     }
-}
-
-// Whatever nice value the thread that starts it has set for itself.
-TEST(HThread, BeginsAtThePriorityOfTheProcess) {
-    int nice = -100;
-    Runner runner([&] { nice = getpriority(PRIO_PROCESS, 0); });
-    std::atomic<bool> is_set{false};
-    std::thread starter([&] {
-        while (!is_set) std::this_thread::yield();
-        runner.RunToEnd();
-    });
-    const int raised = getpriority(PRIO_PROCESS, 0) + 1;
-    setpriority(PRIO_PROCESS, static_cast<id_t>(getpid()), raised);  // not of the starter
-    is_set = true;
-    starter.join();
-    EXPECT_EQ(nice, raised);
 }

@@ -2,7 +2,6 @@
 #include <gtest/gtest.h>
 
 #include <map>
-#include <thread>
 
 #include "support/written_text.h"
 #include "zanbase/memory_tables.h"
@@ -125,22 +124,6 @@ TEST_F(Tracker, FollowsADerivedClassThatChangesTheUsageTable) {
     FileMap().swap(*mpoFileMap);
     Add(1, 5, kTable, 1);
     EXPECT_EQ(Usage(), "table:1 +5 in 1 -0 in 0; ");
-}
-
-// In bursts that use up the spare nodes and the remembered sites, with reports in between.
-TEST_F(Tracker, CountsWhatManyThreadsRecord) {
-    const auto record = [](int first) {
-        for (int round = 0; round < 20; ++round) {
-            for (int i = 0; i < 300; ++i) Add(first + i, 2, kTable, i);
-            EXPECT_NE(Reports(), "");
-            for (int i = 0; i < 300; ++i) Drop(first + i);
-        }
-    };
-    std::thread other(record, 300);
-    record(0);
-    other.join();
-    EXPECT_EQ(Blocks(), "");
-    for (int i = 0; i < 300; ++i) EXPECT_EQ(mpoFileMap->at({kFiles[kTable], i}).mnFreed, 80);
 }
 
 // Ordered by size, then by file pointer, then by line, which is signed.

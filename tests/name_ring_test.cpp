@@ -17,15 +17,6 @@ TEST(NameRing, StartsAtSlotZeroAndKeepsANameFor255Takes) {
     EXPECT_STREQ(goNameRing.maSlots[0], "kept");
 }
 
-TEST(NameRing, GivesThreadsDistinctSlots) {
-    for (int round = 0; round < 50; ++round) {
-        const char* names[256];
-#pragma omp parallel for num_threads(4)
-        for (int name = 0; name < 256; ++name) names[name] = MkName("%d", name);
-        for (int name = 0; name < 256; ++name) ASSERT_EQ(names[name], std::to_string(name));
-    }
-}
-
 TEST(NameRing, CutsTextsAtTheEndOfASlot) {
     const std::string full(4095, 'x'), more = full + "y";
     EXPECT_EQ(MkNameC("%s", more.c_str()), full);

@@ -166,12 +166,4 @@ TEST(RecordedStream, DoesWhatTheStandardsDoes) {
     EXPECT_EQ(FileNamed(names[1]).moClose.mnCount, 1);
 }
 
-TEST(RecordedStream, SetsBadbitWhereAFileCanNotBeRead) {
-    HRecordedStreambuf closed((HRecordedDescriptor()));
-    std::istream stream(&closed);
-    EXPECT_EQ(stream.get(), EOF);
-    EXPECT_TRUE(stream.bad());
-    EXPECT_EQ(closed.GetError(), std::errc::bad_file_descriptor);
-}
-
 }  // namespace

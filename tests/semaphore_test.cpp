@@ -30,8 +30,6 @@ int FreeUnits(const HSemaphore& semaphore) {
     return units;
 }
 
-TEST(HSemaphore, HasOneUnitByDefault) { EXPECT_EQ(FreeUnits(HSemaphore()), 1); }
-
 TEST(HSemaphoreLock, ReleasesBeforeItAcquires) {
     HSemaphore first(2);
     HSemaphore second(2);

@@ -5,9 +5,7 @@
 #include <gtest/gtest.h>
 
 #include <memory_resource>
-#include <thread>
 
-#include "zanbase/disk_io.h"
 #include "zanbase/global_timer.h"
 #include "zanbase/memory.h"
 #include "zanbase/string_makers.h"
@@ -27,18 +25,6 @@ std::vector<std::string> Texts(const HMemorySnapshot& memory) {
         texts.push_back(MkString("%s:%d live %lld/%lld alloc %lld/%lld free %lld/%lld", row.moFile.c_str(),
                                  row.mnLine, row.mnLiveBlocks, row.mnLiveBytes, row.mnAllocCount,
                                  row.mnAllocated, row.mnFreeCount, row.mnFreed));
-    }
-    return texts;
-}
-
-std::vector<std::string> Texts(const HDiskIOSnapshot& disk_io) {
-    std::vector<std::string> texts;
-    const auto text = [](const HDiskIOSnapshot::Operation& operation) {
-        return MkString(" %lld/%g/%lld", operation.mnCount, operation.mdSeconds, operation.mnBytes);
-    };
-    for (const auto& row : disk_io.maRows) {
-        texts.push_back(row.moName + text(row.moOpen) + text(row.moClose) + text(row.moSeek) +
-                        text(row.moRead) + text(row.moWrite));
     }
     return texts;
 }
@@ -78,24 +64,6 @@ TEST(MemorySnapshot, SubtractsAndAddsByTextAndLine) {
                                         "a.cpp:2 live 1/10 alloc 1/10 free 0/0"));
     EXPECT_EQ(sum.mnTotal, later.mnTotal);
     HMemory::Reset();
-}
-
-TEST(DiskIOSnapshot, HoldsSubtractsAndAddsFiles) {
-    HDiskIOOpen("b", &blocks[0], 0.5);
-    HDiskIOOpen("a", &blocks[1], 1);
-    HDiskIORead(&blocks[1], 7, 2);
-    HDiskIOSnapshot sum = HDiskIOSnapshot::Take();
-    HDiskIOWrite(&blocks[1], 9, 4);
-    HDiskIOSeek(&blocks[1], 8);
-    HDiskIOClose(&blocks[1], 16);
-    const HDiskIOSnapshot later = HDiskIOSnapshot::Take();
-    EXPECT_THAT(Texts(later),
-                ElementsAre("a 1/1/0 1/16/0 1/8/0 1/2/7 1/4/9", "b 1/0.5/0 0/0/0 0/0/0 0/0/0 0/0/0"));
-    const HDiskIOSnapshot difference = later.Since(sum);
-    EXPECT_THAT(Texts(difference), ElementsAre("a 0/0/0 1/16/0 1/8/0 0/0/0 1/4/9"));
-    sum.Merge(difference);
-    EXPECT_EQ(Texts(sum), Texts(later));
-    HDiskIOReset();
 }
 
 // The later snapshot has a thread more, and a timer without a difference.

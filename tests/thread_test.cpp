@@ -5,14 +5,11 @@
 
 #include <stdexcept>
 #include <thread>
-#include <vector>
 
-#include "support/blocked_thread.h"
 #include "support/environment.h"
 #include "support/faults.h"
 #include "support/run_in_child.h"
 #include "support/runner.h"
-#include "zanbase/mutex.h"
 #include "zanbase/semaphore.h"
 
 // A killed thread's list of thread-local destructors leaks; thread.h documents it.
@@ -81,46 +78,6 @@ TEST(HThread, SurvivesAnExhaustedStack) {
     EXPECT_EQ(child.exit_code, 0) << child.err;
     const std::string unknown = "HThread::_Run_() Unknown exception.\n";
     EXPECT_EQ(child.out, unknown + unknown + unknown);
-}
-
-// Counts when it is destroyed, after some time.
-struct Trace {
-    std::atomic<int>& count;
-    ~Trace() {
-        for (int i = 0; i < 100; ++i) std::this_thread::yield();
-        ++count;
-    }
-};
-
-TEST(HThread, IsAwaitedWithItsTlsDestructorsAndRunsNoneWhenKilled) {
-    static std::atomic<int> gone{0};
-    const HMutex mutex;
-    const HSemaphore entered(0), leave(0);
-    Runner runner([&] {
-        const Trace frame{gone};
-        thread_local const Trace local{gone};
-        const HMutexLock lock(&mutex);
-        entered.Unlock();
-        leave.Lock();
-    });
-    for (const bool kills : {false, true}) {
-        gone = 0;
-        runner.Start(true);
-        entered.Lock();
-        const int due = !kills ? 2 : kKillRunsTlsDestructors ? 1 : 0;
-        std::vector<std::thread> waiters;
-        for (int i = 0; i < 3; ++i) {
-            waiters.push_back(SleepIn([&] {
-                runner.Wait();
-                EXPECT_EQ(gone, due);
-            }));
-        }
-        kills ? runner.Kill() : leave.Unlock();
-        for (std::thread& waiter : waiters) waiter.join();
-        EXPECT_FALSE(runner.IsRunning());
-        EXPECT_EQ(mutex.TryLock(), !kills);
-        if (!kills) mutex.Unlock();
-    }
 }
 
 TEST(HThread, RunsOnDetachedWhileItsObjectOwnsAnother) {

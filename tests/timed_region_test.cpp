@@ -4,13 +4,11 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <string>
 #include <thread>
 #include <vector>
 
 #include "platform/clock.h"
 #include "support/run_in_child.h"
-#include "zanbase/openmp.h"
 #include "zanbase/semaphore.h"
 #include "zanbase/snapshot.h"
 
@@ -58,17 +56,6 @@ TEST(TimedRegion, AddsUpThreadsThatOpenMPDoesNotKnow) {
     EXPECT_DOUBLE_EQ(row.maThreadSeconds.at(0), 0.16);
 }
 
-TEST(TimedRegion, AddsUpNestedTeams) {
-    const OMPNested nested(true);
-#pragma omp parallel num_threads(2)
-#pragma omp parallel num_threads(2)
-    {
-        HTimedRegion("teams");
-        now_ms += 100;
-    }
-    EXPECT_DOUBLE_EQ(RowOf("teams").mdSeconds, 0.4);
-}
-
 TEST(TimedRegion, ShowsOpenIntervalsApart) {
     const unsigned long long id = HTimerNamed("open");
     {
@@ -106,21 +93,6 @@ TEST(TimedRegion, IsReadWhileThreadsComeAndGo) {
     }
     reader.join();
     EXPECT_NEAR(RowOf("churn").mdSeconds, 0.2, 1e-9);
-}
-
-TEST(TimedRegion, StandsWhereAStatementDoes) {
-    const std::string name = "statement";
-    // clang-format off
-    if (now_ms > 0) HTimedRegion(name);
-    { HTimedRegion("left"); HTimedRegion("right"); now_ms += 1; }
-    // clang-format on
-    for (const bool is_timed : {true, false}) {
-        HTimedRegionIf(is_timed, "sometimes");
-        now_ms += 2;
-    }
-    EXPECT_DOUBLE_EQ(RowOf("left").mdSeconds, 0.001);
-    EXPECT_DOUBLE_EQ(RowOf("right").mdSeconds, 0.001);
-    EXPECT_DOUBLE_EQ(RowOf("sometimes").mdSeconds, 0.002);
 }
 
 TEST(TimedRegion, IsReportedAtExitUnlessThatIsUnwanted) {

@@ -78,18 +78,6 @@ TEST(TrackedMemory, FollowsAnObjectThroughEachBase) {
     HMemory::Reset();
 }
 
-TEST(TrackedMemory, GivesBackWhatWasNeverRecorded) {
-    HTrackedResource memory(std::pmr::new_delete_resource(), {"a.cpp", 1});
-    void* block = nullptr;
-    {
-        const HTrackerPause pause;
-        block = memory.allocate(8);
-    }
-    EXPECT_EQ(Sites(), "");
-    memory.deallocate(block, 8);  // the address sanitizer finds it otherwise
-    EXPECT_EQ(Sites(), "");
-}
-
 // Every container of the standard library, with an upstream that has no state and with one that has.
 template <class T>
 using Tracked = HTrackedAllocator<T>;
@@ -165,20 +153,6 @@ TEST(TrackedAllocator, ConformsOverAnArena) {
     ExpectContainersConform<TrackedArena>(std::pmr::polymorphic_allocator<int>(&arena));
     EXPECT_EQ(HMemorySnapshot::Take().mnTotal, 0);
     HMemory::Reset();
-}
-
-// What the arena hands to the elements of a container over it, and a copy of the container does not share it.
-TEST(TrackedAllocator, ConstructsElementsAsTheUpstreamDoes) {
-    std::pmr::monotonic_buffer_resource arena;
-    std::vector<std::pmr::string, TrackedArena<std::pmr::string>> texts(
-        TrackedArena<std::pmr::string>(HCallSite::Here(), &arena));
-    texts.emplace_back("a text");
-    EXPECT_EQ(texts[0].get_allocator().resource(), &arena);
-    const auto copy = texts;
-    EXPECT_EQ(copy.get_allocator().GetUpstream().resource(), std::pmr::get_default_resource());
-    const TrackedArena<int> rebound = texts.get_allocator();
-    EXPECT_TRUE(rebound == texts.get_allocator());
-    EXPECT_TRUE(rebound != copy.get_allocator());
 }
 
 }  // namespace

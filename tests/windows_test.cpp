@@ -4,9 +4,7 @@
 #include <xmmintrin.h>
 
 #include <cstdint>
-#include <random>
 #include <thread>
-#include <vector>
 
 #include "platform/guard.h"
 #include "platform/stream.h"
@@ -111,37 +109,6 @@ TEST(WindowsThread, LeavesNoHandleBehind) {
         endless.Kill();
     }
     EXPECT_LE(NextHandle(), before);
-}
-
-// Bodies that hold nothing, since a killed thread would keep it.
-TEST(WindowsThread, IsStartedKilledAndAwaitedFromAllSides) {
-    std::atomic<int> turns{0};
-    std::atomic<bool> is_over{false};
-    Runner runner([&] {
-        for (const int last = turns + 50; turns < last && !is_over; ++turns) std::this_thread::yield();
-    });
-    std::atomic<bool> is_operated{false};  // keeps a start and a kill apart
-    std::vector<std::thread> operators;
-    for (unsigned int seed = 1; seed <= 4; ++seed) {
-        operators.emplace_back([&, seed] {
-            std::minstd_rand random(seed);
-            for (int round = 0; round < 300; ++round) {
-                runner.SetPriority(static_cast<HThreadPriority>(random() % 8));
-                while (is_operated.exchange(true)) std::this_thread::yield();
-                if (random() % 3 == 0) {
-                    runner.Kill();
-                    EXPECT_FALSE(runner.IsRunning());
-                } else {
-                    runner.Start(true);
-                }
-                is_operated = false;
-            }
-        });
-    }
-    for (std::thread& each : operators) each.join();
-    is_over = true;
-    runner.Wait();
-    EXPECT_FALSE(runner.IsRunning());
 }
 
 std::string FirstTextOnConsole(DWORD length) {

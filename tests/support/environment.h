@@ -10,9 +10,6 @@ std::FILE* OpenTemporaryFile();
 // Sets an environment variable, or removes it if `value` is null.
 void SetEnvironment(const char* name, const char* value);
 
-// Whether a condition serves its other waiters after one of them was killed. Not every system promises that.
-extern const bool kConditionOutlivesKills;
-
 // Whether a thread that has used up its stack gets a machine fault.
 extern const bool kExhaustedStackIsAFault;
 

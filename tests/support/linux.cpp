@@ -12,7 +12,6 @@
 #include "support/environment.h"
 #include "support/run_in_child.h"
 
-const bool kConditionOutlivesKills = true;
 const bool kExhaustedStackIsAFault = true;
 extern "C" __attribute__((weak)) void __tsan_init();  // defined under the thread sanitizer
 const bool kKillRunsTlsDestructors = __tsan_init != nullptr;

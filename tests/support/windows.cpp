@@ -89,7 +89,6 @@ bool IsInWait(HANDLE thread) {
 
 }  // namespace
 
-const bool kConditionOutlivesKills = false;
 const bool kExhaustedStackIsAFault = false;  // Wine leaves too little stack to unwind and ends the thread
 const bool kKillRunsTlsDestructors = false;
 
