@@ -12,7 +12,7 @@ diff "$record" - <<<"$names"
 
 # DLL NAME of each import that is none of these. The C++ library may supply C++ names alone, and so on.
 strays=$(awk '/DLL Name:/ {dll = tolower($3)} dll && NF == 3 && $2 ~ /^[0-9]+$/ {print dll, $3}' <<<"$table" |
-    grep -vE '^((kernel32|user32|ntdll|msvcrt|ucrtbase|api-ms-win-crt-[a-z0-9-]+)\.dll (_*[A-Za-z0-9_]+)|advapi32\.dll Crypt\w+|libgcc_s_seh-1\.dll _Unwind_\w+|libstdc\+\+-6\.dll (_Z|__cxa_|__gxx_)\w+|libgomp-1\.dll omp_\w+|libintl-8\.dll libintl_\w+)$' || true)
+    grep -vE '^((kernel32|user32|ntdll|msvcrt|ucrtbase|api-ms-win-crt-[a-z0-9-]+)\.dll (_*[A-Za-z0-9_]+)|advapi32\.dll Crypt\w+|libgcc_s_seh-1\.dll (_Unwind|__emutls)_\w+|libstdc\+\+-6\.dll (_Z|__cxa_|__gxx_)\w+|libgomp-1\.dll omp_\w+|libintl-8\.dll libintl_\w+)$' || true)
 [ -z "$strays" ] || { printf 'imported from an unexpected DLL:\n%s\n' "$strays" && exit 1; }
 grep -q ' libintl_gettext$' < <(awk '{print " " $3}' <<<"$table") || { echo 'no import was read' && exit 1; }
 
