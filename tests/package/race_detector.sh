@@ -7,7 +7,7 @@ work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 export LD_LIBRARY_PATH=$build/src
 
-for program in examples/{adapters/lockable,hibernating_worker} tests/{stress/{locks,all}_stress,package/race_detector}; do
+for program in examples/{adapters/lockable,hibernating_worker} tests/{stress/all_stress,package/race_detector}; do
     run=$work/${program##*/}
     "$compiler" -std=c++17 -g -O1 -fsanitize=thread -pthread -I"$sources/include" -I"$sources/tests" -I"$build/include" \
         "$sources/$program.cpp" -L"$build/src" -lzanbase -o "$run"
