@@ -54,6 +54,15 @@ TEST(GlobalTimer, OrdersTimersByTotalAndReportsAgainAtExit) {
               "never: 0\none: 1\ntwo: 2\nthree: 3\none: 1.23457e+09\n");
 }
 
+TEST(GlobalTimer, OrdersTimersWhoseSecondsAreEqual) {
+    const std::string output = OutputOf([] {
+        for (const char* const name : {"more", "less"}) Timers().RegisterNewTimer(name);
+        Spend(0, 18446744073709004);
+        Spend(1, 18446744073709002);
+    });
+    EXPECT_EQ(output, "less: 1.84467e+13\nmore: 1.84467e+13\n");
+}
+
 // The mutex stays held, as by a thread that was killed while it added rows.
 TEST(GlobalTimer, NeedsItsMutexForNewRowsOnly) {
     const std::string output = OutputOf([] {
