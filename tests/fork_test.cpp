@@ -5,25 +5,26 @@
 #include <unistd.h>
 
 #include <atomic>
+#include <cstdio>
 #include <thread>
 
 #include "diskio/ledger.h"
 #include "environment/message_catalogue.h"
 #include "platform/clock.h"
-#include "support/blocked_thread.h"
 #include "support/runner.h"
 #include "text/name_ring.h"
 #include "timing/row_table.h"
 #include "zanbase/memory.h"
 
-// A clock on which a pause takes longer than it lasts.
-static std::atomic<unsigned int> now_ms{0}, pause_ms{1};
+// A clock that only the pauses of a waiting fork advance.
+static std::atomic<unsigned int> now_ms{0}, pause_ms{0}, pauses{0};
 
 WallClock ReadWallClock() noexcept { return {0, 0}; }
 unsigned int ReadTicks() noexcept { return now_ms; }
-void SleepFor(unsigned int ms) noexcept {
-    usleep(1000 * ms);
+void SleepFor(unsigned int) noexcept {
+    ++pauses;
     now_ms += pause_ms;
+    std::this_thread::yield();
 }
 
 namespace {
@@ -46,15 +47,16 @@ struct Tracker : HMemory {
 // The other thread opens a file and starts a thread while it is inside. For each it needs a lock that fork() acquires
 // too.
 TEST(Fork, WaitsUntilNoOtherThreadIsInsideATable) {
-    const unsigned long long main_thread = HThread::GetCurrentThreadId();
     const HMutex* const mutexes[] = {&Tracker::moMutex, mpoDiskIOMutex, &goTimerGrowthMutex,
                                      &goMessageCatalogue.moCatalogueMutex, &goNameRing.moRingMutex};
     for (const HMutex* const mutex : mutexes) {
         std::atomic<bool> inside{false};
         std::thread other([&] {
             const HMutexLock lock(mutex);
+            const unsigned int before = pauses;
             inside = true;
-            AwaitSleepOf(main_thread);
+            while (pauses == before) std::this_thread::yield();
+            std::fclose(std::fopen("/dev/null", "r"));
             Runner([] {}).RunToEnd();
         });
         while (!inside) std::this_thread::yield();
