@@ -80,7 +80,7 @@ struct GlobalTimer::Impl {
 
     // Publishes the timer once its slots are made. Of threads that register at once, the later ones take the next
     // number, or of a shared timer the number that it has got meanwhile. The exchange pairs with every load of mpoNewest:
-    // whoever finds a timer finds it and its slots complete.
+    // a thread that finds a timer finds it and its slots complete.
     unsigned long long Register(std::string name, bool is_shared) {
         auto timer = std::make_unique<Timer>();
         timer->moName = std::move(name);

@@ -86,7 +86,7 @@ struct alignas(128) RegionRow {
     RegionRow* mpoOlder = nullptr;  // constant once the row is in the list
 };
 
-// The exchange in FindRow pairs with every load: whoever finds a row finds it complete.
+// The exchange in FindRow pairs with every load: a thread that finds a row finds it complete.
 std::atomic<RegionRow*> gpoNewestRow{nullptr};
 std::atomic<bool> gbExitReport{true};
 

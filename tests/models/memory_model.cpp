@@ -42,7 +42,7 @@ struct LockSuite : rl::test_suite<LockSuite, 3> {
 
 TEST(MemoryModel, LockNeedsItsOrders) { ExpectNeedsItsOrders<LockSuite>(4); }
 
-// Two units of two threads: whoever has acquired both sees what both wrote.
+// Two units of two threads: the thread that has acquired both sees what both wrote.
 struct SemaphoreSuite : rl::test_suite<SemaphoreSuite, 3> {
     Semaphore semaphore{0};
     RelacyPlain written[2];

@@ -28,7 +28,7 @@
 ///     for (std::string line; std::getline(in, line);) Use(line);
 ///     if (buffer.GetError()) std::fprintf(stderr, "%s\n", buffer.GetError().message().c_str());
 ///
-/// Positions are bytes of the file; there is one position for reading and writing, and nobody else moves that of the
+/// Positions are bytes of the file; there is one position for reading and writing, which nothing else may move in the
 /// file below. Bytes that were read ahead are used again when the position moves among them, so they may be older than
 /// the file; `tellg` and `tellp` write nothing.
 ///

@@ -24,8 +24,8 @@
 //   mnDepth is plain: the owner alone reads and writes it.
 //   In a process with one thread relaxed loads and stores suffice; starting a second thread publishes them.
 //
-// The kernel compares the lower half of the word only. If that has the bit of the sleepers, a Release will wake
-// one, whoever owns the lock.
+// The kernel compares the lower half of the word only. If that has the bit of the sleepers, the Release of any
+// owner will wake one.
 //
 // A thread's number is never given to a second thread (lock_owner.h). The system reuses its thread
 // identifiers, so the lock of a killed owner would seem to belong to a later thread.

@@ -5,7 +5,7 @@
 //                                                                                system made no thread
 //   Running   the thread has made its first step                                 Leaving or Killed
 //   Leaving   the body has ended; the thread exits, with its TLS destructors     Joining, or Ended when
-//                                                                                nobody waits
+//                                                                                no thread waits
 //   Killed    the thread exits, and may still use its signal stack               Joining
 //   Joining   a waiter, or the next StartThread, is joining the thread           Ended, or as before
 //   Ended     only waiters use the block                                         Starting, when reused

@@ -156,7 +156,7 @@ ZANBASE_HOOK(int, prctl, (int option, ...), noexcept) {
 }
 
 // Hooks of functions that don't return.
-// NOLINTBEGIN(bugprone-macro-parentheses): the exception specification of a definition
+// NOLINTBEGIN(bugprone-macro-parentheses): where a definition states what it throws
 #define ZANBASE_EXIT(name, exceptions)            \
     ZANBASE_NEXT(name, void(int))                 \
     extern "C" void name(int status) exceptions { \
